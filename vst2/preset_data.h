@@ -14,6 +14,11 @@ constexpr VstInt32 kPresetParameterBankMagic = fourCharacterCode('F', 'x', 'B', 
 constexpr VstInt32 kPresetChunkProgramMagic = fourCharacterCode('F', 'P', 'C', 'h');
 constexpr VstInt32 kPresetChunkBankMagic = fourCharacterCode('F', 'B', 'C', 'h');
 
+/// The same in the other byte order.
+constexpr VstInt32 kReversedParameterBankMagic = fourCharacterCode('k', 'B', 'x', 'F');
+constexpr VstInt32 kReversedChunkProgramMagic = fourCharacterCode('h', 'C', 'P', 'F');
+constexpr VstInt32 kReversedChunkBankMagic = fourCharacterCode('h', 'C', 'B', 'F');
+
 /// One program (preset). Parameter values, or the size of a chunk and the chunk, follow at byte 56.
 struct fxProgram {
   VstInt32 chunkMagic;  ///< 'CcnK'

@@ -1,0 +1,49 @@
+// An owned block of bytes: preset, bank and chunk data are put together in one, parameter values saved in
+// one.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+
+#include "support/exceptions.h"
+
+/// Owns one block made with malloc and frees it. Not copied.
+template <class Byte>
+class AutoBuffer {
+  static_assert(sizeof(Byte) == 1, "sizes are in bytes");
+
+ public:
+  AutoBuffer() = default;
+  ~AutoBuffer() { std::free(block); }
+  AutoBuffer(const AutoBuffer&) = delete;
+  AutoBuffer& operator=(const AutoBuffer&) = delete;
+
+  /// Allocates `sizeInBytes` bytes, tells their number in `sizeOut` and gives the block to the caller, who
+  /// frees it with free(). Throws the int -1 when there is no memory, and for a negative size.
+  static Byte* NewBuffer(int sizeInBytes, std::int32_t& sizeOut) {
+    void* made = sizeInBytes < 0 ? nullptr : std::malloc(static_cast<std::size_t>(sizeInBytes));
+    nidu_FailNULL(made);
+    sizeOut = sizeInBytes;
+    return static_cast<Byte*>(made);
+  }
+
+  /// Makes room for exactly `sizeInBytes` bytes, uninitialised.
+  /// On purpose: the old contents are not copied. This makes room, it does not resize.
+  /// Throws the int -1 when there is no memory; the old block is then still owned.
+  void setSize(int sizeInBytes) {
+    Byte* old = block;
+    block = NewBuffer(sizeInBytes, sizeInUse);
+    std::free(old);
+  }
+
+  /// In bytes, as last requested.
+  [[nodiscard]] std::int32_t size() const { return sizeInUse; }
+  /// The block; null before the first setSize(). Borrowed.
+  [[nodiscard]] Byte* data() { return block; }
+  [[nodiscard]] const Byte* data() const { return block; }
+
+ private:
+  std::int32_t sizeInUse = 0;
+  Byte* block = nullptr;
+};
