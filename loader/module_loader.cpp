@@ -1,0 +1,60 @@
+#include "loader/module_loader.h"
+
+#include <cstring>
+
+#include "platform/entry_point_name.h"
+#include "support/exceptions.h"
+
+sorted_vector_set<NiduCOM::i_ptr<VSTPluginLoader>, compareVSTLoaderRefs> VSTPluginLoader::fLoadedDLLs;
+
+bool compareVSTLoaderRefs::operator()(const NiduCOM::i_ptr<VSTPluginLoader>& a,
+                                      const NiduCOM::i_ptr<VSTPluginLoader>& b) const {
+  return std::strcmp(a->info.path.c_str(), b->info.path.c_str()) < 0;
+}
+
+bool compareVSTLoaderRefs::operator()(const NiduCOM::i_ptr<VSTPluginLoader>& a,
+                                      const VST_DLL_Info& info) const {
+  return std::strcmp(a->info.path.c_str(), info.path.c_str()) < 0;
+}
+
+VSTPluginLoader::VSTPluginLoader(const VST_DLL_Info& identity) : info(identity) {
+  CFStringRef path = CFStringCreateWithCString(kCFAllocatorDefault, info.path.c_str(), kCFStringEncodingUTF8);
+  nidu_FailNULL(path);
+  CFURLRef url = CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path, kCFURLPOSIXPathStyle, false);
+  CFRelease(path);
+  nidu_FailNULL(url);
+  bundle = CFBundleCreate(kCFAllocatorDefault, url);
+  CFRelease(url);
+  nidu_FailNULL(bundle);
+  // On purpose: a bundle whose executable does not load is not released.
+  if (!CFBundleLoadExecutable(bundle)) throw -1;
+}
+
+VSTPluginLoader::~VSTPluginLoader() {
+  if (bundle == nullptr) return;
+  CFBundleUnloadExecutable(bundle);
+  CFRelease(bundle);
+}
+
+void* VSTPluginLoader::getMainEntry() {
+  if (void* entry = CFBundleGetFunctionPointerForName(bundle, CFSTR("VSTPluginMain"))) return entry;
+  if (void* entry = CFBundleGetFunctionPointerForName(bundle, CFSTR("main_macho"))) return entry;
+  CFStringRef systemsOwn = systemEntryPointName();
+  return systemsOwn == nullptr ? nullptr : CFBundleGetFunctionPointerForName(bundle, systemsOwn);
+}
+
+bool VSTPluginLoader::findLoadedDLL(const VST_DLL_Info& identity, NiduCOM::i_ptr<VSTPluginLoader>& out) {
+  const auto p = fLoadedDLLs.lower_bound(identity);
+  if (p == fLoadedDLLs.end() || (*p)->info.effectName != identity.effectName) return false;
+  out = *p;
+  return true;
+}
+
+NiduCOM::i_ptr<VSTPluginLoader> VSTPluginLoader::demandLoadedPlugin(const VST_DLL_Info& identity) {
+  NiduCOM::i_ptr<VSTPluginLoader> result;
+  if (findLoadedDLL(identity, result)) return result;
+  // On purpose: counted, not adopted. The reference of the construction stays out for ever.
+  result.reset(new VSTPluginLoader(identity), NiduCOM::AddRef::kTake);
+  fLoadedDLLs.insert(result);
+  return result;
+}

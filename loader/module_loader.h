@@ -1,0 +1,55 @@
+// Loads plug-in bundles and shares them.
+//
+// Ask for a bundle with VSTPluginLoader::demandLoadedPlugin(); asking twice for the same path gives the same
+// loader. The wrapper takes the entry point from it and creates instances.
+//
+// Ownership: loaders are counted. The reference taken at construction is never given back, so plug-in code
+//            stays loaded until the process ends.
+// Failures:  a bundle that cannot be loaded throws the int -1; nothing is cached then.
+// Threads:   main thread only. Counts are plain integers.
+#pragma once
+
+#include <cstdint>
+
+#include "loader/counted_handle.h"
+#include "loader/plugin_identity.h"
+#include "loader/sorted_vector_set.h"
+#include "platform/core_foundation.h"
+
+class VSTPluginLoader;
+
+/// Orders loaders by their paths, byte by byte as C strings.
+struct compareVSTLoaderRefs {
+  bool operator()(const NiduCOM::i_ptr<VSTPluginLoader>& a, const NiduCOM::i_ptr<VSTPluginLoader>& b) const;
+  bool operator()(const NiduCOM::i_ptr<VSTPluginLoader>& a, const VST_DLL_Info& info) const;
+};
+
+class VSTPluginLoader {
+ public:
+  /// Loads the bundle at the identity's path. Throws the int -1 where that fails.
+  explicit VSTPluginLoader(const VST_DLL_Info& identity);
+  /// Unloads the bundle. Never reached in this program, where the first reference is kept.
+  ~VSTPluginLoader();
+  VSTPluginLoader(const VSTPluginLoader&) = delete;
+  VSTPluginLoader& operator=(const VSTPluginLoader&) = delete;
+
+  /// The function that creates instances: "VSTPluginMain", else "main_macho", else the name that this
+  /// system's oldest plug-ins use, if it has one. Null where the module exports none of them.
+  void* getMainEntry();
+
+  /// Looks into the cache. On a hit `out` holds the loader; on a miss it is left as it is.
+  /// On purpose: the search positions by path and then only the name decides, so the next loader in path
+  /// order is a hit when its name is the same.
+  static bool findLoadedDLL(const VST_DLL_Info& identity, NiduCOM::i_ptr<VSTPluginLoader>& out);
+
+  /// The loader for this bundle: from the cache, else newly made and cached. Throws the int -1 where the
+  /// bundle does not load.
+  static NiduCOM::i_ptr<VSTPluginLoader> demandLoadedPlugin(const VST_DLL_Info& identity);
+
+  CFBundleRef bundle = nullptr;  ///< Owned: one reference.
+  VST_DLL_Info info;             ///< What this loader was made for.
+  std::uint32_t refCount = 1;
+
+  /// Every bundle loaded so far. Empty before main runs.
+  static sorted_vector_set<NiduCOM::i_ptr<VSTPluginLoader>, compareVSTLoaderRefs> fLoadedDLLs;
+};

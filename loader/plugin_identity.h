@@ -1,0 +1,72 @@
+// The records that name a plug-in: the bundle it comes in, and the child of a shell that it may be.
+//
+// Plain values, copied freely; each owns its strings. putTo and getFrom travel over an INiduStream and let
+// its NiduException pass: fields before the failed operation keep their new values, later ones their old.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+class INiduStream;
+
+/// Which plug-in inside a bundle is wanted.
+struct VST_loadID {
+  /// Order of values: bool hasChildID, int32 childID.
+  void putTo(INiduStream* stream) const;
+  void getFrom(INiduStream* stream);
+
+  bool hasChildID = false;   ///< True when a certain child of a shell is wanted.
+  std::int32_t childID = 0;  ///< Meaningful only with hasChildID.
+};
+
+/// A VST_loadID with a name to show. Ordered by child, with "no child" first (see operator<).
+struct VST_ChildSpec : VST_loadID {
+  VST_ChildSpec() = default;
+  /// A certain child, also for id 0.
+  explicit VST_ChildSpec(int id) : VST_loadID{true, id} {}
+  explicit VST_ChildSpec(const VST_loadID& loadID) : VST_loadID(loadID) {}
+
+  /// Order of values: the VST_loadID, string childName.
+  void putTo(INiduStream* stream) const;
+  void getFrom(INiduStream* stream);
+
+  std::string childName;  ///< Empty until whoever enumerates the children fills it in.
+};
+
+/// By signed child identifier; a spec without a child comes before every spec with one.
+/// On purpose: the name takes no part, so a set holds one entry for each child and one without a child.
+bool operator<(const VST_ChildSpec& a, const VST_ChildSpec& b);
+
+/// One bundle on disk.
+/// On purpose: the destructor is not virtual; objects are always destroyed through their own type.
+class VST_DLL_Info {
+ public:
+  VST_DLL_Info(std::string bundlePath, const char* name);
+
+  /// Order of values: string path, string effectName, int32 of dllTag's low 32 bits.
+  /// On purpose: the 64-bit dllTag travels as 32 bits and is read back sign-extended.
+  virtual void putTo(INiduStream* stream) const;
+  virtual void getFrom(INiduStream* stream);
+
+  std::string path;         ///< UTF-8, as given on the command line.
+  std::int64_t dllTag = 0;  ///< Carried along, never interpreted.
+  std::string effectName;   ///< The driver passes "test".
+};
+
+/// One plug-in that can be instantiated: a bundle and a child.
+class VST_Class_Spec : public VST_DLL_Info {
+ public:
+  VST_Class_Spec(const VST_DLL_Info& bundle, const VST_ChildSpec& childSpec);
+
+  /// Order of values: the bundle part, the child part.
+  void putTo(INiduStream* stream) const override;
+  /// On purpose: the inherited one reads the bundle part only and leaves the child part as it is.
+  using VST_DLL_Info::getFrom;
+  /// Reads both parts. The version is ignored.
+  virtual void getFrom(INiduStream* stream, int version);
+
+  /// The child's name when a child is named, else the bundle's. A reference into this record.
+  [[nodiscard]] const std::string& getEffectName() const;
+
+  VST_ChildSpec child;
+};
