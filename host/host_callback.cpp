@@ -1,0 +1,54 @@
+// The host's side of the conversation: what plug-ins are answered when they call their host.
+//
+// Threads: any that the plug-in has. Reads VSTWrapper::gCurrentLoadID and no other state, never the instance:
+//          the answers are the same for all instances, and while an entry point runs.
+#include <cstring>
+
+#include "host/host_answers.h"
+#include "host/host_identity.h"
+#include "host/vst_wrapper.h"
+#include "vst2/host_opcodes.h"
+
+namespace {
+
+constexpr VstInt32 kVstVersion = 2400;
+constexpr VstInt32 kVendorCode = fourCharacterCode('N', 'I', 'D', 'U');
+constexpr std::size_t kMaxProductLength = 64;
+
+VstIntPtr vendorService(const char* name) {
+  if (std::strcmp(name, "niduGetTrackSampleForCurBlock") != 0) return 0;
+  return reinterpret_cast<VstIntPtr>(&VSTWrapper::trackSamplePosThunk);
+}
+
+}  // namespace
+
+VstIntPtr VSTWrapper::masterCallback(AEffect*, VstInt32 opcode, VstInt32, VstIntPtr, void* ptr, float) {
+  char* text = static_cast<char*>(ptr);
+  switch (opcode) {
+    case audioMasterVersion:
+      return kVstVersion;
+    case audioMasterCurrentId:
+      return gCurrentLoadID;
+    case audioMasterGetVendorString:
+      std::strcpy(text, "NIDU");
+      return 0;  // On purpose: 0 although the text is written.
+    case audioMasterGetProductString:
+      std::strncpy(text, GetHostId().c_str(), kMaxProductLength);
+      return 0;  // On purpose: 0 although the text is written.
+    case audioMasterGetVendorVersion: {
+      KelClientVersion version;
+      GetHostVersion(version);
+      return packedVersion(version);
+    }
+    case audioMasterCanDo:
+      return hostCanDo(text);
+    case audioMasterGetLanguage:
+      return currentLanguage();
+    case kVendorCode:
+      return vendorService(text);
+    default:
+      return 0;
+  }
+}
+
+double VSTWrapper::trackSamplePosThunk(AEffect*) { return 0.0; }

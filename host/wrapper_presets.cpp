@@ -1,0 +1,226 @@
+// VSTWrapper: preset and bank data.
+//
+// Four forms: one program or a bank of all, each with parameter values or with the plug-in's own chunk. The
+// layout is in vst2/preset_data.h, its fields are read and written through host/preset_format.h.
+#include <algorithm>
+#include <cstring>
+#include <limits>
+
+#include "host/data_sizes.h"
+#include "host/preset_format.h"
+#include "host/vst_wrapper.h"
+#include "vst2/dispatch.h"
+
+namespace {
+
+constexpr VstInt32 kFormatVersion = 1;
+constexpr int kSmallestData = 28;
+constexpr std::int64_t kChunkSizeField = 4;
+
+/// An 'FxCk' block with this many parameter values.
+int programSizeOrFail(VstInt32 parameters) {
+  return sizeOrFail(kProgramContentAt, parameters, sizeof(float));
+}
+
+/// On purpose: the byte-size field is 0 and not the size.
+void writeHeader(char* at, VstInt32 formMagic, const AEffect* effect, VstInt32 count) {
+  writeWord(at + kChunkMagicAt, kPresetChunkMagic);
+  writeWord(at + kByteSizeAt, 0);
+  writeWord(at + kFormMagicAt, formMagic);
+  writeWord(at + kFormatVersionAt, kFormatVersion);
+  writeWord(at + kPluginIdAt, effect->uniqueID);
+  writeWord(at + kPluginVersionAt, effect->version);
+  writeWord(at + kCountAt, count);
+}
+
+/// Where program `index` of a parameter bank starts, as the first program's count says. A negative count
+/// gives a place before the data. The stride is kept to what decides, so that the product cannot overflow.
+std::int64_t bankProgramAt(const char* bank, VstInt32 index) {
+  constexpr std::int64_t kFarthest = std::numeric_limits<VstInt32>::max();
+  const std::int64_t parameters = readWord(bank + kBankContentAt + kCountAt);
+  const std::int64_t stride = parameters * std::int64_t{sizeof(float)} + std::int64_t{kProgramContentAt};
+  return std::int64_t{kBankContentAt} + index * std::clamp(stride, -kFarthest, kFarthest);
+}
+
+}  // namespace
+
+bool VSTWrapper::hasChunks() const {
+  return effect != nullptr && (effect->flags & effFlagsProgramChunks) != 0;
+}
+
+void VSTWrapper::getChunkData(AutoBuffer<char>& out, bool isPreset) const {
+  if (!hasChunks()) return;
+  void* chunk = nullptr;
+  const VstIntPtr size = dispatch(*effect, effGetChunk, isPreset ? 1 : 0, 0, &chunk);
+  if (size > std::numeric_limits<int>::max() || size < 0) throw -1;
+  if (size > 0) nidu_FailNULL(chunk);
+  out.setSize(static_cast<int>(size));
+  if (size > 0) std::memcpy(out.data(), chunk, static_cast<std::size_t>(size));
+}
+
+void VSTWrapper::setChunkData(const char* data, int size, bool isPreset) {
+  if (size < 1 || !hasChunks()) return;
+  dispatch(*effect, effSetChunk, isPreset ? 1 : 0, size, const_cast<char*>(data));
+  if (!isPreset) updateStoredProgramNames();
+}
+
+void VSTWrapper::setParamsInProgramBlock(fxProgram* block) {
+  writeProgramBlock(reinterpret_cast<char*>(block), std::max(parameterCount(), 0));
+}
+
+void VSTWrapper::writeProgramBlock(char* block, VstInt32 parameters) {
+  writeHeader(block, kPresetParameterProgramMagic, effect, parameters);
+  writeProgramName(block, getCurrentProgramName());
+  char* value = block + kProgramContentAt;
+  for (VstInt32 i = 0; i < parameters; ++i, value += sizeof(float)) writeFloat(value, getParameter(i));
+}
+
+bool VSTWrapper::saveToFXBData(AutoBuffer<char>& out, bool asBank) {
+  if (hasChunks()) {
+    saveChunk(out, asBank);
+  } else if (asBank) {
+    saveParameterBank(out);
+  } else {
+    const VstInt32 parameters = std::max(parameterCount(), 0);
+    out.setSize(programSizeOrFail(parameters));
+    writeProgramBlock(out.data(), parameters);
+  }
+  return true;
+}
+
+void VSTWrapper::saveChunk(AutoBuffer<char>& out, bool asBank) {
+  AutoBuffer<char> chunk;
+  getChunkData(chunk, !asBank);
+  const std::size_t contentAt = asBank ? kBankContentAt : kProgramContentAt;
+  const std::int64_t fixedSize = static_cast<std::int64_t>(contentAt) + kChunkSizeField;
+  out.setSize(sizeOrFail(fixedSize, chunk.size(), 1));
+  std::memset(out.data(), 0, contentAt);
+  // On purpose: a program's count is the number of programs too, not of parameters.
+  writeHeader(out.data(), asBank ? kPresetChunkBankMagic : kPresetChunkProgramMagic, effect,
+              effect->numPrograms);
+  if (!asBank) writeProgramName(out.data(), getCurrentProgramName());
+  writeWord(out.data() + contentAt, chunk.size());
+  if (chunk.size() > 0) {
+    std::memcpy(out.data() + fixedSize, chunk.data(), static_cast<std::size_t>(chunk.size()));
+  }
+}
+
+void VSTWrapper::saveParameterBank(AutoBuffer<char>& out) {
+  // The counts are read once: a plug-in that changes them on the way cannot make a block leave the buffer.
+  const VstInt32 parameters = std::max(parameterCount(), 0);
+  const VstInt32 programs = programCount();
+  const VstInt32 blocks = std::max(programs, 1);
+  const int blockSize = programSizeOrFail(parameters);
+  out.setSize(sizeOrFail(kBankContentAt, blocks, blockSize));
+  std::memset(out.data(), 0, static_cast<std::size_t>(out.size()));
+  writeHeader(out.data(), kPresetParameterBankMagic, effect, programs);
+
+  const auto blockAt = [&](VstInt32 program) {
+    return out.data() + kBankContentAt + std::int64_t{program} * blockSize;
+  };
+  const VstInt32 current = currentProgram();
+  AutoBuffer<char> store;
+  createTempParameterStore(store);
+  // A current program outside the bank has no block of its own.
+  if (current >= 0 && current < blocks) writeProgramBlock(blockAt(current), parameters);
+  for (VstInt32 i = 0; i < programs; ++i) {
+    if (i == current) continue;
+    setCurrentProgram(i);
+    writeProgramBlock(blockAt(i), parameters);
+  }
+  setCurrentProgram(current);
+  restoreFromTempParameterStore(store);
+}
+
+bool VSTWrapper::restoreProgramSettings(const fxProgram* block) {
+  const char* program = reinterpret_cast<const char*>(block);
+  if (readWord(program + kChunkMagicAt) != kPresetChunkMagic) return false;
+  if (readWord(program + kFormMagicAt) != kPresetParameterProgramMagic) return false;
+  loadProgramValues(program);
+  return true;
+}
+
+void VSTWrapper::loadProgramValues(const char* block) {
+  changeProgramName(currentProgram(), readProgramName(block));
+  const VstInt32 count = readWord(block + kCountAt);
+  // On purpose: the values are not checked against the size of the data. Those that no parameter takes are
+  // not read.
+  const char* value = block + kProgramContentAt;
+  for (VstInt32 i = 0; i < count && i < parameterCount(); ++i, value += sizeof(float)) {
+    setParameter(i, readFloat(value));
+  }
+}
+
+bool VSTWrapper::loadFromFXBData(const void* data, int size) {
+  const char* bytes = static_cast<const char*>(data);
+  if (size < kSmallestData) return false;
+  const VstInt32 chunkMagic = readWord(bytes + kChunkMagicAt);
+  const bool isReversed = chunkMagic == vst_swap(kPresetChunkMagic);
+  if (chunkMagic != kPresetChunkMagic && !isReversed) return false;
+  if (readWord(bytes + kFormatVersionAt) > kFormatVersion) return false;
+
+  // On purpose: the parameter forms are known in their proper byte order only, the chunk forms in both.
+  // On purpose: the size of a chunk is read without a look at whether the data reaches that far.
+  switch (readWord(bytes + kFormMagicAt)) {
+    case kPresetParameterBankMagic:
+      return loadParameterBank(bytes, size);
+    case kPresetParameterProgramMagic:
+      // On purpose: here the reversed chunk magic is refused after all.
+      if (isReversed) return false;
+      loadProgramValues(bytes);
+      return true;
+    case kPresetChunkBankMagic:
+    case kReversedChunkBankMagic: {
+      const VstInt32 chunkSize = readWord(bytes + kBankContentAt);
+      if (chunkSize + std::int64_t{kBankContentAt} + kChunkSizeField > size) return false;
+      setChunkData(bytes + kBankContentAt + kChunkSizeField, chunkSize, false);
+      return true;
+    }
+    case kPresetChunkProgramMagic:
+    case kReversedChunkProgramMagic: {
+      const VstInt32 chunkSize = readWord(bytes + kProgramContentAt);
+      if (chunkSize + std::int64_t{kProgramContentAt} + kChunkSizeField > size) return false;
+      setChunkData(bytes + kProgramContentAt + kChunkSizeField, chunkSize, true);
+      changeProgramName(currentProgram(), readProgramName(bytes));
+      return true;
+    }
+    default:
+      return false;
+  }
+}
+
+bool VSTWrapper::loadParameterBank(const char* data, int size) {
+  const VstInt32 count = readWord(data + kCountAt);
+  if (count < 0) return true;
+  const VstInt32 current = currentProgram();
+  // On purpose: only the start of a block is checked against the size, not its end.
+  const auto loadBlock = [&](VstInt32 program) {
+    return restoreProgramSettings(reinterpret_cast<const fxProgram*>(data + bankProgramAt(data, program)));
+  };
+  const auto startsInside = [&](VstInt32 program) {
+    const std::int64_t at = bankProgramAt(data, program);
+    return at >= 0 && at < size;
+  };
+  for (VstInt32 i = 0; i < count; ++i) {
+    if (i == current) continue;
+    if (!startsInside(i)) return false;
+    setCurrentProgram(i);
+    if (!loadBlock(i)) return false;
+  }
+  if (count > 0) setCurrentProgram(current);
+  return startsInside(current) && loadBlock(current);
+}
+
+bool VSTWrapper::presetDataIsBankFormat(const char* data) {
+  switch (readWord(data + kFormMagicAt)) {
+    case kPresetChunkBankMagic:
+    case kReversedChunkBankMagic:
+    case kPresetParameterBankMagic:
+    case kReversedParameterBankMagic:
+      return true;
+    default:
+      return false;
+  }
+}
+
+VstInt32 VSTWrapper::getEffectIDFromPresetData(const char* data) { return readWord(data + kPluginIdAt); }

@@ -1,0 +1,108 @@
+// VSTWrapper: programs, and the store that saves the current one while others are visited.
+//
+// A temporary parameter store is the program's name (64 bytes, zero-terminated), then one 32-bit float for
+// each parameter in the machine's own byte order.
+#include <algorithm>
+#include <cstring>
+
+#include "host/data_sizes.h"
+#include "host/vst_wrapper.h"
+#include "support/text_buffer.h"
+#include "vst2/dispatch.h"
+
+namespace {
+
+constexpr std::size_t kProgramNameBufferSize = 256;
+constexpr std::size_t kMaxSentNameLength = 24;
+constexpr std::size_t kStoreNameSize = 64;
+
+char* valueInStore(char* store, VstInt32 index) {
+  return store + kStoreNameSize + sizeof(float) * static_cast<std::size_t>(index);
+}
+
+}  // namespace
+
+void VSTWrapper::setCurrentProgram(int index) {
+  const VstInt32 programs = programCount();
+  if (programs <= 0) return;
+  // On purpose: compared as given, before it is clamped.
+  if (index == currentProgram()) return;
+  dispatch(*effect, effSetProgram, 0, std::clamp(index, 0, programs - 1));
+}
+
+std::string VSTWrapper::getCurrentProgramName() {
+  char buffer[kProgramNameBufferSize];
+  vst_zerostruct(buffer);
+  dispatch(*effect, effGetProgramName, 0, 0, buffer);
+  std::string name = textIn(buffer);
+  const VstInt32 current = currentProgram();
+  if (current < 0) return name;
+  const auto program = static_cast<std::size_t>(current);
+  if (program >= storedProgramNames.size()) {
+    allocateOrFail([&] { storedProgramNames.resize(program + 1); });
+  }
+  // On purpose: a stored name stays, whatever the plug-in calls the program later.
+  if (storedProgramNames[program].empty()) storedProgramNames[program] = name;
+  return name;
+}
+
+std::string VSTWrapper::getProgramName(int index) {
+  if (index == currentProgram()) return getCurrentProgramName();
+  char buffer[kProgramNameBufferSize];
+  vst_zerostruct(buffer);
+  // On purpose: the upper bound is one past the last program.
+  const VstInt32 program = index < 0 ? 0 : std::min(index, programCount());
+  if (dispatch(*effect, effGetProgramNameIndexed, program, -1, buffer) != 0) return textIn(buffer);
+  const bool isStored = program >= 0 && static_cast<std::size_t>(program) < storedProgramNames.size();
+  return isStored ? storedProgramNames[static_cast<std::size_t>(program)] : std::string();
+}
+
+void VSTWrapper::changeProgramName(int index, const std::string& name) {
+  if (effect == nullptr || index != currentProgram() || programCount() <= 0) return;
+  if (getCurrentProgramName() == name) return;
+  std::string sent = name.substr(0, kMaxSentNameLength);
+  dispatch(*effect, effSetProgramName, 0, 0, sent.data());
+}
+
+void VSTWrapper::updateStoredProgramNames() {
+  if (programCount() < 1) return;
+  char buffer[kProgramNameBufferSize];
+  vst_zerostruct(buffer);
+  if (dispatch(*effect, effGetProgramNameIndexed, 0, -1, buffer) != 0) return;
+  const VstInt32 current = currentProgram();
+  AutoBuffer<char> store;
+  createTempParameterStore(store);
+  for (VstInt32 i = 0; i < programCount(); ++i) {
+    setCurrentProgram(i);
+    getCurrentProgramName();
+  }
+  setCurrentProgram(current);
+  restoreFromTempParameterStore(store);
+}
+
+void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
+  const VstInt32 parameters = std::max(parameterCount(), 0);
+  store.setSize(sizeOrFail(kStoreNameSize, parameters, sizeof(float)));
+  std::memset(store.data(), 0, static_cast<std::size_t>(store.size()));
+  const std::string name = getCurrentProgramName();
+  std::memcpy(store.data(), name.c_str(), std::min(name.size(), kStoreNameSize - 1));
+  for (VstInt32 i = 0; i < parameters; ++i) {
+    const float value = getParameter(i);
+    std::memcpy(valueInStore(store.data(), i), &value, sizeof value);
+  }
+}
+
+void VSTWrapper::restoreFromTempParameterStore(const AutoBuffer<char>& store) {
+  changeProgramName(currentProgram(), store.data());
+  for (VstInt32 i = 0; i < parameterCount(); ++i) {
+    float value = 0.0f;
+    std::memcpy(&value, valueInStore(const_cast<char*>(store.data()), i), sizeof value);
+    setParameter(i, value);
+  }
+}
+
+VstInt32 VSTWrapper::currentProgram() const {
+  return static_cast<VstInt32>(dispatch(*effect, effGetProgram));
+}
+
+VstInt32 VSTWrapper::programCount() const { return effect == nullptr ? 0 : effect->numPrograms; }
