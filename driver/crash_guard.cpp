@@ -1,0 +1,51 @@
+#include "driver/crash_guard.h"
+
+#include <csignal>
+#include <cstdlib>
+
+#include "driver/way_out.h"
+#include "platform/exception_handler.h"
+
+namespace {
+
+// On purpose: SIGKILL is asked for too, although the system refuses it. No result is looked at.
+constexpr int kGuardedSignals[] = {SIGINT, SIGABRT, SIGHUP, SIGKILL, SIGSEGV, SIGTERM, SIGBUS};
+
+/// Lets the handler run on the signal stack, and lets a second signal arrive while the first is handled.
+void makeHandlerSafe(int signal) {
+  struct sigaction action = {};
+  if (sigaction(signal, nullptr, &action) != 0) return;
+  action.sa_flags |= SA_ONSTACK | SA_NODEFER;
+  sigaction(signal, &action, nullptr);
+}
+
+void installSignalGuard() {
+  prepareSignalStack();
+  for (const int signal : kGuardedSignals) {
+    std::signal(signal, signal_callback_handler);
+    makeHandlerSafe(signal);
+  }
+}
+
+}  // namespace
+
+void signal_callback_handler(int) { leaveAfterCrash(); }
+
+CPPAutoReleasePool::CPPAutoReleasePool(int crashCode) {
+  gCrashCode = crashCode;
+  pool = makeAutoreleasePool();
+  delegate = makeExceptionDelegate({installSignalGuard, leaveAfterCrash});
+}
+
+CPPAutoReleasePool::~CPPAutoReleasePool() {
+  releaseAutoreleasePool(pool);
+  releaseExceptionDelegate(delegate);
+}
+
+__attribute__((no_sanitize("undefined"))) void crashOnPurpose() {
+  // Both the pointer and what it points to are volatile: the optimiser removes any other store to address
+  // zero.
+  volatile int* volatile nowhere = nullptr;
+  *nowhere = 0;
+  std::abort();
+}

@@ -1,0 +1,95 @@
+#include "driver/report.h"
+
+#include <atomic>
+#include <cstdio>
+#include <ctime>
+
+#include <poll.h>
+#include <unistd.h>
+
+int gStep = 0;
+const char* gCurTest = nullptr;
+
+namespace {
+
+constexpr int kPhaseNameSize = 64;
+constexpr int kLineSize = 128;
+constexpr char kLastWords[] = "unexpected exit";
+constexpr int kPatienceInMilliseconds = 100;
+
+enum class LastWords { kUnsaid, kBeingSaid, kSaid };
+
+std::atomic<LastWords> lastWords{LastWords::kUnsaid};
+std::atomic<bool> reportIsClosed{false};
+
+/// The name of the phase under way, in a buffer of its own; empty before the first phase.
+void copyPhaseName(char (&phase)[kPhaseNameSize]) {
+  std::snprintf(phase, sizeof phase, "%s", gCurTest == nullptr ? "" : gCurTest);
+}
+
+void printLine(const char* line) {
+  waitIfReportIsClosed();
+  std::printf("%s", line);
+  std::fflush(stdout);
+}
+
+bool outputTakesMore() {
+  pollfd output = {STDOUT_FILENO, POLLOUT, 0};
+  return poll(&output, 1, 0) == 1 && (output.revents & POLLOUT) != 0;
+}
+
+}  // namespace
+
+void printUsage() { printLine("!too few arguments. syntax is command pathtovst childID(optional)\n"); }
+
+void printTotal(int count) {
+  char line[kLineSize];
+  std::snprintf(line, sizeof line, "total, %d\n", count);
+  printLine(line);
+}
+
+void printStep(const char* text) {
+  ++gStep;
+  char line[kLineSize];
+  std::snprintf(line, sizeof line, "%d, %s\n", gStep, text);
+  printLine(line);
+}
+
+void printFailure(int code) {
+  char phase[kPhaseNameSize];
+  copyPhaseName(phase);
+  char line[kLineSize];
+  std::snprintf(line, sizeof line, "!%s %s %d\n", phase, "failed", code);
+  printLine(line);
+}
+
+void printFailure() {
+  char phase[kPhaseNameSize];
+  copyPhaseName(phase);
+  char line[kLineSize];
+  std::snprintf(line, sizeof line, "!%s %s\n", phase, "failed, unknown error");
+  printLine(line);
+}
+
+void printUnexpectedExit() {
+  lastWords = LastWords::kBeingSaid;
+  std::printf("%s", kLastWords);
+  std::fflush(stdout);
+  lastWords = LastWords::kSaid;
+}
+
+void printUnexpectedExitDirectly() {
+  // Somebody else may be just about to have said it.
+  const timespec millisecond = {0, 1000000};
+  for (int i = 0; i < kPatienceInMilliseconds && lastWords == LastWords::kBeingSaid; ++i) {
+    nanosleep(&millisecond, nullptr);
+  }
+  if (lastWords.exchange(LastWords::kSaid) == LastWords::kSaid || !outputTakesMore()) return;
+  [[maybe_unused]] const ssize_t written = write(STDOUT_FILENO, kLastWords, sizeof kLastWords - 1);
+}
+
+void closeReport() { reportIsClosed = true; }
+
+void waitIfReportIsClosed() {
+  while (reportIsClosed) pause();
+}

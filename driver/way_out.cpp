@@ -1,0 +1,63 @@
+#include "driver/way_out.h"
+
+#include <atomic>
+#include <csignal>
+#include <cstdlib>
+
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include "driver/report.h"
+
+bool gExpectedEnd = false;
+int gCrashCode = 0;
+
+namespace {
+
+constexpr unsigned kWayOutLimitInSeconds = 1;
+constexpr std::size_t kSignalStackSizeInBytes = std::size_t{1} << 20;
+constexpr std::size_t kGuardSizeInBytes = std::size_t{1} << 16;
+
+std::atomic<bool> leaving{false};
+
+[[noreturn]] void endAtOnce() {
+  if (!gExpectedEnd) printUnexpectedExitDirectly();
+  _exit(gCrashCode);
+}
+
+void timeIsUp(int) { endAtOnce(); }
+
+void limitTheWayOut() {
+  struct sigaction action = {};
+  action.sa_handler = timeIsUp;
+  action.sa_flags = SA_ONSTACK | SA_NODEFER;
+  sigaction(SIGALRM, &action, nullptr);
+  sigset_t none;
+  sigemptyset(&none);
+  pthread_sigmask(SIG_SETMASK, &none, nullptr);
+  alarm(kWayOutLimitInSeconds);
+}
+
+}  // namespace
+
+void prepareSignalStack() {
+  const std::size_t size = kGuardSizeInBytes + kSignalStackSizeInBytes;
+  void* memory = mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANON, -1, 0);
+  if (memory == MAP_FAILED) return;
+  mprotect(memory, kGuardSizeInBytes, PROT_NONE);
+  stack_t stack = {};
+  stack.ss_sp = static_cast<char*>(memory) + kGuardSizeInBytes;
+  stack.ss_size = kSignalStackSizeInBytes;
+  sigaltstack(&stack, nullptr);
+}
+
+void leaveAfterCrash() {
+  if (leaving.exchange(true)) endAtOnce();
+  closeReport();
+  limitTheWayOut();
+  std::exit(gCrashCode);
+}
+
+void atExitFunction() {
+  if (!gExpectedEnd) printUnexpectedExit();
+}
