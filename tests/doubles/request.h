@@ -1,0 +1,86 @@
+// One request that a host made of a plug-in instance, kept as a value: compared with ==, printed by
+// GoogleTest.
+//
+// RecordingEffect makes them; tests write down the ones that they expect:
+//   EXPECT_THAT(effect.requests(), ElementsAre(connectInput(1), connectInput(0), canDo("offline")));
+// A failing expectation prints them as effConnectInput(index 1, value 1), effCanDo("offline").
+#pragma once
+
+#include <cstddef>
+#include <iosfwd>
+#include <string>
+
+#include "vst2/basic_types.h"
+#include "vst2/effect_opcodes.h"
+
+namespace doubles {
+
+/// What a request's pointer pointed at when the request came in.
+struct Pointee {
+  enum class Kind {
+    kNull,     ///< The pointer was null.
+    kText,     ///< A text that goes to the plug-in (opcodes 4, 27, 51), without its terminator.
+    kBytes,    ///< Data that goes to the plug-in (opcode 24), as many bytes as the request's value says.
+    kRoom,     ///< Room for the plug-in to fill: a text buffer, a record, the address of a chunk pointer.
+    kAddress,  ///< Anything else; only the address itself is known.
+  };
+  Kind kind = Kind::kNull;
+  std::string content;        ///< kText, kBytes.
+  std::size_t roomSize = 0;   ///< kRoom: the whole size in bytes, known from the opcode.
+  std::size_t zeroBytes = 0;  ///< kRoom: how many of these bytes were zero.
+  /// The pointer itself, for code that runs while the request is under way. Compared only for kAddress.
+  void* address = nullptr;
+
+  bool operator==(const Pointee& other) const;
+};
+
+/// A call of the dispatcher, or of one of the two parameter functions.
+struct Request {
+  enum class Kind { kDispatch, kGetParameter, kSetParameter };
+  Kind kind = Kind::kDispatch;
+  VstInt32 opcode = 0;  ///< VstEffectOpcode; 0 for the parameter functions.
+  VstInt32 index = 0;
+  VstIntPtr value = 0;
+  Pointee pointee;
+  float opt = 0.0f;  ///< For setParameter: the value.
+
+  /// Bit by bit for opt: -0 differs from 0, and a NaN equals itself.
+  bool operator==(const Request& other) const;
+  bool operator!=(const Request& other) const { return !(*this == other); }
+
+  /// This request, but in a room that holds only `zeroBytes` zero bytes: the host did not clear it.
+  Request withZeroBytes(std::size_t zeroBytes) const;
+};
+
+void PrintTo(const Request& request, std::ostream* stream);
+
+/// What a dispatcher call asks, read from its arguments. Reads the whole room behind `ptr` when the opcode
+/// has one: 256 bytes for opcodes 5, 6, 7, 29; 500 for 8; 114 for 45, 47, 48, 70; 128 for 33, 34; 152 for 56;
+/// a pointer for 23.
+Request receivedRequest(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
+
+// ---- Expected requests ----
+
+/// Any request without text or data. Opcodes with a room are expected to bring it cleared, all bytes zero.
+Request request(VstEffectOpcode opcode, VstInt32 index = 0, VstIntPtr value = 0, float opt = 0.0f);
+
+Request setProgram(VstIntPtr program);                  ///< effSetProgram (2)
+Request setProgramName(const std::string& name);        ///< effSetProgramName (4)
+Request programNameIndexed(VstInt32 program);           ///< effGetProgramNameIndexed (29), value -1
+Request setSampleRate(float rateInHz);                  ///< effSetSampleRate (10)
+Request setBlockSize(VstIntPtr frames);                 ///< effSetBlockSize (11)
+Request mainsChanged(VstIntPtr on);                     ///< effMainsChanged (12)
+Request setBypass(VstIntPtr on);                        ///< effSetBypass (44)
+Request connectInput(VstInt32 pin, VstIntPtr on = 1);   ///< effConnectInput (31)
+Request connectOutput(VstInt32 pin, VstIntPtr on = 1);  ///< effConnectOutput (32)
+Request canDo(const std::string& capability);           ///< effCanDo (51)
+Request canParameterBeSetFromText(VstInt32 parameter);  ///< effString2Parameter (27) with a null text
+Request setParameterFromText(VstInt32 parameter, const std::string& text);  ///< effString2Parameter (27)
+Request getChunk(VstInt32 index);                            ///< effGetChunk (23): 0 bank, 1 program
+Request setChunk(VstInt32 index, const std::string& bytes);  ///< effSetChunk (24): 0 bank, 1 program
+/// effGetSpeakerArrangement (69): one arrangement's address in value, the other's behind the pointer.
+Request speakerArrangement(const void* input, const void* output);
+Request getParameterOf(VstInt32 parameter);               ///< The instance's getParameter function.
+Request setParameterTo(VstInt32 parameter, float value);  ///< The instance's setParameter function.
+
+}  // namespace doubles
