@@ -68,9 +68,7 @@ void CFRelease(CFTypeRef object) {
     return;
   }
   --used->references;
-  if (used->references > 0) return;
-  used->loaded = false;
-  if (used->lent == nullptr) return;
+  if (used->references > 0 || used->lent == nullptr) return;
   used->lent->isLent = false;
   --used->lent->references;
 }

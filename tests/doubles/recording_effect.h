@@ -11,8 +11,7 @@
 // records, programs and chunks below do their part; the answer is a scripted number if there is one, else
 // theirs, else 0.
 //
-// Ownership: the test owns the instance, also after effClose: later requests are still recorded, so that a
-// test
+// Ownership: the test owns the instance, also after effClose: later requests are still recorded, so that it
 //            can see them. The processing functions are null; no host in this program may call them.
 // Threads:   recording is safe from several threads, the rest from one.
 #pragma once

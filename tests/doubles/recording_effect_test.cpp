@@ -288,6 +288,15 @@ TEST_F(RecordingEffectPrograms, SetTheCounts) {
   EXPECT_EQ(effect.aeffect.numParams, 2);
 }
 
+TEST_F(RecordingEffectPrograms, ReplaceTheFormerOnesWhole) {
+  dispatch(effect.aeffect, effSetProgram, 0, 1);
+  effect.setPrograms({{"Only", {0.3f}}});
+  EXPECT_EQ(effect.currentProgram, 0);
+  EXPECT_EQ(effect.aeffect.numPrograms, 1);
+  EXPECT_EQ(effect.aeffect.numParams, 1);
+  EXPECT_EQ(effect.program(1).name, "");
+}
+
 TEST_F(RecordingEffectPrograms, SwitchNamesAndValuesTogether) {
   EXPECT_EQ(askText(effect, effGetProgramName).text, "Soft");
   EXPECT_EQ(askParameter(effect, 1), 0.2f);
