@@ -24,15 +24,35 @@ function(add_program_library name)
   endif()
 endfunction()
 
-# A shared object that tests and ./run load as a plug-in. Sanitizers stay out: real plug-ins have none either.
-#   add_sample_plugin(well_behaved_effect SOURCES well_behaved_effect/well_behaved_effect.cpp)
+# Sanitizers and coverage stay out of plug-ins: real ones have none either.
+set(sample_plugin_options -fno-sanitize=all)
+if(CMAKE_CXX_FLAGS MATCHES "--coverage")
+  list(APPEND sample_plugin_options -fno-profile-arcs -fno-test-coverage)
+endif()
+
+# Code that several sample plug-ins share; each takes a copy of its own.
+#   add_sample_plugin_library(sample_plugin_base SOURCES base/sample_plugin.cpp)
+function(add_sample_plugin_library name)
+  cmake_parse_arguments(ARG "" "" "SOURCES;USES" ${ARGN})
+  add_library(${name} STATIC ${ARG_SOURCES})
+  target_link_libraries(${name} PRIVATE house_rules PUBLIC vst2 ${ARG_USES})
+  target_compile_options(${name} PRIVATE ${sample_plugin_options})
+  set_target_properties(${name} PROPERTIES CXX_VISIBILITY_PRESET hidden VISIBILITY_INLINES_HIDDEN ON)
+endfunction()
+
+# A shared object that tests and ./run load as a plug-in. It shows its entry points and nothing else.
+#   add_sample_plugin(well_behaved_effect SOURCES well_behaved_effect/entry.cpp USES sample_plugin_base)
 function(add_sample_plugin name)
   cmake_parse_arguments(ARG "" "" "SOURCES;USES" ${ARGN})
+  set(exported_names ${PROJECT_SOURCE_DIR}/plugins/base/exported_names.map)
   add_library(${name} MODULE ${ARG_SOURCES})
   target_link_libraries(${name} PRIVATE house_rules vst2 ${ARG_USES})
-  target_compile_options(${name} PRIVATE -fno-sanitize=all)
-  target_link_options(${name} PRIVATE -fno-sanitize=all -Wl,--no-undefined)
+  target_compile_options(${name} PRIVATE ${sample_plugin_options})
+  target_link_options(${name} PRIVATE -fno-sanitize=all -Wl,--no-undefined
+    -Wl,--version-script=${exported_names})
   set_target_properties(${name} PROPERTIES
-    PREFIX "" SUFFIX ".so" CXX_VISIBILITY_PRESET hidden
+    PREFIX "" SUFFIX ".so" CXX_VISIBILITY_PRESET hidden VISIBILITY_INLINES_HIDDEN ON
+    LINK_DEPENDS ${exported_names}
     LIBRARY_OUTPUT_DIRECTORY ${PROJECT_BINARY_DIR}/plugins)
+  add_dependencies(sample_plugins ${name})
 endfunction()

@@ -1,0 +1,7 @@
+// An effect with parameters and programs that does everything right.
+// Used by `./run` and wherever a test needs a run that passes.
+#include "plugins/well_behaved_effect/well_behaved_effect.h"
+
+SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+  return sample_plugins::instantiate<sample_plugins::WellBehavedEffect>(host);
+}

@@ -1,0 +1,32 @@
+// An instrument without inputs that takes MIDI, saves its state in chunks, and does everything right.
+// Used by end_to_end_tests for a run that passes with chunks, and for the synth flag of a description.
+#include "plugins/base/sample_plugin.h"
+
+using namespace sample_plugins;
+
+namespace {
+
+Description describe() {
+  Description description{"Well-behaved instrument", fourCharacterCode('W', 'b', 'I', 'n'), kPlugCategSynth};
+  description.numInputs = 0;
+  description.flags = effFlagsIsSynth | effFlagsProgramChunks;
+  description.parameters = {{"Pitch", "Hz", 0.5f}, {"Decay", "s", 0.75f}};
+  description.programNames = {"Bell", "Drum"};
+  return description;
+}
+
+class WellBehavedInstrument : public SamplePlugin {
+ public:
+  explicit WellBehavedInstrument(audioMasterCallback host) : SamplePlugin(host, describe()) {}
+
+ protected:
+  VstIntPtr canDo(const std::string& capability) override {
+    return capability == "receiveVstEvents" || capability == "receiveVstMidiEvent" ? 1 : -1;
+  }
+};
+
+}  // namespace
+
+SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+  return instantiate<WellBehavedInstrument>(host);
+}
