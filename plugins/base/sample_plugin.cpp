@@ -25,7 +25,7 @@ struct CFunctions {
 };
 
 SamplePlugin::SamplePlugin(audioMasterCallback host, const Description& itsDescription)
-    : record(), hostCallback(host), description(itsDescription) {
+    : hostCallback(host), record(), description(itsDescription) {
   std::vector<float> values;
   for (const Parameter& parameter : description.parameters) values.push_back(parameter.value);
   for (const std::string& name : description.programNames) programs.push_back({name, values});
@@ -66,10 +66,6 @@ void SamplePlugin::process(float** inputs, float** outputs, VstInt32 frames) {
 }
 
 VstIntPtr SamplePlugin::canDo(const std::string&) { return 0; }
-
-VstIntPtr SamplePlugin::askHost(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) {
-  return hostCallback(&record, opcode, index, value, ptr, opt);
-}
 
 bool SamplePlugin::isParameter(VstInt32 index) const { return index >= 0 && index < record.numParams; }
 

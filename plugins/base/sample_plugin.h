@@ -78,9 +78,8 @@ class SamplePlugin {
   /// 1 yes, -1 no, 0 do not know. (effCanDo, 51)
   virtual VstIntPtr canDo(const std::string& capability);
 
-  /// Makes a request of the host. `effect` of the call is null until the entry point has returned.
-  VstIntPtr askHost(VstInt32 opcode, VstInt32 index = 0, VstIntPtr value = 0, void* ptr = nullptr,
-                    float opt = 0.0f);
+  /// What the sample calls to make a request of its host.
+  const audioMasterCallback hostCallback;
 
  private:
   friend struct CFunctions;
@@ -97,7 +96,6 @@ class SamplePlugin {
   VstIntPtr loadChunk(bool isProgram, const void* data, std::size_t sizeInBytes);
 
   AEffect record;
-  audioMasterCallback hostCallback;
   Description description;
   std::vector<Program> programs;  ///< At least one, so that the parameters have a place for their values.
   VstInt32 current = 0;

@@ -1,0 +1,9 @@
+// An effect with two entry points: `VSTPluginMain` makes the instance, `main_macho` refuses.
+// Used by end_to_end_tests: the first name wins, so the run passes.
+#include "plugins/well_behaved_effect/well_behaved_effect.h"
+
+SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+  return sample_plugins::instantiate<sample_plugins::WellBehavedEffect>(host);
+}
+
+SAMPLE_PLUGIN_EXPORT AEffect* main_macho(audioMasterCallback) { return nullptr; }

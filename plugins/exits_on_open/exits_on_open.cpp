@@ -1,0 +1,27 @@
+// An effect that ends the process with status 0 when it is opened.
+// Used by end_to_end_tests: "unexpected exit" tells this end from a pass.
+#include <cstdlib>
+
+#include "plugins/base/sample_plugin.h"
+
+using namespace sample_plugins;
+
+namespace {
+
+class ExitsOnOpen : public SamplePlugin {
+ public:
+  explicit ExitsOnOpen(audioMasterCallback host)
+      : SamplePlugin(host, {"Exits when opened", fourCharacterCode('O', 'p', 'E', 'x')}) {}
+
+ protected:
+  VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
+    if (opcode == effOpen) std::exit(0);
+    return SamplePlugin::dispatch(opcode, index, value, ptr, opt);
+  }
+};
+
+}  // namespace
+
+SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+  return instantiate<ExitsOnOpen>(host);
+}

@@ -1,0 +1,28 @@
+// An effect that stores to address zero when it is opened.
+// Used by end_to_end_tests: status 7 after "unexpected exit", before any other line.
+#include "plugins/base/sample_plugin.h"
+
+using namespace sample_plugins;
+
+namespace {
+
+// The pointer itself is volatile: a store through a pointer known to be null would be optimised away.
+int* volatile nowhere = nullptr;
+
+class OpenCrashes : public SamplePlugin {
+ public:
+  explicit OpenCrashes(audioMasterCallback host)
+      : SamplePlugin(host, {"Crashes when opened", fourCharacterCode('O', 'p', 'C', 'r')}) {}
+
+ protected:
+  VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
+    if (opcode == effOpen) *nowhere = 0;
+    return SamplePlugin::dispatch(opcode, index, value, ptr, opt);
+  }
+};
+
+}  // namespace
+
+SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+  return instantiate<OpenCrashes>(host);
+}
