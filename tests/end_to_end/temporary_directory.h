@@ -1,0 +1,29 @@
+// A folder of its own for one test, gone with everything in it when the test ends.
+#pragma once
+
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+#include <system_error>
+
+class TemporaryDirectory {
+ public:
+  /// Throws std::system_error when no folder can be made.
+  TemporaryDirectory() {
+    std::string name = (std::filesystem::temp_directory_path() / "vsttorture-XXXXXX").string();
+    if (mkdtemp(name.data()) == nullptr) throw std::system_error(errno, std::generic_category(), name);
+    folder = name;
+  }
+  TemporaryDirectory(const TemporaryDirectory&) = delete;
+  TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
+  ~TemporaryDirectory() {
+    std::error_code ignored;
+    std::filesystem::remove_all(folder, ignored);
+  }
+
+  /// Absolute, without a slash at its end.
+  const std::filesystem::path& path() const { return folder; }
+
+ private:
+  std::filesystem::path folder;
+};
