@@ -84,7 +84,7 @@ VstIntPtr SamplePlugin::answerParameterRequest(VstInt32 opcode, VstInt32 index, 
       return 0;
     case effGetParamDisplay: {
       char text[kParameterTextSize];
-      std::snprintf(text, sizeof text, "%.3f", static_cast<double>(getParameter(index)));
+      std::snprintf(text, sizeof text, "%.3f", static_cast<double>(SamplePlugin::getParameter(index)));
       putText(ptr, text, kParameterTextSize);
       return 0;
     }
@@ -103,7 +103,7 @@ VstIntPtr SamplePlugin::setFromText(VstInt32 index, const char* text) {
   char* end = nullptr;
   const float value = std::strtof(text, &end);
   if (end == text || *end != '\0') return 0;
-  setParameter(index, value);
+  SamplePlugin::setParameter(index, value);
   return 1;
 }
 

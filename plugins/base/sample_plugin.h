@@ -71,6 +71,7 @@ class SamplePlugin {
  protected:
   /// Every request arrives here. effClose (1) is answered like the others; the instance is deleted after it.
   virtual VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
+  /// Called by the host alone: requests that read or set a value do not pass here.
   virtual float getParameter(VstInt32 index);
   virtual void setParameter(VstInt32 index, float value);
   /// Copies inputs to outputs; an output without an input is silent.

@@ -6,8 +6,8 @@ using namespace sample_plugins;
 
 namespace {
 
-// The pointer itself is volatile: a store through a pointer known to be null would be optimised away.
-int* volatile nowhere = nullptr;
+// Both are volatile, the pointer and what it points to: a store to a known zero would be optimised away.
+volatile int* volatile nowhere = nullptr;
 
 class OpenCrashes : public SamplePlugin {
  public:

@@ -1,0 +1,125 @@
+// The table of faults, and those of a line or two.
+#include "plugins/faulty/faults.h"
+
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <exception>
+#include <stdexcept>
+
+#include <unistd.h>
+
+namespace sample_plugins {
+
+bool answersLongTexts = false;
+
+namespace {
+
+struct Oddity {};
+
+int exitStatus() {
+  const char* text = std::getenv("FAULT_STATUS");
+  return text == nullptr ? 0 : std::atoi(text);
+}
+
+std::string faultKind() {
+  const char* text = std::getenv("FAULT_KIND");
+  if (text == nullptr) complain("FAULT_PLACE is set, FAULT_KIND is not");
+  return text;
+}
+
+void divideByZero() {
+  volatile int number = 0;
+  number = 100 / number;  // 1 / number would be done without a division.
+}
+
+void raiseSignal() {
+  const std::string name = faultKind().substr(std::strlen("raise:"));
+  for (int number = 1; number < NSIG; ++number) {
+    const char* abbreviation = sigabbrev_np(number);
+    if (abbreviation != nullptr && name == std::string("SIG") + abbreviation) {
+      std::raise(number);
+      return;
+    }
+  }
+  complain("no such signal: " + name);
+}
+
+void hang() {
+  for (;;) pause();
+}
+
+void spin() {
+  for (volatile unsigned turns = 0;; turns = turns + 1) {
+  }
+}
+
+struct Fault {
+  const char* kind;
+  void (*commit)();
+};
+
+constexpr Fault kFaults[] = {
+    {"null_store", storeToAddressZero},
+    {"write_read_only", writeToReadOnlyMemory},
+    {"stack_overflow", overflowTheStack},
+    {"abort", [] { std::abort(); }},
+    {"terminate", [] { std::terminate(); }},
+    {"throw_int", [] { throw 5; }},
+    {"throw_runtime_error", [] { throw std::runtime_error("a fault on purpose"); }},
+    {"throw_struct", [] { throw Oddity(); }},
+    {"exit", [] { std::exit(exitStatus()); }},
+    {"_exit", [] { _exit(exitStatus()); }},
+    {"quick_exit", [] { std::quick_exit(exitStatus()); }},
+    {"raise", raiseSignal},
+    {"divide_by_zero", divideByZero},
+    {"illegal_instruction", [] { __builtin_trap(); }},
+    {"double_free", freeTwice},
+    {"heap_corruption", writeBehindABlock},
+    {"crash_with_heap_lock", crashWithHeapLock},
+    {"crash_with_stdout_lock", crashWithStdoutLock},
+    {"crash_with_own_stdout_lock", crashWithOwnStdoutLock},
+    {"crash_under_destructor_lock", crashUnderDestructorLock},
+    {"thread_crash", crashOnAThread},
+    {"thread_throw", throwOnAThread},
+    {"crash_in_atexit", crashInAtExit},
+    {"crash_in_static_destructor", crashInStaticDestructor},
+    {"replace_handlers_then_crash", replaceHandlersThenCrash},
+    {"block_signals_then_crash", blockSignalsThenCrash},
+    {"close_stdout", closeStdout},
+    {"flood_stdout", floodStdout},
+    {"long_texts", [] { answersLongTexts = true; }},
+    {"fork_keeping_stdout", forkKeepingStdout},
+    {"change_locale_and_directory", changeLocaleAndDirectory},
+    {"trap_floating_point", trapFloatingPoint},
+    {"hang", hang},
+    {"spin", spin},
+};
+
+}  // namespace
+
+void commitFault() {
+  const std::string kind = faultKind();
+  const std::string name = kind.substr(0, kind.find(':'));
+  for (const Fault& fault : kFaults) {
+    if (name == fault.kind) {
+      fault.commit();
+      return;
+    }
+  }
+  complain("no such fault: " + kind);
+}
+
+void complain(const std::string& problem) {
+  std::fprintf(stderr, "faulty: %s\n", problem.c_str());
+  _exit(125);
+}
+
+void storeToAddressZero() {
+  // Both are volatile, the pointer and what it points to: with either one alone, g++ removes the store.
+  volatile int* volatile nowhere = nullptr;
+  *nowhere = 0;
+}
+
+}  // namespace sample_plugins

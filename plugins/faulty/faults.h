@@ -1,0 +1,52 @@
+// What goes wrong, as the environment variable FAULT_KIND says. The names stand in the table of faults.cpp.
+//
+// FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise takes the signal's
+// name behind a colon: raise:SIGTERM.
+#pragma once
+
+#include <string>
+
+namespace sample_plugins {
+
+/// Does what FAULT_KIND names. Returns from those faults that leave the plug-in running.
+void commitFault();
+
+/// Every answer in text is 4000 bytes long from now on.
+extern bool answersLongTexts;
+
+/// A test asked for something that does not exist: says so on standard error and ends the process with 125.
+[[noreturn]] void complain(const std::string& problem);
+
+/// The plainest crash.
+void storeToAddressZero();
+
+// Faults in the memory, each of which ends in a signal.
+void writeToReadOnlyMemory();
+void overflowTheStack();
+void freeTwice();
+void writeBehindABlock();
+
+// Crashes that leave something locked which the way out of a process may need.
+void crashWithHeapLock();
+void crashWithStdoutLock();
+void crashWithOwnStdoutLock();
+void crashUnderDestructorLock();
+
+// Faults on a thread of the plug-in's own.
+void crashOnAThread();
+void throwOnAThread();
+
+// Faults that wait until the process ends.
+void crashInAtExit();
+void crashInStaticDestructor();
+
+// Faults of the process: the plug-in changes what it shares with its host.
+void replaceHandlersThenCrash();
+void blockSignalsThenCrash();
+void closeStdout();
+void floodStdout();
+void forkKeepingStdout();
+void changeLocaleAndDirectory();
+void trapFloatingPoint();
+
+}  // namespace sample_plugins

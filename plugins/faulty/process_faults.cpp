@@ -1,0 +1,82 @@
+// Faults on a plug-in's own thread, at the end of the process, and in what a plug-in shares with its host.
+#include <algorithm>
+#include <cfenv>
+#include <clocale>
+#include <csignal>
+#include <cstdlib>
+#include <string>
+#include <thread>
+
+#include <unistd.h>
+
+#include "plugins/faulty/faults.h"
+
+namespace sample_plugins {
+namespace {
+
+bool crashesWhenDestroyed = false;
+
+struct CrashesWhenDestroyed {
+  ~CrashesWhenDestroyed() {
+    if (crashesWhenDestroyed) storeToAddressZero();
+  }
+} crashesAtExit;
+
+}  // namespace
+
+void crashOnAThread() { std::thread(storeToAddressZero).join(); }
+
+void throwOnAThread() {
+  std::thread([] { throw 5; }).join();
+}
+
+void crashInAtExit() { std::atexit(storeToAddressZero); }
+
+void crashInStaticDestructor() { crashesWhenDestroyed = true; }
+
+void replaceHandlersThenCrash() {
+  for (const int number :
+       {SIGINT, SIGABRT, SIGHUP, SIGSEGV, SIGTERM, SIGBUS, SIGILL, SIGFPE, SIGTRAP, SIGSYS}) {
+    std::signal(number, SIG_DFL);
+  }
+  storeToAddressZero();
+}
+
+void blockSignalsThenCrash() {
+  sigset_t all;
+  sigfillset(&all);
+  pthread_sigmask(SIG_BLOCK, &all, nullptr);
+  storeToAddressZero();
+}
+
+void closeStdout() { close(STDOUT_FILENO); }
+
+/// 8 MiB, more than any pipe takes in without a reader.
+void floodStdout() {
+  const std::string line = std::string(127, 'x') + '\n';
+  for (int i = 0; i < 65536; ++i) {
+    for (std::size_t done = 0; done < line.size();) {
+      const ssize_t count = write(STDOUT_FILENO, line.data() + done, line.size() - done);
+      if (count <= 0) return;
+      done += static_cast<std::size_t>(count);
+    }
+  }
+}
+
+/// The child holds on to the stream for half a minute, longer than its host should wait.
+void forkKeepingStdout() {
+  if (fork() != 0) return;
+  sleep(30);
+  _exit(0);
+}
+
+void changeLocaleAndDirectory() {
+  for (const char* name : {"de_DE.UTF-8", "de_DE", "C.UTF-8"}) {
+    if (std::setlocale(LC_ALL, name) != nullptr) break;
+  }
+  if (chdir("/") != 0) complain("cannot go to the root directory");
+}
+
+void trapFloatingPoint() { feenableexcept(FE_DIVBYZERO | FE_INVALID | FE_OVERFLOW); }
+
+}  // namespace sample_plugins
