@@ -53,10 +53,12 @@ class CFBundle : public testing::Test {
   static bool loads(const std::string& path) {
     const CFBundleRef bundle = makeBundle(path);
     if (bundle == nullptr) return false;
-    bool loaded = CFBundleLoadExecutable(bundle) != 0;
-    if (loaded) loaded = call(CFBundleGetFunctionPointerForName(bundle, CFSTR("onlyHere"))) == 3;
+    const bool loaded = CFBundleLoadExecutable(bundle) != 0;
+    void* const function = CFBundleGetFunctionPointerForName(bundle, CFSTR("onlyHere"));
+    const bool isOnlyHere = loaded && function != nullptr && call(function) == 3;
     CFRelease(bundle);
-    return loaded;
+    EXPECT_EQ(isOnlyHere, loaded) << path << " is another module";
+    return isOnlyHere;
   }
 
   // What a load that must fail writes to standard error, without the line's start and end.
