@@ -28,9 +28,14 @@ void copyPhaseName(char (&phase)[kPhaseNameSize]) {
 }
 
 void printLine(const char* line) {
+  // Asked under the output's lock, so that nobody's last words get between the question and the line.
+  flockfile(stdout);
+  if (!reportIsClosed) {
+    std::printf("%s", line);
+    std::fflush(stdout);
+  }
+  funlockfile(stdout);
   waitIfReportIsClosed();
-  std::printf("%s", line);
-  std::fflush(stdout);
 }
 
 bool outputTakesMore() {
