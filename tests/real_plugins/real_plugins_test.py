@@ -1,0 +1,124 @@
+"""Tests of real_plugins: no deviation goes unnoticed, and a run sees a world of its own."""
+import contextlib
+import io
+import os
+import pathlib
+import tempfile
+import unittest
+from unittest import mock
+
+import real_plugins
+
+
+class ScriptedProgram(unittest.TestCase):
+    """A shell script stands in for vsttorture; its argument is the module's path."""
+
+    def setUp(self):
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.path = pathlib.Path(folder.name, "program")
+        self.write("printf 'total, 64\\n1, test gathering info\\nunexpected exit'; exit 7")
+
+    def write(self, body):
+        self.path.write_text(f"#!/bin/sh\n{body}\n")
+        self.path.chmod(0o755)
+
+    def main(self, table, installed, *arguments, required=""):
+        """The exit status and the output of a whole call."""
+        output = io.StringIO()
+        with mock.patch("sys.argv", ["real_plugins.py", "--program", str(self.path), *arguments]), \
+             mock.patch.object(real_plugins, "expected_ends", lambda: table), \
+             mock.patch.object(real_plugins, "installed_modules", installed.get), \
+             mock.patch.dict(os.environ, {"VSTTORTURE_REAL_PLUGINS": required}), \
+             contextlib.redirect_stdout(output):
+            status = real_plugins.main()
+        return status, output.getvalue()
+
+
+class Main(ScriptedProgram):
+    CRASH = "step 1, unexpected exit, status 7"
+
+    def test_the_expected_end_is_no_deviation(self):
+        status, output = self.main({"p": {"a.so": self.CRASH}}, {"p": {"a.so": "/a.so"}})
+        self.assertEqual(status, 0)
+        self.assertRegex(output, r"^1 plug-ins run in \d+ s, 0 deviations\n$")
+
+    def test_another_end_is_a_deviation(self):
+        status, output = self.main({"p": {"a.so": "passes"}}, {"p": {"a.so": "/a.so"}})
+        self.assertEqual(status, 1)
+        self.assertIn(f"p a.so: expected passes; seen {self.CRASH}\n", output)
+
+    def test_a_pass_where_a_crash_is_expected_is_a_deviation(self):
+        self.write("exit 0")
+        self.assertEqual(self.main({"p": {"a.so": self.CRASH}}, {"p": {"a.so": "/a.so"}})[0], 1)
+
+    def test_standard_error_is_quoted_with_a_deviation(self):
+        self.write("echo reason >&2; exit 3")
+        self.assertIn("    reason\n", self.main({"p": {"a.so": "passes"}}, {"p": {"a.so": "/a.so"}})[1])
+
+    def test_a_module_that_the_package_lacks_is_a_deviation(self):
+        status, output = self.main({"p": {"a.so": self.CRASH, "b.so": "passes"}}, {"p": {"a.so": "/a.so"}})
+        self.assertEqual(status, 1)
+        self.assertIn("p b.so: expected a module; seen none\n", output)
+
+    def test_a_module_that_the_table_lacks_is_a_deviation(self):
+        status, output = self.main({"p": {}}, {"p": {"a.so": "/a.so"}})
+        self.assertEqual(status, 1)
+        self.assertIn("p a.so: expected no such module; seen /a.so\n", output)
+
+    def test_a_missing_package_is_left_out_aloud(self):
+        status, output = self.main({"p": {"a.so": self.CRASH}, "q": {}}, {"p": {"a.so": "/a.so"}})
+        self.assertEqual(status, 0)
+        self.assertIn("left out: q is not installed\n", output)
+
+    def test_nothing_to_run_is_neither_success_nor_failure(self):
+        self.assertEqual(self.main({"p": {"a.so": "passes"}}, {})[0], 77)
+
+    def test_a_missing_package_that_is_required_is_a_deviation(self):
+        table = {"p": {"a.so": "passes"}}
+        self.assertEqual(self.main(table, {}, "--required")[0], 1)
+        self.assertEqual(self.main(table, {}, required="required")[0], 1)
+
+    def test_the_table_has_a_line_for_each_run(self):
+        output = self.main({"p": {"a.so": self.CRASH}}, {"p": {"a.so": "/a.so"}}, "--table")[1]
+        self.assertRegex(output, rf"^p\ta.so\t{self.CRASH}\t\d+\.\d\d\n")
+
+
+class Run(ScriptedProgram):
+    def errors_of(self, body):
+        self.write(body)
+        return real_plugins.run(str(self.path), "/some/module.so")[1]
+
+    def test_the_module_is_the_only_argument(self):
+        self.assertEqual(self.errors_of('echo "$#:$1" >&2'), "1:/some/module.so\n")
+
+    def test_home_is_an_empty_folder_of_its_own(self):
+        body = 'test -z "$(ls -A "$HOME")" && touch "$HOME/file" && echo "$HOME" >&2'
+        first, second = self.errors_of(body), self.errors_of(body)
+        self.assertNotEqual(first, "")
+        self.assertNotEqual(second, "")
+        self.assertNotEqual(first, second)
+
+    def test_there_is_no_display_and_the_locale_is_c(self):
+        with mock.patch.dict(os.environ, {"DISPLAY": ":0", "LC_ALL": "de_DE.UTF-8", "XDG_CONFIG_HOME": "/etc"}):
+            self.assertEqual(self.errors_of('echo "[$DISPLAY][$LC_ALL][$XDG_CONFIG_HOME]" >&2'), "[][C][]\n")
+
+    def test_a_run_that_never_ends_is_stopped(self):
+        self.write("echo total, 64; sleep 1000 & wait")
+        with mock.patch.object(real_plugins, "TIME_LIMIT_IN_SECONDS", 0.5):
+            self.assertEqual(real_plugins.run(str(self.path), "/a.so")[0], "step 0, out of time")
+
+
+class Table(unittest.TestCase):
+    def test_it_names_200_modules_of_seven_packages(self):
+        ends = real_plugins.expected_ends()
+        self.assertEqual({package: len(modules) for package, modules in ends.items()}, {
+            "amsynth": 1, "dpf-plugins-vst": 15, "dragonfly-reverb-vst": 4, "iem-plugin-suite-vst": 21,
+            "lsp-plugins-vst": 134, "zam-plugins": 17, "zynaddsubfx-vst": 8})
+
+    def test_a_folder_stands_for_the_shared_object_in_it(self):
+        self.assertIn("ProM.vst", real_plugins.expected_ends()["dpf-plugins-vst"])
+
+
+if __name__ == "__main__":
+    unittest.main()
