@@ -3,7 +3,6 @@
 #include <cstring>
 
 #include "platform/entry_point_name.h"
-#include "support/exceptions.h"
 
 sorted_vector_set<NiduCOM::i_ptr<VSTPluginLoader>, compareVSTLoaderRefs> VSTPluginLoader::fLoadedDLLs;
 
@@ -19,13 +18,13 @@ bool compareVSTLoaderRefs::operator()(const NiduCOM::i_ptr<VSTPluginLoader>& a,
 
 VSTPluginLoader::VSTPluginLoader(const VST_DLL_Info& identity) : info(identity) {
   CFStringRef path = CFStringCreateWithCString(kCFAllocatorDefault, info.path.c_str(), kCFStringEncodingUTF8);
-  nidu_FailNULL(path);
+  if (path == nullptr) throw -1;
   CFURLRef url = CFURLCreateWithFileSystemPath(kCFAllocatorDefault, path, kCFURLPOSIXPathStyle, false);
   CFRelease(path);
-  nidu_FailNULL(url);
+  if (url == nullptr) throw -1;
   bundle = CFBundleCreate(kCFAllocatorDefault, url);
   CFRelease(url);
-  nidu_FailNULL(bundle);
+  if (bundle == nullptr) throw -1;
   // On purpose: a bundle whose executable does not load is not released.
   if (!CFBundleLoadExecutable(bundle)) throw -1;
 }

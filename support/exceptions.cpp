@@ -10,6 +10,6 @@ void AutoNiduException::doCheck() {
   if (record.errorCode != 0 && std::uncaught_exceptions() == 0) throw NiduException(record);
 }
 
-void nidu_FailNULL(const void* p) {
+void nidu_FailNULL(void* p) {
   if (p == nullptr) throw -1;
 }

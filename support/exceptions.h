@@ -39,7 +39,7 @@ class AutoNiduException {
 };
 
 /// Throws the int -1 when `p` is null.
-void nidu_FailNULL(const void* p);
+void nidu_FailNULL(void* p);
 
 /// Runs `allocate`, which grows a container, and throws the int -1 where the memory for it cannot be had.
 template <class Allocate>
