@@ -1,0 +1,24 @@
+# What `cmake --install` puts in place, and the Debian package that `cpack` makes of it.
+include(GNUInstallDirs)
+install(TARGETS vsttorture RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+install(FILES docs/vsttorture.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
+install(FILES README.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+
+set(CPACK_GENERATOR DEB)
+set(CPACK_PACKAGE_DIRECTORY ${PROJECT_BINARY_DIR})
+set(CPACK_PACKAGE_VENDOR "The vsttorture developers")
+set(CPACK_PACKAGE_CONTACT "The vsttorture developers <maintainers@vsttorture.invalid>")
+set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
+set(CPACK_STRIP_FILES ON)
+set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
+set(CPACK_DEBIAN_PACKAGE_SECTION sound)
+set(CPACK_DEBIAN_PACKAGE_DESCRIPTION "An audio host starts this tool as a child process before it loads a plug-in
+into its own. A faulty plug-in then harms only the child, whose lines and exit
+status say in which step it failed.")
+# The program shares the system's C++ runtime with the plug-ins that it loads, so that their exceptions are caught.
+# Named here and not searched for: a 32-bit build on a 64-bit machine would find the names of the other one.
+set(CPACK_DEBIAN_PACKAGE_DEPENDS "libc6 (>= 2.36), libstdc++6 (>= 12), libgcc-s1")
+if(CMAKE_SIZEOF_VOID_P EQUAL 4 AND CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|i.86")
+  set(CPACK_DEBIAN_PACKAGE_ARCHITECTURE i386)
+endif()
+include(CPack)
