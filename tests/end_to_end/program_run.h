@@ -13,11 +13,31 @@
 #include <string>
 #include <vector>
 
+/// What the host does with the program's standard output.
+enum class Reader {
+  kReads,       ///< Reads it from the start to the end.
+  kReadsLate,   ///< Begins to read after half a second, or when the program has ended.
+  kStops,       ///< Reads until the text of the interruption has come, and no more.
+  kNeverReads,  ///< Does not even read what was in the pipe before: it is full from the start.
+  kIsGone,      ///< Has closed its end of the pipe.
+  kWasNone,     ///< Gives the program no standard output at all.
+};
+
+/// Signals that the host sends to the program, in this order.
+struct Interruption {
+  std::vector<int> signals = {};
+  std::string afterText = {};  ///< Not before the program has printed this,
+  double afterSeconds = 0;     ///< nor before this much more time has passed.
+  double secondsBetween = 0;   ///< The host does nothing else meanwhile.
+};
+
 struct ProgramCall {
   std::vector<std::string> arguments = {};
   std::map<std::string, std::string> environment = {};  ///< Added to the fixed one, or instead of it.
   std::string workingDirectory = {};                    ///< Empty: the same folder as HOME.
   double timeLimitInSeconds = 60;
+  Reader reader = Reader::kReads;
+  Interruption interruption = {};
 };
 
 struct ProgramRun {
@@ -25,6 +45,7 @@ struct ProgramRun {
   std::string standardError;
   std::string end;  ///< "exit status N", "signal N" or "timed out", which ends in a kill.
   double elapsedSeconds;
+  double secondsSinceInterruption;  ///< 0 when there was none.
 };
 
 /// Runs `program`, a path, to its end: neither the program nor the time limit leaves anything running. What a
