@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <exception>
+#include <sstream>
 #include <stdexcept>
 
 #include <unistd.h>
@@ -23,11 +24,15 @@ int exitStatus() {
   return text == nullptr ? 0 : std::atoi(text);
 }
 
-std::string faultKind() {
-  const char* text = std::getenv("FAULT_KIND");
-  if (text == nullptr) complain("FAULT_PLACE is set, FAULT_KIND is not");
-  return text;
+/// The one of several faults that is being committed. Made when first asked for: a fault may come while the
+/// module's own objects are still being made.
+std::string& kindUnderWay() {
+  static std::string kind;
+  return kind;
 }
+
+/// Stays in the stream's buffer until somebody flushes it.
+void printWithoutNewline() { std::fputs("a text without an end", stdout); }
 
 void divideByZero() {
   volatile int number = 0;
@@ -35,7 +40,7 @@ void divideByZero() {
 }
 
 void raiseSignal() {
-  const std::string name = faultKind().substr(std::strlen("raise:"));
+  const std::string name = kindUnderWay().substr(std::strlen("raise:"));
   for (int number = 1; number < NSIG; ++number) {
     const char* abbreviation = sigabbrev_np(number);
     if (abbreviation != nullptr && name == std::string("SIG") + abbreviation) {
@@ -87,6 +92,7 @@ constexpr Fault kFaults[] = {
     {"crash_in_static_destructor", crashInStaticDestructor},
     {"replace_handlers_then_crash", replaceHandlersThenCrash},
     {"block_signals_then_crash", blockSignalsThenCrash},
+    {"print", printWithoutNewline},
     {"close_stdout", closeStdout},
     {"flood_stdout", floodStdout},
     {"long_texts", [] { answersLongTexts = true; }},
@@ -97,18 +103,24 @@ constexpr Fault kFaults[] = {
     {"spin", spin},
 };
 
-}  // namespace
-
-void commitFault() {
-  const std::string kind = faultKind();
-  const std::string name = kind.substr(0, kind.find(':'));
+void commitOneFault() {
+  const std::string name = kindUnderWay().substr(0, kindUnderWay().find(':'));
   for (const Fault& fault : kFaults) {
     if (name == fault.kind) {
       fault.commit();
       return;
     }
   }
-  complain("no such fault: " + kind);
+  complain("no such fault: " + kindUnderWay());
+}
+
+}  // namespace
+
+void commitFault() {
+  const char* kinds = std::getenv("FAULT_KIND");
+  if (kinds == nullptr) complain("FAULT_PLACE is set, FAULT_KIND is not");
+  std::istringstream stream(kinds);
+  while (std::getline(stream, kindUnderWay(), '+')) commitOneFault();
 }
 
 void complain(const std::string& problem) {

@@ -1,5 +1,6 @@
 // What goes wrong, as the environment variable FAULT_KIND says. The names stand in the table of faults.cpp.
 //
+// Several faults, joined by a plus sign, are committed one after the other: print+null_store.
 // FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise takes the signal's
 // name behind a colon: raise:SIGTERM.
 #pragma once

@@ -1,5 +1,8 @@
 // The well-behaved effect with one fault, chosen by FAULT_KIND and FAULT_PLACE (see faults.h and place.h).
-// Used by end_to_end_tests for every way in which a plug-in can end or disturb its process.
+// Used by end_to_end_tests for every way in which a plug-in can end or disturb its process. The requests that
+// it receives are written to the file named in FAULT_LOG: "request OPCODE", one a line.
+#include <cstdio>
+#include <cstdlib>
 #include <cstring>
 
 #include "plugins/faulty/faults.h"
@@ -13,6 +16,18 @@ namespace {
 struct Loading {
   Loading() { reach(Moment::load); }
 } loading;
+
+void logRequest(VstInt32 opcode) {
+  static std::FILE* const log = [] {
+    const char* path = std::getenv("FAULT_LOG");
+    std::FILE* opened = path == nullptr ? nullptr : std::fopen(path, "a");
+    if (path != nullptr && opened == nullptr) complain("no such log");
+    return opened;
+  }();
+  if (log == nullptr) return;
+  std::fprintf(log, "request %d\n", opcode);
+  std::fflush(log);
+}
 
 bool isTextRequest(VstInt32 opcode) {
   switch (opcode) {
@@ -37,6 +52,7 @@ class Faulty : public WellBehavedEffect {
 
  protected:
   VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
+    logRequest(opcode);
     reach(Moment::dispatch, opcode);
     if (answersLongTexts && isTextRequest(opcode)) {
       std::memset(ptr, 'x', 3999);
