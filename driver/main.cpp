@@ -23,6 +23,7 @@ VST_loadID childNamed(const char* argument) {
 }  // namespace
 
 int main(int argc, const char** argv) {
+  openReport();
   const CPPAutoReleasePool pool(kExitCrashed);
   if (argc < 2) {
     printUsage();

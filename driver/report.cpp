@@ -1,6 +1,7 @@
 #include "driver/report.h"
 
 #include <atomic>
+#include <csignal>
 #include <cstdio>
 #include <ctime>
 
@@ -43,7 +44,35 @@ bool outputTakesMore() {
   return poll(&output, 1, 0) == 1 && (output.revents & POLLOUT) != 0;
 }
 
+/// Keeps the signals that ask a process to end waiting for a moment.
+class HeldSignals {
+ public:
+  HeldSignals() {
+    sigset_t asking;
+    sigemptyset(&asking);
+    sigaddset(&asking, SIGINT);
+    sigaddset(&asking, SIGHUP);
+    sigaddset(&asking, SIGTERM);
+    pthread_sigmask(SIG_BLOCK, &asking, &before);
+  }
+  ~HeldSignals() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
+  HeldSignals(const HeldSignals&) = delete;
+  HeldSignals& operator=(const HeldSignals&) = delete;
+
+ private:
+  sigset_t before;
+};
+
+void sayLastWords() {
+  lastWords = LastWords::kBeingSaid;
+  std::printf("%s", kLastWords);
+  std::fflush(stdout);
+  lastWords = LastWords::kSaid;
+}
+
 }  // namespace
+
+void openReport() { std::setvbuf(stdout, nullptr, _IONBF, 0); }
 
 void printUsage() { printLine("!too few arguments. syntax is command pathtovst childID(optional)\n"); }
 
@@ -77,10 +106,16 @@ void printFailure() {
 }
 
 void printUnexpectedExit() {
-  lastWords = LastWords::kBeingSaid;
-  std::printf("%s", kLastWords);
-  std::fflush(stdout);
-  lastWords = LastWords::kSaid;
+  // A second signal must not come between the words and the note that they are said. The waits are outside:
+  // for the lock, and for room where there is none.
+  flockfile(stdout);
+  if (outputTakesMore()) {
+    const HeldSignals held;
+    sayLastWords();
+  } else {
+    sayLastWords();
+  }
+  funlockfile(stdout);
 }
 
 void printUnexpectedExitDirectly() {

@@ -10,6 +10,10 @@ extern int gStep;
 /// The phase or test under way, for the failure line. Null before the first.
 extern const char* gCurTest;
 
+/// Before the first line: from now on standard output keeps nothing back. What exit() finds in a buffer it
+/// writes, and a signal at the wrong moment would leave a line there that has been written already.
+void openReport();
+
 /// "!too few arguments. syntax is command pathtovst childID(optional)"
 void printUsage();
 /// "total, COUNT"
