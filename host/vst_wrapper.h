@@ -146,8 +146,8 @@ class VSTWrapper {
   /// the machine's byte order) in `store`.
   void createTempParameterStore(AutoBuffer<char>& store);
 
-  /// Puts a store back: name, then values.
-  /// On purpose: the store's size is not checked against numParams.
+  /// Puts a store back: name, then as many values as it holds and the plug-in takes.
+  /// On purpose: a store of another number of parameters is not refused.
   void restoreFromTempParameterStore(const AutoBuffer<char>& store);
 
   // ---- Preset and bank data

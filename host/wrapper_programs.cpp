@@ -16,6 +16,10 @@ constexpr std::size_t kProgramNameBufferSize = 256;
 constexpr std::size_t kMaxSentNameLength = 24;
 constexpr std::size_t kStoreNameSize = 64;
 
+VstInt32 valuesInStore(const AutoBuffer<char>& store) {
+  return (store.size() - VstInt32{kStoreNameSize}) / VstInt32{sizeof(float)};
+}
+
 char* valueInStore(char* store, VstInt32 index) {
   return store + kStoreNameSize + sizeof(float) * static_cast<std::size_t>(index);
 }
@@ -94,7 +98,8 @@ void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
 
 void VSTWrapper::restoreFromTempParameterStore(const AutoBuffer<char>& store) {
   changeProgramName(currentProgram(), store.data());
-  for (VstInt32 i = 0; i < parameterCount(); ++i) {
+  // A plug-in may have got more parameters meanwhile: nothing is read behind the store's end.
+  for (VstInt32 i = 0; i < valuesInStore(store) && i < parameterCount(); ++i) {
     float value = 0.0f;
     std::memcpy(&value, valueInStore(const_cast<char*>(store.data()), i), sizeof value);
     setParameter(i, value);
