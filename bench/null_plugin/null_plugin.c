@@ -1,0 +1,40 @@
+/* A plug-in that answers nothing, in constant time: every request is 0 and every value is 0, so that a run on
+ * it costs what its host costs. NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS say how many it has. */
+#include <stdint.h>
+#include <stdlib.h>
+
+#include "bench/floor/interface.h"
+
+static intptr_t answerNothing(AEffect* effect, int32_t opcode, int32_t index, intptr_t value, void* ptr,
+                              float opt) {
+  (void)index, (void)value, (void)ptr, (void)opt;
+  if (opcode == effClose) free(effect);
+  return 0;
+}
+
+static void ignoreValue(AEffect* effect, int32_t index, float value) {
+  (void)effect, (void)index, (void)value;
+}
+
+static float noValue(AEffect* effect, int32_t index) {
+  (void)effect, (void)index;
+  return 0.0f;
+}
+
+static int32_t countFrom(const char* variable) {
+  const char* text = getenv(variable);
+  return text == NULL ? 0 : (int32_t)strtol(text, NULL, 10);
+}
+
+__attribute__((visibility("default"))) AEffect* VSTPluginMain(HostCallback* host) {
+  (void)host;
+  AEffect* effect = calloc(1, sizeof(AEffect));
+  if (effect == NULL) return NULL;
+  effect->magic = 0x56737450;
+  effect->dispatcher = answerNothing;
+  effect->setParameter = ignoreValue;
+  effect->getParameter = noValue;
+  effect->numParams = countFrom("NULL_PLUGIN_PARAMETERS");
+  effect->numPrograms = countFrom("NULL_PLUGIN_PROGRAMS");
+  return effect;
+}
