@@ -5,8 +5,10 @@
 #pragma once
 
 #include <cstddef>
+#include <cstring>
 #include <string>
 
+#include "support/endian.h"
 #include "vst2/basic_types.h"
 
 /// Offsets in bytes from the start of a program, a bank or both.
@@ -27,16 +29,41 @@ enum PresetOffset : std::size_t {
 constexpr std::size_t kProgramNameSize = 28;
 
 /// Reverses the four bytes of a value.
-VstInt32 vst_swap(VstInt32 value);
+inline VstInt32 vst_swap(VstInt32 value) {
+  Endian::Swap(&value, sizeof value);
+  return value;
+}
 
 /// Reverses the four bytes of a float. The result is a word and not a float: the reversed pattern may be a
 /// signalling NaN, which a floating-point register would change.
-VstInt32 vst_swapFloat(float value);
+inline VstInt32 vst_swapFloat(float value) {
+  VstInt32 word = 0;
+  std::memcpy(&word, &value, sizeof word);
+  return vst_swap(word);
+}
 
-VstInt32 readWord(const char* at);
-void writeWord(char* at, VstInt32 value);
-float readFloat(const char* at);
-void writeFloat(char* at, float value);
+inline VstInt32 readWord(const char* at) {
+  VstInt32 word = 0;
+  std::memcpy(&word, at, sizeof word);
+  return vst_swap(word);
+}
+
+inline void writeWord(char* at, VstInt32 value) {
+  const VstInt32 word = vst_swap(value);
+  std::memcpy(at, &word, sizeof word);
+}
+
+inline float readFloat(const char* at) {
+  const VstInt32 word = readWord(at);
+  float value = 0.0f;
+  std::memcpy(&value, &word, sizeof value);
+  return value;
+}
+
+inline void writeFloat(char* at, float value) {
+  const VstInt32 word = vst_swapFloat(value);
+  std::memcpy(at, &word, sizeof word);
+}
 
 /// The name field of a program up to its first zero byte.
 std::string readProgramName(const char* program);

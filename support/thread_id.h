@@ -2,6 +2,8 @@
 //
 // Threads: one thread may assign while others compare. They read the old value or the new one, and nothing
 //          else is ordered by that.
+//
+// All in the header: the lock compares identities twice for each parameter value.
 #pragma once
 
 #include <atomic>
@@ -12,13 +14,20 @@ class NiduThreadID {
  public:
   /// No thread.
   NiduThreadID() = default;
-  NiduThreadID(NiduThreadID const& other);
-  NiduThreadID& operator=(NiduThreadID const& other);
+  NiduThreadID(NiduThreadID const& other) : thread(other.value()) {}
+  NiduThreadID& operator=(NiduThreadID const& other) {
+    set(other.value());
+    return *this;
+  }
   /// Sets the value to no thread.
-  ~NiduThreadID();
+  ~NiduThreadID() { set(pthread_t{}); }
 
   /// The calling thread.
-  static NiduThreadID CurrentThread();
+  static NiduThreadID CurrentThread() {
+    NiduThreadID current;
+    current.set(pthread_self());
+    return current;
+  }
 
   /// True when both name the same thread or both name none. A thread's value may come back for another
   /// thread once the first has ended.
@@ -31,3 +40,11 @@ class NiduThreadID {
   // Relaxed loads and stores compile to plain moves.
   std::atomic<pthread_t> thread{pthread_t{}};  // null (0): no thread
 };
+
+inline bool NiduThreadID::IsEqual(NiduThreadID const& other) const {
+  constexpr pthread_t kNoThread{};
+  const pthread_t mine = value();
+  const pthread_t others = other.value();
+  if (mine == kNoThread || others == kNoThread) return mine == kNoThread && others == kNoThread;
+  return mine == others || pthread_equal(mine, others) != 0;
+}
