@@ -201,12 +201,15 @@ class VSTWrapper {
   static VstInt32 gCurrentLoadID;
 
  private:
+  friend class LockedValues;
+
   VSTWrapper(const NiduCOM::i_ptr<VSTPluginLoader>& module, const VST_ChildSpec& child,
              KelVSTSupportEffect* support);
 
   void connectAllPins();
   [[nodiscard]] VstInt32 currentProgram() const;
-  [[nodiscard]] VstInt32 parameterCount() const;
+  [[nodiscard]] VstInt32 parameterCount() const { return effect == nullptr ? 0 : effect->numParams; }
+  [[nodiscard]] bool hasParameter(VstInt32 index) const { return index >= 0 && index < parameterCount(); }
   [[nodiscard]] VstInt32 programCount() const;
   [[nodiscard]] bool hasChunks() const;
 

@@ -7,6 +7,7 @@
 #include <limits>
 
 #include "host/data_sizes.h"
+#include "host/locked_values.h"
 #include "host/preset_format.h"
 #include "host/vst_wrapper.h"
 #include "vst2/dispatch.h"
@@ -72,7 +73,8 @@ void VSTWrapper::writeProgramBlock(char* block, VstInt32 parameters) {
   writeHeader(block, kPresetParameterProgramMagic, effect, parameters);
   writeProgramName(block, getCurrentProgramName());
   char* value = block + kProgramContentAt;
-  for (VstInt32 i = 0; i < parameters; ++i, value += sizeof(float)) writeFloat(value, getParameter(i));
+  const LockedValues values(*this);
+  for (VstInt32 i = 0; i < parameters; ++i, value += sizeof(float)) writeFloat(value, values.get(i));
 }
 
 bool VSTWrapper::saveToFXBData(AutoBuffer<char>& out, bool asBank) {
@@ -146,8 +148,9 @@ void VSTWrapper::loadProgramValues(const char* block) {
   // On purpose: the values are not checked against the size of the data. Those that no parameter takes are
   // not read.
   const char* value = block + kProgramContentAt;
+  LockedValues values(*this);
   for (VstInt32 i = 0; i < count && i < parameterCount(); ++i, value += sizeof(float)) {
-    setParameter(i, readFloat(value));
+    values.set(i, readFloat(value));
   }
 }
 

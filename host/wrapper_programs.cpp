@@ -6,6 +6,7 @@
 #include <cstring>
 
 #include "host/data_sizes.h"
+#include "host/locked_values.h"
 #include "host/vst_wrapper.h"
 #include "support/text_buffer.h"
 #include "vst2/dispatch.h"
@@ -90,8 +91,9 @@ void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
   std::memset(store.data(), 0, static_cast<std::size_t>(store.size()));
   const std::string name = getCurrentProgramName();
   std::memcpy(store.data(), name.c_str(), std::min(name.size(), kStoreNameSize - 1));
+  const LockedValues values(*this);
   for (VstInt32 i = 0; i < parameters; ++i) {
-    const float value = getParameter(i);
+    const float value = values.get(i);
     std::memcpy(valueInStore(store.data(), i), &value, sizeof value);
   }
 }
@@ -99,10 +101,11 @@ void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
 void VSTWrapper::restoreFromTempParameterStore(const AutoBuffer<char>& store) {
   changeProgramName(currentProgram(), store.data());
   // A plug-in may have got more parameters meanwhile: nothing is read behind the store's end.
+  LockedValues values(*this);
   for (VstInt32 i = 0; i < valuesInStore(store) && i < parameterCount(); ++i) {
     float value = 0.0f;
     std::memcpy(&value, valueInStore(const_cast<char*>(store.data()), i), sizeof value);
-    setParameter(i, value);
+    values.set(i, value);
   }
 }
 

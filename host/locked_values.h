@@ -1,0 +1,59 @@
+// Parameter values of an instance, one after the other under one hold of the wrapper's lock.
+//
+// The lock costs more than a plug-in that just tells a value. Where all values are read or written in a row
+// it is taken once for all of them; VSTWrapper::getParameter and setParameter take it for their one.
+#pragma once
+
+#include <mutex>
+
+#include "host/vst_wrapper.h"
+
+/// Holds the lock for as long as it lives. An index outside 0 to numParams - 1, as it is at that moment,
+/// reads as 0.0 and writes nothing. What the plug-in throws is swallowed, value by value.
+class LockedValues {
+ public:
+  explicit LockedValues(VSTWrapper& itsWrapper) : wrapper(itsWrapper), guard(itsWrapper.lock) {}
+
+  [[nodiscard]] float get(VstInt32 index) const {
+    if (!wrapper.hasParameter(index)) return 0.0f;
+    try {
+      return ask(index);
+    } catch (...) {
+      return 0.0f;
+    }
+  }
+
+  void set(VstInt32 index, float value) {
+    if (!wrapper.hasParameter(index)) return;
+    try {
+      // On purpose: a value that the plug-in holds already is never sent.
+      if (ask(index) == value) return;
+      const ParamBeingSet being(wrapper.paramBeingSet, index);
+      wrapper.effect->setParameter(wrapper.effect, index, value);
+    } catch (...) {  // The plug-in's own trouble: the parameter stays as it is.
+    }
+  }
+
+ private:
+  /// Names the parameter that is being set, for as long as it lives.
+  class ParamBeingSet {
+   public:
+    ParamBeingSet(VstInt32& slot, VstInt32 index) : paramBeingSet(slot) { paramBeingSet = index; }
+    ~ParamBeingSet() { paramBeingSet = -1; }
+    ParamBeingSet(const ParamBeingSet&) = delete;
+    ParamBeingSet& operator=(const ParamBeingSet&) = delete;
+
+   private:
+    VstInt32& paramBeingSet;
+  };
+
+  /// The answer goes through memory: where floats are returned in a wider register, it would otherwise differ
+  /// from the 32-bit value that the plug-in was given.
+  [[nodiscard]] float ask(VstInt32 index) const {
+    const volatile float value = wrapper.effect->getParameter(wrapper.effect, index);
+    return value;
+  }
+
+  VSTWrapper& wrapper;
+  const std::lock_guard<const NiduCoreRecursiveMutex> guard;
+};
