@@ -12,10 +12,15 @@
 /// reads as 0.0 and writes nothing. What the plug-in throws is swallowed, value by value.
 class LockedValues {
  public:
-  explicit LockedValues(VSTWrapper& itsWrapper) : wrapper(itsWrapper), guard(itsWrapper.lock) {}
+  explicit LockedValues(VSTWrapper& wrapper)
+      : effect(wrapper.effect), paramBeingSet(wrapper.paramBeingSet), guard(wrapper.lock) {}
+
+  [[nodiscard]] bool has(VstInt32 index) const {
+    return effect != nullptr && index >= 0 && index < effect->numParams;
+  }
 
   [[nodiscard]] float get(VstInt32 index) const {
-    if (!wrapper.hasParameter(index)) return 0.0f;
+    if (!has(index)) return 0.0f;
     try {
       return ask(index);
     } catch (...) {
@@ -24,12 +29,12 @@ class LockedValues {
   }
 
   void set(VstInt32 index, float value) {
-    if (!wrapper.hasParameter(index)) return;
+    if (!has(index)) return;
     try {
       // On purpose: a value that the plug-in holds already is never sent.
       if (ask(index) == value) return;
-      const ParamBeingSet being(wrapper.paramBeingSet, index);
-      wrapper.effect->setParameter(wrapper.effect, index, value);
+      const ParamBeingSet being(paramBeingSet, index);
+      effect->setParameter(effect, index, value);
     } catch (...) {  // The plug-in's own trouble: the parameter stays as it is.
     }
   }
@@ -38,22 +43,23 @@ class LockedValues {
   /// Names the parameter that is being set, for as long as it lives.
   class ParamBeingSet {
    public:
-    ParamBeingSet(VstInt32& slot, VstInt32 index) : paramBeingSet(slot) { paramBeingSet = index; }
-    ~ParamBeingSet() { paramBeingSet = -1; }
+    ParamBeingSet(VstInt32& itsSlot, VstInt32 index) : slot(itsSlot) { slot = index; }
+    ~ParamBeingSet() { slot = -1; }
     ParamBeingSet(const ParamBeingSet&) = delete;
     ParamBeingSet& operator=(const ParamBeingSet&) = delete;
 
    private:
-    VstInt32& paramBeingSet;
+    VstInt32& slot;
   };
 
   /// The answer goes through memory: where floats are returned in a wider register, it would otherwise differ
   /// from the 32-bit value that the plug-in was given.
   [[nodiscard]] float ask(VstInt32 index) const {
-    const volatile float value = wrapper.effect->getParameter(wrapper.effect, index);
+    const volatile float value = effect->getParameter(effect, index);
     return value;
   }
 
-  VSTWrapper& wrapper;
+  AEffect* const effect;
+  VstInt32& paramBeingSet;
   const std::lock_guard<const NiduCoreRecursiveMutex> guard;
 };

@@ -201,8 +201,6 @@ class VSTWrapper {
   static VstInt32 gCurrentLoadID;
 
  private:
-  friend class LockedValues;
-
   VSTWrapper(const NiduCOM::i_ptr<VSTPluginLoader>& module, const VST_ChildSpec& child,
              KelVSTSupportEffect* support);
 

@@ -149,7 +149,7 @@ void VSTWrapper::loadProgramValues(const char* block) {
   // not read.
   const char* value = block + kProgramContentAt;
   LockedValues values(*this);
-  for (VstInt32 i = 0; i < count && i < parameterCount(); ++i, value += sizeof(float)) {
+  for (VstInt32 i = 0; i < count && values.has(i); ++i, value += sizeof(float)) {
     values.set(i, readFloat(value));
   }
 }

@@ -102,7 +102,7 @@ void VSTWrapper::restoreFromTempParameterStore(const AutoBuffer<char>& store) {
   changeProgramName(currentProgram(), store.data());
   // A plug-in may have got more parameters meanwhile: nothing is read behind the store's end.
   LockedValues values(*this);
-  for (VstInt32 i = 0; i < valuesInStore(store) && i < parameterCount(); ++i) {
+  for (VstInt32 i = 0; i < valuesInStore(store) && values.has(i); ++i) {
     float value = 0.0f;
     std::memcpy(&value, valueInStore(const_cast<char*>(store.data()), i), sizeof value);
     values.set(i, value);
