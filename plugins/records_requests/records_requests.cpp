@@ -6,7 +6,8 @@
 //   INSTANCE dispatch OPCODE index INDEX value VALUE ptr CONTENT opt NUMBER     (CONTENT: see
 //   describePointer) INSTANCE getParameter INDEX answers NUMBER INSTANCE setParameter INDEX value NUMBER
 //
-// Instances count from 1. RECORDS_REQUESTS_CHUNKS=1 makes it save its state in chunks.
+// Instances count from 1. RECORDS_REQUESTS_CHUNKS=1 makes it save its state in chunks,
+// RECORDS_REQUESTS_UNNAMED_PROGRAMS=1 leaves it without a name for a program that is not the current one.
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -18,14 +19,18 @@ using namespace sample_plugins;
 
 namespace {
 
+bool isAskedFor(const char* variable) {
+  const char* value = std::getenv(variable);
+  return value != nullptr && std::strcmp(value, "1") == 0;
+}
+
 Description describe() {
   Description description{"Records requests", fourCharacterCode('R', 'e', 'c', 'R')};
   description.numInputs = 2;
   description.numOutputs = 3;
   description.parameters = {{"First", "a", 0.25f}, {"Second", "b", 0.5f}, {"Steps", "", 0.0f, 0, 4}};
   description.programNames = {"One", "Two", "Three"};
-  const char* chunks = std::getenv("RECORDS_REQUESTS_CHUNKS");
-  if (chunks != nullptr && std::strcmp(chunks, "1") == 0) description.flags = effFlagsProgramChunks;
+  if (isAskedFor("RECORDS_REQUESTS_CHUNKS")) description.flags = effFlagsProgramChunks;
   return description;
 }
 
@@ -51,6 +56,7 @@ class RecordsRequests : public SamplePlugin {
     write("dispatch " + std::to_string(opcode) + " index " + std::to_string(index) + " value " +
           describeValue(opcode, value) + " ptr " + describePointer(opcode, value, ptr) + " opt " +
           numberText(opt));
+    if (opcode == effGetProgramNameIndexed && hidesNames) return 0;
     return SamplePlugin::dispatch(opcode, index, value, ptr, opt);
   }
 
@@ -74,6 +80,7 @@ class RecordsRequests : public SamplePlugin {
 
   static inline int instances = 0;
   const int instance;
+  const bool hidesNames = isAskedFor("RECORDS_REQUESTS_UNNAMED_PROGRAMS");
 };
 
 }  // namespace
