@@ -67,7 +67,7 @@ TEST_F(LoadBank, PassesTheMagicCheckWithTheReversedChunkMagic) {
 
 TEST_F(LoadBank, DoesNothingForANegativeCount) {
   open();
-  for (const std::int64_t count : {-1L, -2147483648L}) {
+  for (const std::int64_t count : {std::int64_t{-1}, std::int64_t{-2147483648}}) {
     EXPECT_TRUE(loadAs(with(threePrograms, 24, word(count)), 28));
     EXPECT_THAT(requests(), IsEmpty());
   }

@@ -84,7 +84,7 @@ TEST_F(LoadProgram, LeavesParametersThatTheDataDoesNotHave) {
 TEST_F(LoadProgram, SetsNothingForACountBelowOne) {
   effect.setPrograms({{"Init", {0.0f}}});
   open();
-  for (const std::int64_t count : {0L, -1L, -2147483648L}) {
+  for (const std::int64_t count : {std::int64_t{0}, std::int64_t{-1}, std::int64_t{-2147483648}}) {
     effect.forget();
     EXPECT_TRUE(load(with(program("Init", {kHalf}), 24, word(count))));
     EXPECT_EQ(requests(), keepsName());
