@@ -58,6 +58,8 @@ LOAD_PRESET = {
     "bank_negative_count": plugin() + header(b"FxBk", -1),
     "bank_stride_zero_for_ever": plugin() + stride(TWO[:24] + word(0x7FFFFFFF) + TWO[28:], -14),
     "bank_stride_negative": plugin() + stride(TWO, -29),
+    "bank_stride_before_the_data": plugin() + stride(TWO, -54),
+    "bank_stride_far_before_the_data": plugin() + stride(TWO, -0x80000000),
     "bank_stride_above_an_int": plugin() + stride(TWO, 0x7FFFFFFF),
     "program_chunk": plugin(chunks=True) + program_chunk(b"chunk"),
     "program_chunk_reversed": plugin(chunks=True) + program_chunk(b"chunk", form=b"hCPF"),
