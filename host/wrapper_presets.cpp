@@ -114,7 +114,9 @@ void VSTWrapper::saveParameterBank(AutoBuffer<char>& out) {
   const VstInt32 blocks = std::max(programs, 1);
   const int blockSize = programSizeOrFail(parameters);
   out.setSize(sizeOrFail(kBankContentAt, blocks, blockSize));
-  std::memset(out.data(), 0, static_cast<std::size_t>(out.size()));
+  // Each program writes the whole of its block. Only the room in a bank without programs may stay empty.
+  const int unwritten = programs > 0 ? 0 : blockSize;
+  std::memset(out.data(), 0, kBankContentAt + static_cast<std::size_t>(unwritten));
   writeHeader(out.data(), kPresetParameterBankMagic, effect, programs);
 
   const auto blockAt = [&](VstInt32 program) {

@@ -111,7 +111,7 @@ static State saveBank(AEffect* effect) {
   const size_t stride = programSize(effect);
   const size_t size = kBankContentAt + stride * (size_t)(programs > 0 ? programs : 1);
   const State state = {memory(size), size};
-  memset(state.bytes, 0, size);
+  memset(state.bytes, 0, programs > 0 ? kBankContentAt : size);
   writeHeader(state.bytes, "FxBk", effect, programs);
   const int32_t current = currentProgram(effect);
   char* store = setAside(effect);
