@@ -13,7 +13,8 @@
 
 namespace sample_plugins {
 
-bool answersLongTexts = false;
+VstInt32 longTextRequest = kNoRequest;
+bool yieldsNoInstance = false;
 
 namespace {
 
@@ -31,6 +32,17 @@ std::string& kindUnderWay() {
   return kind;
 }
 
+/// What stands behind the colon of the fault's name; empty without one.
+std::string faultDetail() {
+  const std::size_t colon = kindUnderWay().find(':');
+  return colon == std::string::npos ? "" : kindUnderWay().substr(colon + 1);
+}
+
+void answerLongTexts() {
+  const std::string opcode = faultDetail();
+  longTextRequest = opcode.empty() ? kEveryRequest : std::atoi(opcode.c_str());
+}
+
 /// Stays in the stream's buffer until somebody flushes it.
 void printWithoutNewline() { std::fputs("a text without an end", stdout); }
 
@@ -40,7 +52,7 @@ void divideByZero() {
 }
 
 void raiseSignal() {
-  const std::string name = kindUnderWay().substr(std::strlen("raise:"));
+  const std::string name = faultDetail();
   for (int number = 1; number < NSIG; ++number) {
     const char* abbreviation = sigabbrev_np(number);
     if (abbreviation != nullptr && name == std::string("SIG") + abbreviation) {
@@ -88,14 +100,18 @@ constexpr Fault kFaults[] = {
     {"crash_under_destructor_lock", crashUnderDestructorLock},
     {"thread_crash", crashOnAThread},
     {"thread_throw", throwOnAThread},
+    {"thread_crash_behind_the_run", crashOnAThreadBehindTheRun},
     {"crash_in_atexit", crashInAtExit},
+    {"crash_in_every_atexit", crashInEveryAtExit},
     {"crash_in_static_destructor", crashInStaticDestructor},
     {"replace_handlers_then_crash", replaceHandlersThenCrash},
     {"block_signals_then_crash", blockSignalsThenCrash},
+    {"block_signals", blockSignalsButCrashes},
     {"print", printWithoutNewline},
     {"close_stdout", closeStdout},
     {"flood_stdout", floodStdout},
-    {"long_texts", [] { answersLongTexts = true; }},
+    {"long_texts", answerLongTexts},
+    {"no_instance", [] { yieldsNoInstance = true; }},
     {"fork_keeping_stdout", forkKeepingStdout},
     {"change_locale_and_directory", changeLocaleAndDirectory},
     {"trap_floating_point", trapFloatingPoint},

@@ -2,18 +2,26 @@
 //
 // Several faults, joined by a plus sign, are committed one after the other: print+null_store.
 // FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise takes the signal's
-// name behind a colon: raise:SIGTERM.
+// name behind a colon: raise:SIGTERM. long_texts takes the request whose answer is too long, or all of them:
+// long_texts:45.
 #pragma once
 
 #include <string>
+
+#include "vst2/basic_types.h"
 
 namespace sample_plugins {
 
 /// Does what FAULT_KIND names. Returns from those faults that leave the plug-in running.
 void commitFault();
 
-/// Every answer in text is 4000 bytes long from now on.
-extern bool answersLongTexts;
+/// The request, by its opcode, that is answered with 4000 bytes of text from now on.
+extern VstInt32 longTextRequest;
+constexpr VstInt32 kNoRequest = -1;
+constexpr VstInt32 kEveryRequest = -2;
+
+/// The entry point answers null from now on.
+extern bool yieldsNoInstance;
 
 /// A test asked for something that does not exist: says so on standard error and ends the process with 125.
 [[noreturn]] void complain(const std::string& problem);
@@ -36,14 +44,20 @@ void crashUnderDestructorLock();
 // Faults on a thread of the plug-in's own.
 void crashOnAThread();
 void throwOnAThread();
+/// The crash of one thread has begun and waits in an exit handler; the run goes on meanwhile.
+void crashOnAThreadBehindTheRun();
 
 // Faults that wait until the process ends.
 void crashInAtExit();
+/// Each time one of them crashes, the next one stands there already.
+void crashInEveryAtExit();
 void crashInStaticDestructor();
 
 // Faults of the process: the plug-in changes what it shares with its host.
 void replaceHandlersThenCrash();
 void blockSignalsThenCrash();
+/// Those that tell of a crash still arrive.
+void blockSignalsButCrashes();
 void closeStdout();
 void floodStdout();
 void forkKeepingStdout();

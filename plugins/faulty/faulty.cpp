@@ -4,6 +4,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <limits>
+#include <optional>
 
 #include "plugins/faulty/faults.h"
 #include "plugins/faulty/place.h"
@@ -45,6 +47,19 @@ bool isTextRequest(VstInt32 opcode) {
   }
 }
 
+bool isAnsweredAtLength(VstInt32 opcode) {
+  return opcode == longTextRequest || (longTextRequest == kEveryRequest && isTextRequest(opcode));
+}
+
+/// Some texts are asked for only after another answer: the product's name when the effect has none, a
+/// program's name by its number when the program cannot be selected, the next child of a shell.
+std::optional<VstIntPtr> answerThatLeadsToTheText(VstInt32 opcode) {
+  if (opcode == effGetEffectName && longTextRequest == effGetProductString) return 0;
+  if (opcode == effSetProgram && longTextRequest == effGetProgramNameIndexed) return 0;
+  if (opcode == effGetPlugCategory && longTextRequest == effShellGetNextPlugin) return kPlugCategShell;
+  return std::nullopt;
+}
+
 /// Counts the places that it gets to.
 class Faulty : public WellBehavedEffect {
  public:
@@ -54,7 +69,8 @@ class Faulty : public WellBehavedEffect {
   VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
     logRequest(opcode);
     reach(Moment::dispatch, opcode);
-    if (answersLongTexts && isTextRequest(opcode)) {
+    if (const auto answer = answerThatLeadsToTheText(opcode)) return *answer;
+    if (isAnsweredAtLength(opcode)) {
       std::memset(ptr, 'x', 3999);
       static_cast<char*>(ptr)[3999] = '\0';
       return 1;
@@ -64,6 +80,8 @@ class Faulty : public WellBehavedEffect {
 
   float getParameter(VstInt32 index) override {
     reach(Moment::getParameter);
+    // A host that compares sees every value differ from this one, and sets it.
+    if (waitsForSetParameter()) return std::numeric_limits<float>::quiet_NaN();
     return WellBehavedEffect::getParameter(index);
   }
 
@@ -77,5 +95,6 @@ class Faulty : public WellBehavedEffect {
 
 SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
   reach(Moment::entry);
+  if (yieldsNoInstance) return nullptr;
   return instantiate<Faulty>(host);
 }

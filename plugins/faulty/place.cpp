@@ -56,12 +56,20 @@ Place parsePlace(const std::string& text) {
   complain("no such place: " + text);
 }
 
+/// Nothing when no fault is wanted.
+const std::optional<Place>& wantedPlace() {
+  static const char* const text = std::getenv("FAULT_PLACE");
+  static const std::optional<Place> place = text == nullptr ? std::nullopt : std::optional(parsePlace(text));
+  return place;
+}
+
 }  // namespace
 
+bool waitsForSetParameter() { return wantedPlace() && wantedPlace()->moment == Moment::setParameter; }
+
 void reach(Moment moment, VstInt32 opcode) {
-  static const char* const text = std::getenv("FAULT_PLACE");
-  if (text == nullptr) return;
-  static const Place wanted = parsePlace(text);
+  if (!wantedPlace()) return;
+  const Place& wanted = *wantedPlace();
   static int turn = 0;
   if (moment == wanted.moment && opcode == wanted.opcode && ++turn == wanted.turn) commitFault();
 }

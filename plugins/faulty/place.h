@@ -15,6 +15,9 @@ namespace sample_plugins {
 
 enum class Moment { load, entry, dispatch, getParameter, setParameter };
 
+/// Whether the fault happens when a parameter is set.
+bool waitsForSetParameter();
+
 /// Tells that the plug-in has got there. The fault is committed when this is the place, and its turn.
 /// `opcode` tells requests apart; other moments have none.
 void reach(Moment moment, VstInt32 opcode = 0);

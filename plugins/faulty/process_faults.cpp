@@ -1,9 +1,11 @@
 // Faults on a plug-in's own thread, at the end of the process, and in what a plug-in shares with its host.
 #include <algorithm>
 #include <cfenv>
+#include <chrono>
 #include <clocale>
 #include <csignal>
 #include <cstdlib>
+#include <future>
 #include <string>
 #include <thread>
 
@@ -30,6 +32,24 @@ void throwOnAThread() {
   std::thread([] { throw 5; }).join();
 }
 
+/// One second is what the way out of a process may take.
+void crashOnAThreadBehindTheRun() {
+  static std::promise<void> leaving;
+  std::atexit([] {
+    leaving.set_value();
+    std::this_thread::sleep_for(std::chrono::milliseconds(300));
+  });
+  std::thread(storeToAddressZero).detach();
+  leaving.get_future().wait();
+}
+
+void crashInEveryAtExit() {
+  std::atexit([] {
+    crashInEveryAtExit();
+    storeToAddressZero();
+  });
+}
+
 void crashInAtExit() { std::atexit(storeToAddressZero); }
 
 void crashInStaticDestructor() { crashesWhenDestroyed = true; }
@@ -47,6 +67,15 @@ void blockSignalsThenCrash() {
   sigfillset(&all);
   pthread_sigmask(SIG_BLOCK, &all, nullptr);
   storeToAddressZero();
+}
+
+void blockSignalsButCrashes() {
+  sigset_t most;
+  sigfillset(&most);
+  for (const int number : {SIGABRT, SIGSEGV, SIGBUS, SIGILL, SIGFPE, SIGTRAP, SIGSYS}) {
+    sigdelset(&most, number);
+  }
+  pthread_sigmask(SIG_BLOCK, &most, nullptr);
 }
 
 void closeStdout() { close(STDOUT_FILENO); }

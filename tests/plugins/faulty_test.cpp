@@ -207,4 +207,21 @@ TEST(FaultOfTheProcess, AnswersLongTexts) {
   EXPECT_THAT(run.standardOutput, HasSubstr("opened\ntext of 3999\ntext of 3999\ntail of 0\n"));
 }
 
+TEST(FaultOfTheProcess, AnswersOneRequestWithALongText) {
+  EXPECT_THAT(driveFaulty("long_texts:45", "entry").standardOutput,
+              HasSubstr("opened\ntext of 3999\ntext of 5\ntail of 0\n"));
+}
+
+TEST(FaultOfTheProcess, CrashesInEveryExitHandler) {
+  const ProgramRun run = driveFaulty("crash_in_every_atexit", "dispatch:52");
+  EXPECT_EQ(run.end, "signal 11");
+  EXPECT_THAT(run.standardOutput, AllOf(StartsWith(kWholeRun), EndsWith("closed\n")));
+}
+
+TEST(FaultOfTheProcess, BlocksSignalsAndGoesOn) {
+  const ProgramRun run = driveFaulty("block_signals+raise:SIGTERM", "dispatch:45");
+  EXPECT_EQ(run.end, "exit status 0") << "the signal waits for ever";
+  EXPECT_EQ(driveFaulty("block_signals+raise:SIGSEGV", "dispatch:45").end, "signal 11");
+}
+
 }  // namespace
