@@ -1,0 +1,63 @@
+"""Every end is a known end: the program with a faulty plug-in, one run for each kind of fault at each place.
+
+    fault_matrix.py --program build/release/vsttorture --plugins build/release/plugins [--only REGEX] [--list]
+
+Prints a line for each row that fails, then a summary. The rows stand in rows.py.
+"""
+import argparse
+import concurrent.futures
+import os
+import pathlib
+import re
+import resource
+import sys
+import time
+
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
+import try_plugin  # noqa: E402
+from program_run import LIMIT_IN_SECONDS, differences, environment_of, plugin_path, run_row  # noqa: E402
+from rows import all_rows  # noqa: E402
+
+
+def check(row, program, plugins):
+    """What is wrong with the row; empty when it holds."""
+    return differences(row, run_row(row, program, plugins), try_plugin.judge)
+
+
+def chosen_rows(pattern):
+    return [row for row in all_rows() if re.search(pattern, row.name)]
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--program", help="the vsttorture to run")
+    parser.add_argument("--plugins", help="the folder of the sample plug-ins")
+    parser.add_argument("--only", default="", metavar="REGEX", help="rows whose name matches")
+    parser.add_argument("--list", action="store_true", help="print the rows and what they demand")
+    parser.add_argument("--jobs", type=int, default=4, help="runs at a time; some of them only wait")
+    arguments = parser.parse_args()
+
+    rows = chosen_rows(arguments.only)
+    if arguments.list:
+        for row in rows:
+            print(f"{row.name}\t{row.end.steps} steps, {row.end.tail!r}, status {row.end.status}")
+        return 0
+    if not rows:
+        print("no such row")
+        return 1
+
+    resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+    started = time.monotonic()
+    program, plugins = os.path.abspath(arguments.program), os.path.abspath(arguments.plugins)
+    failed = 0
+    with concurrent.futures.ThreadPoolExecutor(arguments.jobs) as pool:
+        for row, found in zip(rows, pool.map(lambda row: check(row, program, plugins), rows)):
+            if found:
+                failed += 1
+                print(f"{row.name}: {'; '.join(found)}", flush=True)
+    print(f"{len(rows)} rows in {time.monotonic() - started:.0f} s, {failed} failed")
+    return 1 if failed else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())
