@@ -1,0 +1,227 @@
+"""Compiles the program for macOS with each of its three targets and links it where there is a linker.
+
+The sources are those of CMake's own build for macOS (preset mac_check). Each check has controls: a fault is put in,
+and the check has to find it.
+"""
+
+import json
+import re
+import shlex
+import sys
+
+from checks import BUILD, ROOT, doctored, report, run, verdict
+
+HERE = ROOT / "tests" / "macos"
+FOLDERS = ("driver", "describe", "host", "loader", "support", "platform", "vst2")
+
+# What a source may include in angle brackets: headers that macOS has and that need no other library of C++ than the
+# one of macOS 10.13.
+HEADERS = set("""
+    algorithm array atomic cctype cerrno climits cmath csignal cstdarg cstddef cstdint cstdio cstdlib cstring ctime
+    exception functional initializer_list iterator limits map memory mutex new numeric optional random set stdexcept
+    string string_view thread tuple type_traits typeinfo unordered_map utility vector
+    fcntl.h poll.h pthread.h sys/mman.h sys/stat.h sys/types.h unistd.h
+    CoreFoundation/CoreFoundation.h ExceptionHandling/NSExceptionHandler.h Foundation/Foundation.h
+    libkern/OSAtomic.h mach/mach.h mach/semaphore.h mach/sync_policy.h mach/task.h
+    """.split())
+
+# Faults that must not compile: name, source, file with the fault, text, text with the fault, what the compiler says.
+COMPILE_CONTROLS = (
+    ("a misspelt function of CoreFoundation", "loader/module_loader.cpp", "loader/module_loader.cpp",
+     "CFBundleLoadExecutable(bundle)", "CFBundleLoadExecutible(bundle)",
+     "undeclared identifier 'CFBundleLoadExecutible'"),
+    ("swapped arguments to CoreFoundation", "loader/module_loader.cpp", "loader/module_loader.cpp",
+     "kCFURLPOSIXPathStyle, false", "false, kCFURLPOSIXPathStyle",
+     "no matching function for call to 'CFURLCreateWithFileSystemPath'"),
+    ("swapped arguments to the atomic addition", "support/recursive_mutex.cpp", "support/atomic_add.h",
+     "OSAtomicAdd32Barrier(amount, target)", "OSAtomicAdd32Barrier(target, amount)",
+     "no matching function for call to 'OSAtomicAdd32Barrier'"),
+    ("an atomic addition without leave to use the old one", "support/recursive_mutex.cpp",
+     "platform/atomic_add.h", "#define OSATOMIC_DEPRECATED 0\n", "", "'OSAtomicAdd32Barrier' is deprecated"),
+    ("swapped arguments to the Mach kernel", "support/semaphore.cpp", "support/semaphore.cpp",
+     "semaphore_destroy(mach_task_self(), implementation->semaphore)",
+     "semaphore_destroy(implementation->semaphore)", "no matching function for call to 'semaphore_destroy'"),
+    ("a misspelt method of the exception handler", "platform/macos/exception_handler.mm",
+     "platform/macos/exception_handler.mm", "setExceptionHandlingMask:", "setExceptionHandlerMask:",
+     "instance method '-setExceptionHandlerMask:' not found"),
+    ("a missing header of a framework", "platform/macos/exception_handler.mm",
+     "platform/macos/exception_handler.mm", "#import <ExceptionHandling/NSExceptionHandler.h>\n", "",
+     "'NSExceptionHandler'"),
+)
+NEWER_LIBRARY_CONTROL = (
+    "a function of C++'s library that macOS 10.13 lacks", "loader/plugin_identity.cpp",
+    "loader/plugin_identity.cpp", '#include "loader/plugin_identity.h"\n',
+    '#include "loader/plugin_identity.h"\n#include <charconv>\n'
+    "bool fits(char* text, int number);\n"
+    "bool fits(char* text, int number) { return std::to_chars(text, text + 4, number).ec == std::errc(); }\n",
+    "is unavailable: introduced in macOS 10.15")
+
+
+class Target:
+    """The program for one kind of Mac."""
+
+    def __init__(self, triple):
+        self.triple = triple
+        self.name = triple.split("-")[0]
+        self.directory = BUILD / self.name
+        self.commands = {}  # the compiler's command of each source, by its path in the project
+        self.objects = []
+
+    def configure(self):
+        version = re.search(r"macosx?([\d.]+)$", self.triple).group(1)
+        result = run(["cmake", "--preset", "mac_check", "-B", str(self.directory),
+                      f"-DVSTTORTURE_MAC_TARGET={self.triple}", f"-DCMAKE_OSX_DEPLOYMENT_TARGET={version}"], cwd=ROOT)
+        if result.returncode != 0:
+            return report(f"{self.name}: CMake configures the build for macOS", False, result.stdout)
+        for entry in json.loads((self.directory / "compile_commands.json").read_text()):
+            command = shlex.split(entry["command"])
+            self.commands[entry["file"].removeprefix(f"{ROOT}/")] = command
+            self.objects.append(command[command.index("-o") + 1])
+        return report(f"{self.name}: CMake configures the build for macOS", True)
+
+    def compile(self):
+        result = run(["ninja", "-C", str(self.directory), "-k", "0", *self.objects])
+        return report(f"{self.name}: {len(self.commands)} sources compile for {self.triple}",
+                      result.returncode == 0, result.stdout)
+
+    def compile_with_fault(self, control, output=None):
+        """The compiler's answer to a source with a fault, in it or in a header of it."""
+        _, source, faulty_file, before, after, _ = control
+        overlay = self.directory / "faulty"
+        faulty_copy = overlay / faulty_file
+        faulty_copy.parent.mkdir(parents=True, exist_ok=True)
+        faulty_copy.write_text(doctored(faulty_file, before, after))
+        command = list(self.commands[source])
+        command[command.index("-o") + 1] = str(output or self.directory / "faulty.o")
+        command[command.index("-c") + 1] = str(overlay / source if source == faulty_file else ROOT / source)
+        command[1:1] = [f"-I{overlay}"]
+        result = run(command, cwd=self.directory)
+        faulty_copy.unlink()
+        return result
+
+    def compile_controls(self):
+        controls = list(COMPILE_CONTROLS)
+        if self.name != "arm64":
+            controls.append(NEWER_LIBRARY_CONTROL)
+        missed = ""
+        for control in controls:
+            result = self.compile_with_fault(control)
+            if result.returncode == 0 or control[-1] not in result.stdout:
+                missed += f"not found: {control[0]}\n{result.stdout}\n"
+        report(f"{self.name}: control: {len(controls)} faults do not compile", not missed, missed)
+
+    # Linking. Both kinds of fault: a name that the program should not use, a name that is not offered.
+
+    def unknown_function(self):
+        """An object file that calls what glibc has and macOS lacks. It does compile."""
+        faulty = self.directory / "calls_unknown_function.o"
+        result = self.compile_with_fault(
+            ("", "driver/report.cpp", "driver/report.cpp", "    std::fflush(stdout);\n  }\n  funlockfile",
+             "    fflush_unlocked(stdout);\n  }\n  funlockfile", ""), faulty)
+        return faulty if report(f"{self.name}: control: a source that calls fflush_unlocked compiles",
+                                result.returncode == 0, result.stdout) else None
+
+    def link(self):
+        result = run(["ninja", "-C", str(self.directory), "vsttorture"])
+        report(f"{self.name}: the program links against the stubs of macOS's libraries", result.returncode == 0,
+               result.stdout)
+
+    def link_controls(self):
+        commands = run(["ninja", "-C", str(self.directory), "-t", "commands", "vsttorture"]).stdout.splitlines()
+        link = commands[-1].replace(" -o vsttorture ", " -o faulty_program ")
+        name = f"{self.name}: control: a link without CFBundleCreate fails"
+        stubs = HERE / "stubs" / "sysroot"
+        fewer_stubs = self.directory / "fewer_stubs"
+        run(["rm", "-rf", str(fewer_stubs)])
+        run(["cp", "-r", str(stubs), str(fewer_stubs)])
+        stub = fewer_stubs / "System/Library/Frameworks/CoreFoundation.framework/CoreFoundation.tbd"
+        stub.write_text(doctored(stub, " _CFBundleCreate,", ""))
+        result = run(link.replace(str(stubs), str(fewer_stubs)), cwd=self.directory)
+        report(name, result.returncode != 0 and undefined_in(result.stdout) == {"_CFBundleCreate"}, result.stdout)
+
+        if faulty := self.unknown_function():
+            result = run(link.replace(" -o faulty_program ", f" {faulty} -o faulty_program "), cwd=self.directory)
+            report(f"{self.name}: control: a link with fflush_unlocked fails",
+                   result.returncode != 0 and undefined_in(result.stdout) == {"_fflush_unlocked"}, result.stdout)
+
+    # Where there is no linker: names that no object file defines, against a list.
+
+    def undefined(self, more=()):
+        listing = run(["llvm-nm-14", *self.objects, *more], cwd=self.directory).stdout
+        symbols = [line.split()[-2:] for line in listing.splitlines() if line and not line.endswith(":")]
+        defined = {name for kind, name in symbols if kind not in "Uu"}
+        return {name for kind, name in symbols if kind in "Uu"} - defined - {"___dso_handle"}
+
+    def check_undefined(self):
+        lines = (HERE / "i386_undefined_symbols.txt").read_text().splitlines()
+        allowed = {line for line in lines if line and not line.startswith("#")}
+        found = self.undefined()
+        report(f"{self.name}: each of {len(found)} undefined symbols is on the list", found and found <= allowed,
+               "not on the list: " + " ".join(sorted(found - allowed)))
+        if faulty := self.unknown_function():
+            surplus = self.undefined([str(faulty)]) - found
+            report(f"{self.name}: control: fflush_unlocked is not on the list",
+                   surplus == {"_fflush_unlocked"} and not surplus & allowed, str(surplus))
+
+
+def undefined_in(linker_output):
+    return set(re.findall(r"undefined symbol: (\S+)", linker_output))
+
+
+def forgotten(sources_on_disk, compiled):
+    return sorted(set(sources_on_disk) - set(compiled))
+
+
+def check_completeness(compiled):
+    """Every source of the program, those for Linux left aside, is among those that the build for macOS compiles."""
+    on_disk = [str(path.relative_to(ROOT)) for folder in FOLDERS for suffix in ("cpp", "mm")
+               for path in (ROOT / folder).rglob(f"*.{suffix}")]
+    on_disk = [path for path in on_disk if not path.startswith("platform/linux/")]
+    missing = forgotten(on_disk, compiled)
+    report(f"the build for macOS forgets none of the {len(on_disk)} sources", on_disk and not missing,
+           "\n".join(missing))
+    surplus = forgotten(compiled, on_disk)
+    report("the build for macOS compiles no source for Linux", not surplus, "\n".join(surplus))
+    report("control: a source that CMake does not list is found",
+           forgotten(on_disk + ["host/new.cpp"], compiled) == ["host/new.cpp"])
+
+
+def strange_headers(text):
+    return set(re.findall(r"^\s*#\s*(?:include|import)\s*<([^>]+)>", text, re.MULTILINE)) - HEADERS
+
+
+def check_headers():
+    """Headers of this machine stand in for macOS's, so headers that only this one has are looked for by name."""
+    files = [path for folder in FOLDERS for suffix in ("h", "cpp", "mm")
+             for path in (ROOT / folder).rglob(f"*.{suffix}") if "platform/linux" not in str(path)]
+    strange = [f"{path.relative_to(ROOT)}: <{header}>" for path in files
+               for header in sorted(strange_headers(path.read_text()))]
+    report(f"{len(files)} sources and headers include nothing that macOS lacks", files and not strange,
+           "\n".join(strange))
+    report("control: a header of Linux and one of a newer library are found",
+           strange_headers("#include <vector>\n#include <sys/epoll.h>\n# include <filesystem>\n") ==
+           {"sys/epoll.h", "filesystem"})
+
+
+def main():
+    targets = [Target(triple) for triple in
+               ("x86_64-apple-macosx10.13", "i386-apple-macosx10.13", "arm64-apple-macos11")]
+    check_headers()
+    for target in targets:
+        if not target.configure():
+            continue
+        if target is targets[0]:
+            check_completeness(target.commands)
+        if not target.compile():
+            continue
+        target.compile_controls()
+        if target.name == "i386":
+            target.check_undefined()
+        else:
+            target.link()
+            target.link_controls()
+    return verdict()
+
+
+if __name__ == "__main__":
+    sys.exit(main())
