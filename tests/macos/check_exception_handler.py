@@ -1,0 +1,105 @@
+"""Runs the Objective-C++ source of macOS on GNUstep, with a double of macOS's exception handler.
+
+First the guard alone, whose double tells each thing that is done to it; then the whole program on a plug-in that
+raises an exception of Foundation. The controls are programs with a fault; each has to look different.
+"""
+
+import subprocess
+import sys
+
+from checks import BUILD, ROOT, report, run, verdict
+
+DIRECTORY = BUILD / "gnustep"
+
+ARMED = """\
+handler: delegate nidu_VST_Support_ExceptionHandlerDelegate
+handler: mask 1023
+signal: SIGINT
+signal: SIGABRT
+signal: SIGHUP
+signal: SIGKILL
+signal: SIGSEGV
+signal: SIGTERM
+signal: SIGBUS
+"""
+GUARD = ARMED + """\
+class: nidu_VST_Support_ExceptionHandlerDelegate of NSObject
+class: 0 variables
+class: -init
+class: -dealloc
+class: -shouldDisplayException:
+class: -exceptionHandler:shouldLogException:mask:
+class: -exceptionHandler:shouldHandleException:mask:
+answer: display 0
+answer: log 1
+pool: drained
+handler: delegate nil
+end
+"""
+STEPS = "total, 64\n1, test gathering info\n"
+RAISED = ARMED + """\
+handler: log NobodyCatchesThis, mask 256
+handler: log answered yes
+handler: handle NobodyCatchesThis, mask 512
+"""
+
+
+def outcome(program, *arguments):
+    """Standard output, standard error and status."""
+    result = run([str(DIRECTORY / program), *arguments], stderr=subprocess.PIPE)
+    return result.stdout, result.stderr, result.returncode
+
+
+def show(found):
+    return f"standard output:\n{found[0]}\nstandard error:\n{found[1]}\nstatus {found[2]}"
+
+
+def check_guard():
+    found = outcome("trace")
+    report("GNUstep: the guard arms the handler, answers and lets go in order", found == ("", GUARD, 0), show(found))
+    for program, fault, before, after in (
+            ("trace_release_order", "delegate released before pool",
+             "pool: drained\nhandler: delegate nil\n", "handler: delegate nil\npool: drained\n"),
+            ("trace_mask", "mask 1022", "handler: mask 1023\n", "handler: mask 1022\n"),
+            ("trace_guard_first", "signal guard before the delegate", ARMED,
+             "\n".join(ARMED.splitlines()[2:] + ARMED.splitlines()[:2]) + "\n"),
+            ("trace_stays_attached", "a delegate that stays attached", "handler: delegate nil\n", "")):
+        found = outcome(program)
+        report(f"GNUstep: control: {fault} is seen", found == ("", GUARD.replace(before, after), 0) != ("", GUARD, 0),
+               show(found))
+
+
+def check_exception():
+    plugin = str(DIRECTORY / "raises_exception.so")
+    wanted = (STEPS + "unexpected exit", RAISED, 7)
+    found = outcome("torture", plugin)
+    report("GNUstep: an exception raised in a plug-in is logged, handled and ends with status 7", found == wanted,
+           show(found))
+    caught = STEPS + "!gather info failed, unknown error\n"
+    for program, fault, control in (
+            ("torture_not_handed_on", "an exception not handed on",
+             (caught, RAISED + "handler: handle answered yes\nhandler: delegate nil\n", 3)),
+            ("torture_misspelt_selector", "a misspelt method of the delegate",
+             (caught, RAISED[:RAISED.index("handler: handle")] + "handler: delegate nil\n", 3)),
+            ("torture_not_logged", "an exception not logged",
+             (wanted[0], RAISED.replace("answered yes", "answered no"), 7))):
+        found = outcome(program, plugin)
+        report(f"GNUstep: control: {fault} is seen", found == control != wanted, show(found))
+
+
+def main():
+    steps = (["cmake", "-G", "Ninja", "-S", str(ROOT / "tests" / "macos" / "gnustep"), "-B", str(DIRECTORY),
+              "-DCMAKE_BUILD_TYPE=Release"], ["ninja", "-C", str(DIRECTORY)])
+    for step in steps:
+        result = run(step)
+        if result.returncode != 0:
+            report("GNUstep: the program builds with the sources of macOS", False, result.stdout)
+            return verdict()
+    report("GNUstep: the program builds with the sources of macOS", True)
+    check_guard()
+    check_exception()
+    return verdict()
+
+
+if __name__ == "__main__":
+    sys.exit(main())
