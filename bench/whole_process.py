@@ -89,8 +89,9 @@ class Bench:
 
 
 def light(bench):
-    """Creation, description and close (a shell's whole run), and a full run on a plug-in of three parameters."""
-    for name in ("shell", "well_behaved_effect"):
+    """Creation, description and close (a shell's whole run), and full runs on a plug-in of three parameters and on one
+    without any, which is written in C."""
+    for name in ("shell", "well_behaved_effect", "null_plugin"):
         bench.compare(name, bench.sample(name), 300)
         bench.compare_memory(name, bench.sample(name))
 
