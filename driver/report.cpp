@@ -44,6 +44,13 @@ bool outputTakesMore() {
   return poll(&output, 1, 0) == 1 && (output.revents & POLLOUT) != 0;
 }
 
+/// Safe inside a signal handler.
+long long nowInMilliseconds() {
+  timespec now = {};
+  clock_gettime(CLOCK_MONOTONIC, &now);
+  return now.tv_sec * 1000LL + now.tv_nsec / 1000000;
+}
+
 /// Keeps the signals that ask a process to end waiting for a moment.
 class HeldSignals {
  public:
@@ -119,11 +126,11 @@ void printUnexpectedExit() {
 }
 
 void printUnexpectedExitDirectly() {
-  // Somebody else may be just about to have said it.
+  // Somebody else may be just about to have said it. The clock is asked, since on a busy machine a sleep of a
+  // millisecond takes many.
   const timespec millisecond = {0, 1000000};
-  for (int i = 0; i < kPatienceInMilliseconds && lastWords == LastWords::kBeingSaid; ++i) {
-    nanosleep(&millisecond, nullptr);
-  }
+  const long long limit = nowInMilliseconds() + kPatienceInMilliseconds;
+  while (lastWords == LastWords::kBeingSaid && nowInMilliseconds() < limit) nanosleep(&millisecond, nullptr);
   if (lastWords.exchange(LastWords::kSaid) == LastWords::kSaid || !outputTakesMore()) return;
   [[maybe_unused]] const ssize_t written = write(STDOUT_FILENO, kLastWords, sizeof kLastWords - 1);
 }
