@@ -93,7 +93,10 @@ struct EarlyEnd {
 class PluginWithoutInstance : public testing::TestWithParam<EarlyEnd> {};
 
 TEST_P(PluginWithoutInstance, EndsWithTheLastWordsAndNothingElse) {
-  const ProgramRun run = runVstTorture({samplePlugin(GetParam().plugin)});
+  ProgramCall call;
+  call.arguments = {samplePlugin(GetParam().plugin)};
+  call.environment = kNoLeakCheck;  // On purpose: an instance that could not be opened is not closed.
+  const ProgramRun run = runVstTorture(call);
   EXPECT_EQ(run.standardOutput, "unexpected exit");
   EXPECT_EQ(run.standardError, "");
   EXPECT_EQ(run.end, GetParam().end);

@@ -6,8 +6,6 @@
 
 using testing::Contains;
 using testing::ElementsAre;
-using testing::Not;
-using testing::StartsWith;
 
 namespace {
 

@@ -1,6 +1,8 @@
-// Faults that a sanitizer takes from the program, so that it cannot show what it does about them.
+// What goes otherwise in a build with a sanitizer: faults that it takes from the program, leaks that it
+// counts.
 #pragma once
 
+#include <map>
 #include <string>
 
 #ifdef __SANITIZE_ADDRESS__
@@ -13,6 +15,9 @@ constexpr bool kWithThreadSanitizer = true;
 #else
 constexpr bool kWithThreadSanitizer = false;
 #endif
+
+/// Added to the environment of a run without the leak check at its end, in a build that has one.
+inline const std::map<std::string, std::string> kNoLeakCheck = {{"LSAN_OPTIONS", "detect_leaks=0"}};
 
 /// Why a case does not apply in a build with a sanitizer; empty where it does.
 struct NotWith {
