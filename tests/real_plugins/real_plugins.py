@@ -89,8 +89,8 @@ class UnpackedPackages:
         return modules_among([f"{at}/{name}" for at, _, names in os.walk(folder) for name in names], folder)
 
 
-def run(program, path, library_path=None):
-    """One run: its end, what it said on standard error, how many seconds it took."""
+def run_program(program, path, library_path=None):
+    """One run: its standard output and standard error, its status (None when it was stopped), its seconds."""
     started = time.monotonic()
     libraries = {"LD_LIBRARY_PATH": library_path} if library_path else {}
     with tempfile.TemporaryDirectory(prefix="real_plugins.", ignore_cleanup_errors=True) as home:
@@ -105,7 +105,13 @@ def run(program, path, library_path=None):
             output, errors = process.communicate()
             status = None
     seconds = time.monotonic() - started
-    return run_end(output.decode(errors="replace"), status), errors.decode(errors="replace"), seconds
+    return output.decode(errors="replace"), errors.decode(errors="replace"), status, seconds
+
+
+def run(program, path, library_path=None):
+    """One run: its end, what it said on standard error, how many seconds it took."""
+    output, errors, status, seconds = run_program(program, path, library_path)
+    return run_end(output, status), errors, seconds
 
 
 class Checker:
