@@ -27,7 +27,7 @@ class ScriptedProgram(unittest.TestCase):
         """The exit status and the output of a whole call."""
         output = io.StringIO()
         with mock.patch("sys.argv", ["real_plugins.py", "--program", str(self.path), *arguments]), \
-             mock.patch.object(real_plugins, "expected_ends", lambda: table), \
+             mock.patch.object(real_plugins, "expected_ends", lambda *_: table), \
              mock.patch.object(real_plugins, "installed_modules", installed.get), \
              mock.patch.dict(os.environ, {"VSTTORTURE_REAL_PLUGINS": required}), \
              contextlib.redirect_stdout(output):
@@ -84,6 +84,62 @@ class Main(ScriptedProgram):
         self.assertRegex(output, rf"^p\ta.so\t{self.CRASH}\t\d+\.\d\d\n")
 
 
+class Unpacked(ScriptedProgram):
+    """Packages in a folder, as fetch_i386.py leaves them."""
+    LACKS_A_LIBRARY = "echo 'libGL.so.1: cannot open shared object file' >&2; echo '!failed'; exit 3"
+
+    def setUp(self):
+        super().setUp()
+        self.root = pathlib.Path(os.path.realpath(self.path.parent), "root")
+        self.put("p/usr/lib/vst/a.so")
+
+    def put(self, name, content=""):
+        path = self.root / name
+        path.parent.mkdir(parents=True, exist_ok=True)
+        path.write_text(content)
+
+    def main(self, table, *arguments):
+        with mock.patch.object(real_plugins, "exports_entry_point", lambda path: "helper" not in path):
+            return super().main(table, {}, "--root", str(self.root), *arguments)
+
+    def test_modules_are_found_below_the_folder_of_their_package(self):
+        self.put("p/usr/lib/vst/ProM.vst/ProM.so")
+        self.put("p/usr/lib/vst/x/helper.so")
+        self.put("p/usr/lib/vst/notes.txt")
+        self.put("p/usr/lib/ladspa/b.so")
+        with mock.patch.object(real_plugins, "exports_entry_point", lambda path: "helper" not in path):
+            unpacked = real_plugins.UnpackedPackages(self.root)
+            self.assertEqual(unpacked.modules("p"), {
+                "a.so": f"{self.root}/p/usr/lib/vst/a.so", "ProM.vst": f"{self.root}/p/usr/lib/vst/ProM.vst"})
+            self.assertIsNone(unpacked.modules("q"))
+
+    def test_the_libraries_beside_are_found(self):
+        self.write('echo "$LD_LIBRARY_PATH" >&2; exit 3')
+        output = self.main({"p": {"a.so": "passes"}})[1]
+        self.assertIn(f"    {self.root}/libraries/usr/lib/i386-linux-gnu:"
+                      f"{self.root}/libraries/lib/i386-linux-gnu\n", output)
+
+    def test_what_the_archive_lacked_is_left_out_aloud(self):
+        self.put("missing", "q\nlibgl1\n")
+        self.put("r/usr/lib/vst/c.so")
+        self.write(f"case $1 in */c.so) {self.LACKS_A_LIBRARY};; esac; exit 0")
+        status, output = self.main({"p": {"a.so": "no total, status 0"}, "q": {"b.so": "passes"},
+                                    "r": {"c.so": "passes"}}, "--required")
+        self.assertIn("left out: q could not be fetched\n", output)
+        self.assertIn("left out: r c.so, libGL.so.1: cannot open shared object file\n", output)
+        self.assertRegex(output, r"\n1 plug-ins run in \d+ s, 0 deviations\n$")
+        self.assertEqual(status, 0)
+
+    def test_a_library_that_lacks_though_everything_was_fetched_is_a_deviation(self):
+        self.put("missing", "")
+        self.write(self.LACKS_A_LIBRARY)
+        self.assertEqual(self.main({"p": {"a.so": "passes"}})[0], 1)
+
+    def test_a_package_that_lacks_though_the_archive_had_it_is_a_deviation_when_required(self):
+        self.assertEqual(self.main({"q": {"b.so": "passes"}}, "--required")[0], 1)
+        self.assertEqual(self.main({"q": {"b.so": "passes"}})[0], 77)
+
+
 class Run(ScriptedProgram):
     def errors_of(self, body):
         self.write(body)
@@ -115,6 +171,11 @@ class Table(unittest.TestCase):
         self.assertEqual({package: len(modules) for package, modules in ends.items()}, {
             "amsynth": 1, "dpf-plugins-vst": 15, "dragonfly-reverb-vst": 4, "iem-plugin-suite-vst": 21,
             "lsp-plugins-vst": 134, "zam-plugins": 17, "zynaddsubfx-vst": 8})
+
+    def test_the_one_for_i386_names_the_same_modules(self):
+        names = [{package: sorted(modules) for package, modules in ends.items()}
+                 for ends in (real_plugins.expected_ends(), real_plugins.expected_ends("expectations_i386.tsv"))]
+        self.assertEqual(names[0], names[1])
 
     def test_a_folder_stands_for_the_shared_object_in_it(self):
         self.assertIn("ProM.vst", real_plugins.expected_ends()["dpf-plugins-vst"])
