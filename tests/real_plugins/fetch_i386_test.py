@@ -1,4 +1,7 @@
-"""Tests of fetch_i386: what the archive lacks is told, and keeps nothing else away. A script stands in for apt."""
+"""Tests of fetch_i386: what the archive lacks is told, and keeps nothing else away.
+
+Two shell scripts stand in for apt-get and dpkg.
+"""
 import contextlib
 import io
 import os
@@ -16,7 +19,9 @@ case "$*" in
   *update) exit "${UPDATE_STATUS:-0}" ;;
   *--print-uris)
     for package in amsynth dpf-plugins-vst libgl1 libc6; do
-      case "$* libgl1 libc6" in *"$package"*) echo "'http://x/$package.deb' ${package}_1_i386.deb 1 MD5Sum:0" ;; esac
+      case "$* libgl1 libc6" in
+        *"$package"*) echo "'http://x/$package.deb' ${package}_1_i386.deb 1 MD5Sum:0" ;;
+      esac
     done ;;
   *--download-only*)
     cache=$(sed -n 's/^Dir::Cache "\\(.*\\)";/\\1/p' "$APT_CONFIG")

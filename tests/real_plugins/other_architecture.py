@@ -30,12 +30,14 @@ def main():
     parser.add_argument("folders", nargs="+", metavar="FOLDER")
     arguments = parser.parse_args()
 
-    modules = sorted(str(path.resolve()) for folder in arguments.folders for path in pathlib.Path(folder).glob("*.so"))
+    modules = sorted(str(path.resolve())
+                     for folder in arguments.folders for path in pathlib.Path(folder).glob("*.so"))
     if not modules or not os.path.exists(arguments.program):
         print(f"left out: there is no {'plug-in' if not modules else arguments.program}")
         return 1 if os.environ.get("VSTTORTURE_REAL_PLUGINS") == "required" else NOTHING_TO_RUN
     program = os.path.abspath(arguments.program)
-    faults = [found for path in modules if (found := fault(program, path, (arguments.architecture, arguments.other)))]
+    architectures = (arguments.architecture, arguments.other)
+    faults = [found for path in modules if (found := fault(program, path, architectures))]
     print("\n".join([*faults, f"{len(modules)} plug-ins of {arguments.other}, {len(faults)} faults"]))
     return 1 if faults else 0
 
