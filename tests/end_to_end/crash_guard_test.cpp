@@ -32,6 +32,9 @@ struct Crash {
 
 const NotWith kOtherHeap = {"the sanitizer's heap has no such lock", "the sanitizer's heap has no such lock"};
 
+const NotWith kTimerHeldBack = {
+    "", "the sanitizer keeps the timer's signal back while exit() waits for the lock"};
+
 const Crash kCrashes[] = {
     {"NullStore", "null_store"},
     {"ReadOnlyMemory", "write_read_only"},
@@ -51,9 +54,9 @@ const Crash kCrashes[] = {
     {"ThrowOnItsOwnThread", "thread_throw", "exit status 7",
      "terminate called after throwing an instance of 'int'\n"},
     {"InsideTheHeapsLock", "crash_with_heap_lock", "exit status 7", "", kOtherHeap},
-    {"StdoutLockedByAnotherThread", "crash_with_stdout_lock"},
+    {"StdoutLockedByAnotherThread", "crash_with_stdout_lock", "exit status 7", "", kTimerHeldBack},
     {"StdoutLockedByItself", "crash_with_own_stdout_lock"},
-    {"UnderALockThatADestructorTakes", "crash_under_destructor_lock"},
+    {"UnderALockThatADestructorTakes", "crash_under_destructor_lock", "exit status 7", "", kTimerHeldBack},
     {"AndAgainInAnExitHandler", "crash_in_atexit+null_store"},
     {"AndAgainInADestructor", "crash_in_static_destructor+null_store"},
     {"AbortAndAgainInAnExitHandler", "crash_in_atexit+abort"},
