@@ -18,6 +18,9 @@ constexpr unsigned kWayOutLimitInSeconds = 1;
 constexpr std::size_t kSignalStackSizeInBytes = std::size_t{1} << 20;
 constexpr std::size_t kGuardSizeInBytes = std::size_t{1} << 16;
 
+constexpr int kOurSignals[] = {SIGINT, SIGABRT, SIGHUP,  SIGSEGV, SIGTERM, SIGBUS,
+                               SIGILL, SIGFPE,  SIGTRAP, SIGSYS,  SIGALRM};
+
 std::atomic<bool> leaving{false};
 
 [[noreturn]] void endAtOnce() {
@@ -27,14 +30,22 @@ std::atomic<bool> leaving{false};
 
 void timeIsUp(int) { endAtOnce(); }
 
+/// Also those that the plug-in has blocked, and the one that is being handled. No others: one of them may be
+/// waiting that would kill the process without a word.
+void letOurSignalsArrive() {
+  sigset_t ours;
+  sigemptyset(&ours);
+  for (const int signal : kOurSignals) {
+    sigaddset(&ours, signal);
+  }
+  pthread_sigmask(SIG_UNBLOCK, &ours, nullptr);
+}
+
 void limitTheWayOut() {
   struct sigaction action = {};
   action.sa_handler = timeIsUp;
   action.sa_flags = SA_ONSTACK | SA_NODEFER;
   sigaction(SIGALRM, &action, nullptr);
-  sigset_t none;
-  sigemptyset(&none);
-  pthread_sigmask(SIG_SETMASK, &none, nullptr);
   alarm(kWayOutLimitInSeconds);
 }
 
@@ -55,6 +66,7 @@ void leaveAfterCrash() {
   if (leaving.exchange(true)) endAtOnce();
   closeReport();
   limitTheWayOut();
+  letOurSignalsArrive();
   std::exit(gCrashCode);
 }
 

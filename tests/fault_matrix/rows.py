@@ -172,6 +172,8 @@ KINDS = [
     Kind("replace_handlers_then_crash", KILLED, 11),
     Kind("block_signals_then_crash", KILLED, 11),
     Kind("block_signals+crash_with_stdout_lock", CRASH),
+    Kind("block_signals+raise:SIGUSR1+null_store", CRASH),
+    Kind("block_signals+raise:SIGTERM+null_store", CRASH),
     Kind("close_stdout", MUTE),
     Kind("flood_stdout", PASS),
     Kind("fork_keeping_stdout", PASS),
