@@ -43,7 +43,6 @@ void PrintTo(const FailureCase& failure, std::ostream* stream) { *stream << fail
 class FailingRun : public TortureFixture {
  protected:
   FailingRun() {
-    // Each of the random tests is one of latency.
     first.setPrograms({{"Soft", {0.5F}}});
     second.setPrograms({{"Soft", {0.5F}}});
   }
@@ -51,7 +50,7 @@ class FailingRun : public TortureFixture {
     TortureFixture::SetUp();
     plugin.willCreate(first);
     plugin.willCreate(second);
-    scriptedDraws.assign(50, 2147483647);
+    scriptedDraws.assign(50, 2147483647);  // Each of the random tests is number 4.
   }
 
   bool run() { return RunVSTTortureTest("/test.vst", VST_loadID{}, isShellPlugin); }

@@ -1,6 +1,6 @@
 // VSTWrapper::masterCallback: the answer to every request that a plug-in can make.
 #include <climits>
-#include <cstring>
+#include <cstdint>
 #include <string>
 #include <thread>
 #include <vector>

@@ -99,10 +99,9 @@ TEST_F(VSTWrapperParameterValues, NotANumberIsNeverHeldAlready) {
 
 // Where floats are returned in a wider register, this function returns more than a float holds.
 float wideThird(AEffect*, VstInt32) {
-  static const volatile double one = 1.0;
-  static const volatile double three = 3.0;
-  const double third = one / three;
-  return static_cast<float>(third);
+  static const volatile float one = 1.0f;
+  static const volatile float three = 3.0f;
+  return one / three;
 }
 
 TEST_F(VSTWrapperParameterValues, ThatWereJustReadAreNotSentBack) {

@@ -1,4 +1,6 @@
 // ~VSTWrapper: switching off, closing, and what the plug-in throws meanwhile.
+#include <cstdint>
+#include <memory>
 #include <stdexcept>
 
 #include "tests/host/wrapper_fixture.h"
