@@ -11,8 +11,8 @@
 #include <unistd.h>
 
 #include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/sanitizer.h"
 #include "tests/end_to_end/protocol_lines.h"
+#include "tests/end_to_end/sanitizer.h"
 #include "tests/end_to_end/temporary_directory.h"
 
 using testing::AllOf;
