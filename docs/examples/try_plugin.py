@@ -26,16 +26,16 @@ def run(command, limit):
     chunks = []
     reader = threading.Thread(target=lambda: chunks.extend(iter(lambda: child.stdout.read1(65536), b"")))
     reader.start()
-    timer = threading.Timer(limit, os.killpg, [child.pid, signal.SIGKILL])
+    out_of_time = threading.Event()
+    timer = threading.Timer(limit, lambda: (out_of_time.set(), os.killpg(child.pid, signal.SIGKILL)))
     timer.start()
     os.waitid(os.P_PID, child.pid, os.WEXITED | os.WNOWAIT)  # Ended, but not reaped: its group is still its own.
-    in_time = timer.is_alive()
     timer.cancel()
     timer.join()
     os.killpg(child.pid, signal.SIGKILL)  # What the plug-in left behind; it may hold the pipe open.
     reader.join(1)
     status = child.wait()
-    return b"".join(chunks).decode(errors="replace"), status if in_time else None
+    return b"".join(chunks).decode(errors="replace"), None if out_of_time.is_set() else status
 
 
 def judge(output, status):

@@ -2,7 +2,8 @@
 
     fault_matrix.py --program build/release/vsttorture --plugins build/release/plugins [--only REGEX] [--list]
 
-Prints a line for each row that fails, then a summary. The rows stand in rows.py.
+Prints a line for each row that fails, then a summary. The rows stand in rows.py. With --consumer it is the example
+of docs/examples that starts, reads and ends the program; its verdict is held to the row in both ways.
 """
 import argparse
 import concurrent.futures
@@ -11,17 +12,31 @@ import pathlib
 import re
 import resource
 import sys
+import tempfile
 import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import try_plugin  # noqa: E402
-from program_run import LIMIT_IN_SECONDS, differences, environment_of, plugin_path, run_row  # noqa: E402
+from program_run import (LIMIT_IN_SECONDS, Seen, differences, environment_of, plugin_path,  # noqa: E402
+                         run_row)
 from rows import all_rows  # noqa: E402
 
+HANG_LIMIT_IN_SECONDS = 3
 
-def check(row, program, plugins):
+
+def run_by_consumer(row, program, plugins):
+    """One run as the example makes it. Nothing is seen of standard error."""
+    with tempfile.TemporaryDirectory(prefix="fault_matrix.") as home:
+        settings = [f"{name}={value}" for name, value in environment_of(row, home).items()]
+        command = ["env", "-i", "-C", home, *settings, "sh", "-c", 'exec "$@" 2>/dev/null', "sh", program]
+        limit = HANG_LIMIT_IN_SECONDS if row.end.status is None else LIMIT_IN_SECONDS
+        output, status = try_plugin.run([*command, plugin_path(row, plugins)], limit)
+        return Seen(output, row.end.errors, status, None, os.listdir(home))
+
+
+def check(run, row, program, plugins):
     """What is wrong with the row; empty when it holds."""
-    return differences(row, run_row(row, program, plugins), try_plugin.judge)
+    return differences(row, run(row, program, plugins), try_plugin.judge)
 
 
 def chosen_rows(pattern):
@@ -34,6 +49,7 @@ def main():
     parser.add_argument("--plugins", help="the folder of the sample plug-ins")
     parser.add_argument("--only", default="", metavar="REGEX", help="rows whose name matches")
     parser.add_argument("--list", action="store_true", help="print the rows and what they demand")
+    parser.add_argument("--consumer", action="store_true", help="let the example run the program")
     parser.add_argument("--jobs", type=int, default=4, help="runs at a time; some of them only wait")
     arguments = parser.parse_args()
 
@@ -49,9 +65,10 @@ def main():
     resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
     started = time.monotonic()
     program, plugins = os.path.abspath(arguments.program), os.path.abspath(arguments.plugins)
+    run = run_by_consumer if arguments.consumer else run_row
     failed = 0
     with concurrent.futures.ThreadPoolExecutor(arguments.jobs) as pool:
-        for row, found in zip(rows, pool.map(lambda row: check(row, program, plugins), rows)):
+        for row, found in zip(rows, pool.map(lambda row: check(run, row, program, plugins), rows)):
             if found:
                 failed += 1
                 print(f"{row.name}: {'; '.join(found)}", flush=True)
