@@ -3,6 +3,7 @@
 #include <csignal>
 #include <cstdlib>
 
+#include "driver/safety_nets.h"
 #include "driver/way_out.h"
 #include "platform/exception_handler.h"
 
@@ -15,7 +16,8 @@ constexpr int kGuardedSignals[] = {SIGINT, SIGABRT, SIGHUP, SIGKILL, SIGSEGV, SI
 void makeHandlerSafe(int signal) {
   struct sigaction action = {};
   if (sigaction(signal, nullptr, &action) != 0) return;
-  action.sa_flags |= SA_ONSTACK | SA_NODEFER;
+  action.sa_flags |= SA_ONSTACK;
+  if (isSpread(SafetyNet::kSecondSignal)) action.sa_flags |= SA_NODEFER;
   sigaction(signal, &action, nullptr);
 }
 

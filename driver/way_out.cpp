@@ -8,6 +8,7 @@
 #include <unistd.h>
 
 #include "driver/report.h"
+#include "driver/safety_nets.h"
 
 bool gExpectedEnd = false;
 int gCrashCode = 0;
@@ -24,7 +25,7 @@ constexpr int kOurSignals[] = {SIGINT, SIGABRT, SIGHUP,  SIGSEGV, SIGTERM, SIGBU
 std::atomic<bool> leaving{false};
 
 [[noreturn]] void endAtOnce() {
-  if (!gExpectedEnd) printUnexpectedExitDirectly();
+  if (!gExpectedEnd && isSpread(SafetyNet::kDirectLastWords)) printUnexpectedExitDirectly();
   _exit(gCrashCode);
 }
 
@@ -52,6 +53,7 @@ void limitTheWayOut() {
 }  // namespace
 
 void prepareSignalStack() {
+  if (!isSpread(SafetyNet::kSignalStack)) return;
   const std::size_t size = kGuardSizeInBytes + kSignalStackSizeInBytes;
   void* memory = mmap(nullptr, size, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANON, -1, 0);
   if (memory == MAP_FAILED) return;
@@ -63,10 +65,10 @@ void prepareSignalStack() {
 }
 
 void leaveAfterCrash() {
-  if (leaving.exchange(true)) endAtOnce();
-  closeReport();
-  limitTheWayOut();
-  letOurSignalsArrive();
+  if (leaving.exchange(true) && isSpread(SafetyNet::kEndAtOnce)) endAtOnce();
+  if (isSpread(SafetyNet::kClosedReport)) closeReport();
+  if (isSpread(SafetyNet::kTimer)) limitTheWayOut();
+  if (isSpread(SafetyNet::kSecondSignal)) letOurSignalsArrive();
   std::exit(gCrashCode);
 }
 

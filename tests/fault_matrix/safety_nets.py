@@ -1,0 +1,94 @@
+"""Each safety net around the way out is needed: without it, rows of the fault matrix fail in a known way.
+
+    safety_nets.py --plugins build/release/plugins NET=PROGRAM...
+
+PROGRAM is the program without that net. That the whole program passes the same rows is the fault matrix itself.
+"""
+import argparse
+import os
+import pathlib
+import resource
+import sys
+import time
+
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
+import try_plugin  # noqa: E402
+from program_run import run_row  # noqa: E402
+from rows import all_rows  # noqa: E402
+
+LIMIT_IN_SECONDS = 4  # The timer that a variant lacks is one of one second.
+
+# {net: {row: what a host sees without it, the verdict and whether the last words stand}}
+NEEDED_BY = {
+    "signal_stack": {
+        "faulty/stack_overflow@dispatch:52": ("killed by signal 11", False),
+        "faulty/stack_overflow@load": ("killed by signal 11", False),
+        "faulty_own_runtime/stack_overflow@dispatch:52": ("killed by signal 11", False),
+    },
+    "end_at_once": {
+        "faulty/crash_in_every_atexit+null_store@dispatch:52": ("killed by signal 11", False),
+        "faulty/crash_in_every_atexit@dispatch:52": ("killed by signal 11", False),
+    },
+    "second_signal": {
+        "faulty/crash_in_atexit+null_store@dispatch:52": ("killed by signal 11", False),
+        "faulty/crash_in_static_destructor+null_store@dispatch:52": ("killed by signal 11", False),
+        "faulty/block_signals+crash_with_stdout_lock@dispatch:52": ("timed out at 6", False),
+    },
+    "timer": {
+        "faulty/crash_with_stdout_lock@dispatch:52": ("timed out at 6", False),
+        "faulty/crash_under_destructor_lock@dispatch:52": ("timed out at 6", False),
+    },
+    "closed_report": {
+        "faulty/thread_crash_behind_the_run@dispatch:52": ("passed", False),
+        "faulty/thread_crash_behind_the_run@dispatch:1": ("passed", False),
+    },
+    "direct_last_words": {
+        "faulty/crash_with_stdout_lock@dispatch:52": ("crashed at 6", False),
+        "faulty/crash_in_atexit+null_store@dispatch:52": ("crashed at 6", False),
+        "faulty/block_signals+raise:SIGTERM+null_store@dispatch:52": ("crashed at 6", False),
+    },
+    "exception_handler": {
+        "faulty/raise:SIGILL@dispatch:52": ("killed by signal 4", False),
+        "faulty/raise:SIGTRAP@dispatch:52": ("killed by signal 5", False),
+        "faulty/raise:SIGSYS@dispatch:52": ("killed by signal 31", False),
+        "faulty/divide_by_zero@dispatch:52": ("killed by signal 8", False),
+        "faulty/illegal_instruction@dispatch:52": ("killed by signal 4", False),
+    },
+}
+# A row of each variant that needs no net: the variant is the program otherwise.
+CONTROL = "faulty/null_store@dispatch:52"
+CONTROL_IS = ("crashed at 6", True)
+
+
+def what_is_seen(row, program, plugins):
+    seen = run_row(row, program, plugins, LIMIT_IN_SECONDS)
+    return try_plugin.judge(seen.output, seen.status), seen.output.endswith("unexpected exit")
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--plugins", required=True, help="the folder of the sample plug-ins")
+    parser.add_argument("variants", nargs="+", metavar="NET=PROGRAM")
+    arguments = parser.parse_args()
+
+    resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+    started = time.monotonic()
+    rows = {row.name: row for row in all_rows()}
+    programs = dict(variant.split("=", 1) for variant in arguments.variants)
+    tried = failed = 0
+    for net in NEEDED_BY.keys() ^ programs.keys():
+        failed += 1
+        print(f"{net}: without a program, or without rows")
+    for net in sorted(NEEDED_BY.keys() & programs.keys()):
+        for name, expected in [(CONTROL, CONTROL_IS), *NEEDED_BY[net].items()]:
+            tried += 1
+            seen = what_is_seen(rows[name], os.path.abspath(programs[net]), os.path.abspath(arguments.plugins))
+            if seen != expected:
+                failed += 1
+                print(f"{name} without {net}: {seen} instead of {expected}", flush=True)
+    print(f"{tried} rows of {len(programs)} variants in {time.monotonic() - started:.0f} s, {failed} failed")
+    return 1 if failed else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())
