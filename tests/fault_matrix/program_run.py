@@ -69,7 +69,7 @@ class Child:
 
 
 def environment_of(row, home):
-    environment = {"HOME": home, "LC_ALL": "C", "PATH": "/usr/bin:/bin"}
+    environment = {"HOME": home, "TMPDIR": home, "LC_ALL": "C", "PATH": "/usr/bin:/bin"}
     for name, value in os.environ.items():
         if name.endswith("SAN_OPTIONS"):
             environment[name] = value
