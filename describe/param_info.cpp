@@ -29,7 +29,7 @@ VstParameterProperties propertiesOf(VSTWrapper& wrapper, int index, bool automat
 }  // namespace
 
 ParamInfo::ParamInfo(VSTWrapper* wrapper, int index)
-    : paramIndex(index), props{}, currentValue(wrapper->getParameter(index)), automatable(false) {
+    : paramIndex(index), props{}, currentValue(wrapper->getParameter(index)) {
   paramName = NiduStringObj(wrapper->getParameterName(index).c_str(), 0);
   paramLabel = NiduStringObj(wrapper->getParameterLabel(index).c_str(), 0);
   automatable = wrapper->isParameterAutomatable(index);

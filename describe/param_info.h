@@ -24,7 +24,7 @@ struct ParamInfo {
   double minValue = 0.0;
   double maxValue = 1.0;  ///< The range is the integer range where the plug-in has one.
   double currentValue;    ///< When the entry was made, before any step was tried.
-  bool automatable;
+  bool automatable = false;
   NiduStringObj paramName;
   NiduStringObj paramLabel;             ///< The unit.
   std::vector<std::string> valueTexts;  ///< Of every integer step; empty for all other parameters.

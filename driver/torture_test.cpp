@@ -47,4 +47,6 @@ void deleteAndNew(NiduCOM::i_ptr<VSTPluginLoader> loader, const VST_loadID& load
   closeInstance(old);
 }
 
-void closeInstance(std::unique_ptr<VSTWrapper>& wrapper) { delete wrapper.release(); }
+void closeInstance(std::unique_ptr<VSTWrapper>& wrapper) {
+  delete wrapper.release();  // NOLINT(readability-uniqueptr-delete-release): reset() lets nothing through
+}

@@ -58,6 +58,7 @@ VstHostLanguage languageFor(const char* localeIdentifier) {
 
 VstHostLanguage currentLanguage() {
   // On purpose: the locale is not released.
+  // NOLINTBEGIN(clang-analyzer-osx.cocoa.RetainCount)
   CFLocaleRef locale = CFLocaleCopyCurrent();
   char identifier[255];
   if (!CFStringGetCString(CFLocaleGetIdentifier(locale), identifier, sizeof identifier,
@@ -65,6 +66,7 @@ VstHostLanguage currentLanguage() {
     return kVstLangEnglish;
   }
   return languageFor(identifier);
+  // NOLINTEND(clang-analyzer-osx.cocoa.RetainCount)
 }
 
 VstInt32 packedVersion(const KelClientVersion& version) {

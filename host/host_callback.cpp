@@ -30,7 +30,7 @@ VstIntPtr VSTWrapper::masterCallback(AEffect*, VstInt32 opcode, VstInt32, VstInt
     case audioMasterCurrentId:
       return gCurrentLoadID;
     case audioMasterGetVendorString:
-      std::strcpy(text, "NIDU");
+      std::memcpy(text, "NIDU", sizeof "NIDU");
       return 0;  // On purpose: 0 although the text is written.
     case audioMasterGetProductString:
       std::strncpy(text, GetHostId().c_str(), kMaxProductLength);

@@ -124,7 +124,7 @@ std::string VSTWrapper::getManufacturerName() {
   char buffer[kNameBufferSize];
   vst_zerostruct(buffer);
   if (dispatch(*effect, effGetVendorString, 0, 0, buffer) == 0) return "unknown";
-  const std::string vendor = textIn(buffer);
+  std::string vendor = textIn(buffer);
   // On purpose: this maker's sampler reports its product name as its maker.
   if (vendor == "Play" && getEffectName() == "Play") return "EastWest";
   return vendor;
