@@ -49,7 +49,6 @@ class i_ptr {
   }
 
   [[nodiscard]] T* get() const { return pointer; }
-  // NOLINTNEXTLINE(clang-analyzer-cplusplus.NewDelete): the analyzer does not follow the counts
   T* operator->() const { return pointer; }
   T& operator*() const { return *pointer; }
 
