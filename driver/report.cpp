@@ -70,8 +70,25 @@ class HeldSignals {
   sigset_t before;
 };
 
+/// Whether it is the caller who has to say them.
+bool claimLastWords() {
+  LastWords unsaid = LastWords::kUnsaid;
+  return lastWords.compare_exchange_strong(unsaid, LastWords::kBeingSaid);
+}
+
+/// While somebody else is just saying them. The clock is asked, since on a busy machine a sleep of a
+/// millisecond takes many.
+void waitForLastWords() {
+  const timespec millisecond = {0, 1000000};
+  const long long limit = nowInMilliseconds() + kPatienceInMilliseconds;
+  while (lastWords == LastWords::kBeingSaid && nowInMilliseconds() < limit) nanosleep(&millisecond, nullptr);
+}
+
 void sayLastWords() {
-  lastWords = LastWords::kBeingSaid;
+  if (!claimLastWords()) {
+    waitForLastWords();
+    return;
+  }
   std::printf("%s", kLastWords);
   std::fflush(stdout);
   lastWords = LastWords::kSaid;
@@ -79,7 +96,10 @@ void sayLastWords() {
 
 }  // namespace
 
-void openReport() { std::setvbuf(stdout, nullptr, _IONBF, 0); }
+void openReport() {
+  std::setvbuf(stdout, nullptr, _IONBF, 0);
+  lastWords = LastWords::kUnsaid;
+}
 
 void printUsage() { printLine("!too few arguments. syntax is command pathtovst childID(optional)\n"); }
 
@@ -126,13 +146,10 @@ void printUnexpectedExit() {
 }
 
 void printUnexpectedExitDirectly() {
-  // Somebody else may be just about to have said it. The clock is asked, since on a busy machine a sleep of a
-  // millisecond takes many.
-  const timespec millisecond = {0, 1000000};
-  const long long limit = nowInMilliseconds() + kPatienceInMilliseconds;
-  while (lastWords == LastWords::kBeingSaid && nowInMilliseconds() < limit) nanosleep(&millisecond, nullptr);
-  if (lastWords.exchange(LastWords::kSaid) == LastWords::kSaid || !outputTakesMore()) return;
+  if (!claimLastWords()) waitForLastWords();
+  if (lastWords == LastWords::kSaid || !outputTakesMore()) return;
   [[maybe_unused]] const ssize_t written = write(STDOUT_FILENO, kLastWords, sizeof kLastWords - 1);
+  lastWords = LastWords::kSaid;
 }
 
 void closeReport() { reportIsClosed = true; }

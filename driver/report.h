@@ -24,11 +24,11 @@ void printStep(const char* text);
 void printFailure(int code);
 /// "!PHASE failed, unknown error"
 void printFailure();
-/// "unexpected exit", with no newline.
+/// "unexpected exit", with no newline, unless it has been said.
 void printUnexpectedExit();
 
-/// The same past standard output's buffer and lock, unless it has been said: for signal handlers, when the
-/// ordinary way may be blocked. Does not wait for a host that has stopped reading.
+/// The same past standard output's buffer and lock: for signal handlers, when the ordinary way may be
+/// blocked. Does not wait for a host that has stopped reading.
 void printUnexpectedExitDirectly();
 
 /// Nothing may follow the last words: from now on a thread that wants to print a line waits for the end of

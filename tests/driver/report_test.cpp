@@ -1,6 +1,8 @@
 // The lines on standard output, character by character.
 #include <cstdio>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -19,6 +21,7 @@ class Report : public testing::Test {
   void SetUp() override {
     gStep = 0;
     gCurTest = nullptr;
+    openReport();
     CaptureStdout();
   }
   void TearDown() override { gCurTest = nullptr; }
@@ -84,12 +87,27 @@ TEST_F(Report, TheLastWordsHaveNoLineEndAndAreSaidOnce) {
   EXPECT_EQ(GetCapturedStdout(), "unexpected exit");
 }
 
+TEST_F(Report, TheLastWordsAreNotRepeatedOnTheOrdinaryWay) {
+  printUnexpectedExitDirectly();
+  printUnexpectedExit();
+  EXPECT_EQ(GetCapturedStdout(), "unexpected exit");
+}
+
+TEST_F(Report, TheLastWordsOfManyThreadsAreSaidOnce) {
+  std::vector<std::thread> threads;
+  for (int i = 0; i < 8; ++i)
+    threads.emplace_back(i % 2 == 0 ? printUnexpectedExit : printUnexpectedExitDirectly);
+  for (std::thread& thread : threads) thread.join();
+  EXPECT_EQ(GetCapturedStdout(), "unexpected exit");
+}
+
 // Standard output as a pipe, as a host sees it, from which only what was flushed can be read.
 class FlushedReport : public testing::Test {
  protected:
   void SetUp() override {
     gStep = 0;
     gCurTest = "gather info";
+    openReport();
     int ends[2];
     ASSERT_EQ(pipe(ends), 0);
     std::fflush(stdout);
