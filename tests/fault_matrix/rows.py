@@ -4,8 +4,7 @@ A run is described by the lines that stand (the first N steps), what follows the
 taken from the program: the steps, the phases, and the step to which each request belongs are literals.
 
 Which rows there are:
-  - every kind of fault at the representative places,
-  - every place with the representative kinds,
+  - every kind of fault at every place,
   - rows of their own: texts that are too long, faults that follow each other, whole plug-ins.
 """
 import collections
@@ -109,8 +108,6 @@ PLACES = [
     Place("dispatch:1:2", ALL_STEPS, LAST_DRAWN, "line"),  # close at the end
 ]
 PLACE_OF = {place.name: place for place in PLACES}
-REPRESENTATIVE_PLACES = ["load", "entry", "dispatch:0", "dispatch:35", "dispatch:58", "getParameter", "setParameter",
-                         "dispatch:52", "dispatch:52:2", "entry:2", "dispatch:1", "dispatch:58:2", "dispatch:1:2"]
 
 # ----- Kinds, by what they lead to.
 
@@ -181,7 +178,6 @@ KINDS = [
     Kind("trap_floating_point", PASS),
 ]
 KIND_OF = {kind.name: kind for kind in KINDS}
-REPRESENTATIVE_KINDS = ["null_store", "throw_int", "throw_struct", "raise:SIGTERM"]
 
 # ----- What a host has to see.
 
@@ -242,23 +238,17 @@ def row(kind, place, plugin="faulty", end=None):
     return Row(f"{plugin}/{kind.name}@{place.name}", plugin, kind.name, place.name, 9, end or end_of(kind, place))
 
 
-def rows_of_kinds():
+def rows_of_pairs():
     for kind in KINDS:
-        for place in REPRESENTATIVE_PLACES:
-            yield row(kind, PLACE_OF[place])
-
-
-def rows_of_places():
-    for place in PLACES:
-        for kind in REPRESENTATIVE_KINDS:
-            yield row(KIND_OF[kind], place)
+        for place in PLACES:
+            yield row(kind, place)
 
 
 def rows_of_the_own_runtime():
     """The program's own runtime meets an unwinder that is not its own, and aborts: a crash, wherever it is."""
     for kind in ["throw_int", "throw_runtime_error", "throw_struct"]:
-        for place in REPRESENTATIVE_PLACES:
-            yield row(KIND_OF[kind], PLACE_OF[place], "faulty_own_runtime", crash_at(PLACE_OF[place].steps, ""))
+        for place in PLACES:
+            yield row(KIND_OF[kind], place, "faulty_own_runtime", crash_at(place.steps, ""))
     for kind in ["null_store", "thread_throw", "exit", "stack_overflow"]:
         for place in ["load", "dispatch:52"]:
             yield row(KIND_OF[kind], PLACE_OF[place], "faulty_own_runtime")
@@ -343,6 +333,6 @@ def rows_of_whole_plugins():
 
 def all_rows():
     """Each row once, by its name."""
-    sources = [rows_of_kinds, rows_of_places, rows_of_the_own_runtime, rows_of_long_texts, rows_of_statuses,
-               rows_of_combinations, rows_of_whole_plugins]
+    sources = [rows_of_pairs, rows_of_the_own_runtime, rows_of_long_texts, rows_of_statuses, rows_of_combinations,
+               rows_of_whole_plugins]
     return list({row.name: row for source in sources for row in source()}.values())
