@@ -8,6 +8,7 @@ import threading
 import time
 
 from rows import (ALL_STEPS, DRAWN_TEXTS, FIRST_DRAWN, LAST_DRAWN, PHASE_OF_DRAWN, STEP_TEXTS, TEXT_WITHOUT_END)
+from sanitizers import add_options, unwanted_report
 
 LIMIT_IN_SECONDS = 10
 HANG_IS_SEEN_AFTER_SECONDS = 0.3
@@ -68,11 +69,13 @@ class Child:
         return status
 
 
-def environment_of(row, home):
+def environment_of(row, home, sanitizer=None):
+    """sanitizer: the one that the program is built with, "address" or "thread"."""
     environment = {"HOME": home, "TMPDIR": home, "LC_ALL": "C", "PATH": "/usr/bin:/bin"}
     for name, value in os.environ.items():
         if name.endswith("SAN_OPTIONS"):
             environment[name] = value
+    add_options(environment, row, sanitizer)
     if row.kind is not None:
         environment.update(FAULT_KIND=row.kind, FAULT_PLACE=row.place, FAULT_STATUS=str(row.fault_status))
     return environment
@@ -82,10 +85,11 @@ def plugin_path(row, plugins):
     return row.plugin if row.plugin.startswith("/") else os.path.join(plugins, row.plugin + ".so")
 
 
-def run_row(row, program, plugins, limit=LIMIT_IN_SECONDS):
+def run_row(row, program, plugins, limit=LIMIT_IN_SECONDS, sanitizer=None):
     with tempfile.TemporaryDirectory(prefix="fault_matrix.") as home, tempfile.TemporaryFile() as errors:
         started = time.monotonic()
-        child = Child([program, plugin_path(row, plugins)], home, environment_of(row, home), errors)
+        environment = environment_of(row, home, sanitizer)
+        child = Child([program, plugin_path(row, plugins)], home, environment, errors)
         if row.end.status is None:
             ended = not child.wait_for_text(expected_output(row), limit)
         else:
@@ -145,7 +149,7 @@ def without_noise(row, output):
     return output
 
 
-def differences(row, seen, judge):
+def differences(row, seen, judge, sanitizer=None):
     """What is seen and should not be, in words; empty for a row that holds."""
     found = []
     output = without_noise(row, seen.output)
@@ -164,6 +168,8 @@ def differences(row, seen, judge):
         found.append(f"status {seen.status} instead of {row.end.status}")
     if row.end.errors is not None and seen.errors != row.end.errors:
         found.append(f"standard error {seen.errors[-200:]!r} instead of {row.end.errors!r}")
+    if unwanted_report(row, seen.errors, sanitizer):
+        found.append(f"a report of the sanitizer: {seen.errors[:2000]!r}")
     if seen.leftovers:
         found.append(f"files left: {seen.leftovers}")
     verdict, expected_verdict = judge(seen.output, seen.status), row.end.verdict.format(steps)
