@@ -2,7 +2,9 @@
 include(GNUInstallDirs)
 install(TARGETS vsttorture RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 install(FILES docs/vsttorture.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
-install(FILES README.md docs/PROTOCOL.md DESTINATION ${CMAKE_INSTALL_DOCDIR})
+# For makers of hosts. The example keeps its place beside PROTOCOL.md, which points to it.
+install(FILES docs/PROTOCOL.md docs/changelog DESTINATION ${CMAKE_INSTALL_DOCDIR})
+install(PROGRAMS docs/examples/try_plugin.py DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples)
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_DIRECTORY ${PROJECT_BINARY_DIR})
@@ -10,6 +12,8 @@ set(CPACK_PACKAGE_VENDOR "The vsttorture developers")
 set(CPACK_PACKAGE_CONTACT "The vsttorture developers <maintainers@vsttorture.invalid>")
 set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
 set(CPACK_STRIP_FILES ON)
+set(CPACK_PRE_BUILD_SCRIPTS ${CMAKE_CURRENT_LIST_DIR}/debian_tree.cmake)
+set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_SECTION sound)
 set(CPACK_DEBIAN_PACKAGE_DESCRIPTION "An audio host starts this tool as a child process before it loads a plug-in
