@@ -12,6 +12,7 @@
 #include "platform/linux/core_foundation_objects.h"
 #include "platform/linux/elf_header.h"
 #include "platform/linux/failure_line.h"
+#include "platform/linux/file_format.h"
 
 // NOLINTBEGIN(bugprone-reserved-identifier,misc-non-private-member-variables-in-classes): the system's own
 // name, and a record that only this file sees
@@ -40,7 +41,8 @@ void* (*volatile const openModule)(const char* path, int mode) = dlopen;
 std::string reasonOfRefusal(const std::string& path) {
   const char* const text = dlerror();  // NOLINT(concurrency-mt-unsafe): each thread has its own
   const std::string said = text != nullptr ? text : path + " cannot be loaded";
-  return core_foundation::architectureMismatch(path).value_or(said);
+  if (const auto mismatch = core_foundation::architectureMismatch(path)) return *mismatch;
+  return core_foundation::formatMismatch(path).value_or(said);
 }
 
 // The dynamic loader's records of a handle and of the module that an address lies in; null when unknown.

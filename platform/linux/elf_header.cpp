@@ -17,13 +17,18 @@ constexpr std::size_t kNeededInBytes = 20;
 struct Architecture {
   unsigned machine;
   unsigned elfClass;
+  unsigned byteOrder;
   const char* name;
 };
 constexpr Architecture kArchitectures[] = {
-    {EM_X86_64, ELFCLASS64, "x86_64"}, {EM_386, ELFCLASS32, "i386"},
-    {EM_X86_64, ELFCLASS32, "x32"},    {EM_AARCH64, ELFCLASS64, "aarch64"},
-    {EM_ARM, ELFCLASS32, "arm"},       {EM_RISCV, ELFCLASS64, "riscv64"},
-    {EM_PPC, ELFCLASS32, "powerpc"},   {EM_PPC64, ELFCLASS64, "powerpc64"},
+    {EM_X86_64, ELFCLASS64, ELFDATA2LSB, "x86_64"},   {EM_386, ELFCLASS32, ELFDATA2LSB, "i386"},
+    {EM_X86_64, ELFCLASS32, ELFDATA2LSB, "x32"},      {EM_AARCH64, ELFCLASS64, ELFDATA2LSB, "aarch64"},
+    {EM_ARM, ELFCLASS32, ELFDATA2LSB, "arm"},         {EM_LOONGARCH, ELFCLASS64, ELFDATA2LSB, "loongarch64"},
+    {EM_MIPS, ELFCLASS32, ELFDATA2MSB, "mips"},       {EM_MIPS, ELFCLASS32, ELFDATA2LSB, "mipsel"},
+    {EM_MIPS, ELFCLASS64, ELFDATA2LSB, "mips64el"},   {EM_PPC, ELFCLASS32, ELFDATA2MSB, "powerpc"},
+    {EM_PPC64, ELFCLASS64, ELFDATA2MSB, "powerpc64"}, {EM_PPC64, ELFCLASS64, ELFDATA2LSB, "powerpc64le"},
+    {EM_RISCV, ELFCLASS64, ELFDATA2LSB, "riscv64"},   {EM_S390, ELFCLASS32, ELFDATA2MSB, "s390"},
+    {EM_S390, ELFCLASS64, ELFDATA2MSB, "s390x"},
 };
 
 }  // namespace
@@ -36,7 +41,8 @@ std::optional<std::string> architectureOfElf(std::string_view beginning) {
   const unsigned high = byteAt(kMachineOffsetInBytes + (bigEndian ? 0 : 1));
   const unsigned machine = low | high << 8U;
   for (const Architecture& known : kArchitectures)
-    if (known.machine == machine && known.elfClass == byteAt(EI_CLASS)) return known.name;
+    if (known.machine == machine && known.elfClass == byteAt(EI_CLASS) && known.byteOrder == byteAt(EI_DATA))
+      return known.name;
   return "machine " + std::to_string(machine);
 }
 
@@ -53,6 +59,8 @@ const char* architectureOfProgram() {
   return "arm";
 #elif defined(__riscv) && __riscv_xlen == 64
   return "riscv64";
+#elif defined(__powerpc64__) && defined(__LITTLE_ENDIAN__)
+  return "powerpc64le";
 #elif defined(__powerpc64__)
   return "powerpc64";
 #elif defined(__powerpc__)

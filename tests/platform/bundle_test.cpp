@@ -5,6 +5,7 @@
 #include <sstream>
 #include <string>
 
+#include <dlfcn.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/socket.h>
@@ -109,6 +110,18 @@ TEST_F(CFBundleLoads, PathsThatEndWithASlash) {
   EXPECT_TRUE(loads(folder.path("ProM.vst/")));
   EXPECT_TRUE(loads(folder.path("ProM.vst//")));
   EXPECT_TRUE(loads(folder.copy(ONLY_HERE, "flat.so") + "/"));
+  EXPECT_TRUE(loads(folder.path("flat.so///")));
+}
+
+TEST_F(CFBundleLoads, ThroughSymbolicLinks) {
+  folder.copy(ONLY_HERE, "elsewhere/flat.so");
+  std::filesystem::create_symlink("elsewhere/flat.so", folder.path("link.vst"));
+  EXPECT_TRUE(loads(folder.path("link.vst")));
+  folder.makeFolder("ProM.vst");
+  std::filesystem::create_symlink("../elsewhere/flat.so", folder.path("ProM.vst/ProM.so"));
+  EXPECT_TRUE(loads(folder.path("ProM.vst")));
+  std::filesystem::create_symlink("../ProM.vst", folder.path("elsewhere/ProM.vst"));
+  EXPECT_TRUE(loads(folder.path("elsewhere/ProM.vst")));
 }
 
 TEST_F(CFBundleLoads, BlanksAndOtherLetters) {
@@ -151,6 +164,14 @@ TEST_F(CFBundleLoads, TheFirstTimeOnlyWhenAskedTwice) {
   EXPECT_EQ(CFBundleGetFunctionPointerForName(bundle, CFSTR("onlyHere")), first);
   CFBundleUnloadExecutable(bundle);
   EXPECT_EQ(CFBundleGetFunctionPointerForName(bundle, CFSTR("onlyHere")), nullptr);
+  CFRelease(bundle);
+}
+
+TEST_F(CFBundleLoads, WithoutLettingOtherModulesSeeItsFunctions) {
+  const CFBundleRef bundle = makeBundle(folder.copy(ONLY_HERE, "a.so"));
+  ASSERT_TRUE(CFBundleLoadExecutable(bundle));
+  EXPECT_EQ(dlsym(RTLD_DEFAULT, "onlyHere"), nullptr);
+  EXPECT_EQ(dlsym(RTLD_DEFAULT, "onlyInDependency"), nullptr);
   CFRelease(bundle);
 }
 
@@ -220,6 +241,38 @@ TEST_F(CFBundleRefuses, AnotherArchitectureInADirectoryNamingBoth) {
             path + " is for aarch64, this program is for " + thisProgram);
 }
 
+struct ForeignFile {
+  const char* name;
+  std::string content;
+  const char* format;
+};
+class CFBundleForeignFile : public CFBundle, public testing::WithParamInterface<ForeignFile> {};
+
+TEST_P(CFBundleForeignFile, IsRefusedAndNamed) {
+  const std::string path = folder.write("ProM.vst/Contents/MacOS/ProM", GetParam().content);
+  EXPECT_EQ(reasonAgainst(folder.path("ProM.vst")),
+            path + " is " + GetParam().format + ", not a shared object for Linux");
+}
+
+std::string withRest(const std::string& firstBytes) { return firstBytes + std::string(1000, '\1'); }
+
+INSTANTIATE_TEST_SUITE_P(
+    Formats, CFBundleForeignFile,
+    testing::Values(ForeignFile{"MacOS32", withRest("\xCE\xFA\xED\xFE"), "a module for macOS"},
+                    ForeignFile{"MacOS64", withRest("\xCF\xFA\xED\xFE"), "a module for macOS"},
+                    ForeignFile{"MacOSPowerpc", withRest("\xFE\xED\xFA\xCE"), "a module for macOS"},
+                    ForeignFile{"MacOSPowerpc64", withRest("\xFE\xED\xFA\xCF"), "a module for macOS"},
+                    ForeignFile{"MacOSUniversal", withRest("\xCA\xFE\xBA\xBE"), "a module for macOS"},
+                    ForeignFile{"MacOSUniversal64", withRest("\xCA\xFE\xBA\xBF"), "a module for macOS"},
+                    ForeignFile{"Windows", withRest("MZ"), "a module for Windows"},
+                    ForeignFile{"StaticLibrary", withRest("!<arch>\n"), "a static library"},
+                    ForeignFile{"Script", "#!/bin/sh\n", "a script"}),
+    [](const auto& test) { return test.param.name; });
+
+TEST_F(CFBundleRefuses, AFileThatOnlyBeginsLikeAStaticLibrary) {
+  EXPECT_THAT(reasonAgainst(folder.write("a.so", withRest("!<arch>"))), HasSubstr("ELF header"));
+}
+
 TEST_F(CFBundleRefuses, AnUndefinedSymbol) {
   const std::string path = folder.copy(UNDEFINED_SYMBOL, "undefined.so");
   EXPECT_EQ(reasonAgainst(path), path + ": undefined symbol: thisFunctionExistsNowhere");
@@ -275,6 +328,7 @@ TEST_F(CFBundleRefuses, ASocket) {
 TEST_F(CFBundleRefuses, AtCreationWhatIsMissingAndAtLoadingWhatIsBroken) {
   testing::internal::CaptureStderr();
   EXPECT_EQ(makeBundle(folder.path("missing.so")), nullptr);
+  EXPECT_EQ(makeBundle("/dev/null"), nullptr);
   const CFBundleRef empty = makeBundle(folder.write("empty.so", ""));
   ASSERT_NE(empty, nullptr);
   EXPECT_EQ(CFGetRetainCount(empty), 1);
@@ -340,6 +394,15 @@ TEST_F(CFBundleUnloadExecutableTest, RunsTheModulesDestructors) {
   EXPECT_EQ(unloaded, 1);
   CFBundleUnloadExecutable(bundle);
   EXPECT_EQ(CFGetRetainCount(bundle), 1);
+}
+
+TEST_F(CFBundleUnloadExecutableTest, NeedsToBeDoneOnceHoweverOftenItWasLoaded) {
+  EXPECT_TRUE(CFBundleLoadExecutable(bundle));
+  EXPECT_TRUE(CFBundleLoadExecutable(bundle));
+  int unloaded = 0;
+  watchUnloading(bundle, &unloaded);
+  CFBundleUnloadExecutable(bundle);
+  EXPECT_EQ(unloaded, 1);
 }
 
 TEST_F(CFBundleUnloadExecutableTest, LeavesABundleThatLoadsAgain) {
