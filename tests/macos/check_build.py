@@ -25,6 +25,9 @@ HEADERS = set("""
     libkern/OSAtomic.h mach/mach.h mach/semaphore.h mach/sync_policy.h mach/task.h
     """.split())
 
+# No source of the program: it compiles where the records of the plug-in interface are laid out as plug-ins expect.
+LAYOUT_CHECK = "tests/vst2/record_layout_check.cpp"
+
 # Faults that must not compile: name, source, file with the fault, text, text with the fault, what the compiler says.
 COMPILE_CONTROLS = (
     ("a misspelt function of CoreFoundation", "loader/module_loader.cpp", "loader/module_loader.cpp",
@@ -47,6 +50,9 @@ COMPILE_CONTROLS = (
     ("a missing header of a framework", "platform/macos/exception_handler.mm",
      "platform/macos/exception_handler.mm", "#import <ExceptionHandling/NSExceptionHandler.h>\n", "",
      "'NSExceptionHandler'"),
+    ("two fields in each other's place", LAYOUT_CHECK, "vst2/properties.h",
+     "  VstInt16 displayIndex;\n  VstInt16 category;\n", "  VstInt16 category;\n  VstInt16 displayIndex;\n",
+     "static_assert failed"),
 )
 NEWER_LIBRARY_CONTROL = (
     "a function of C++'s library that macOS 10.13 lacks", "loader/plugin_identity.cpp",
@@ -70,7 +76,8 @@ class Target:
     def configure(self):
         version = re.search(r"macosx?([\d.]+)$", self.triple).group(1)
         result = run(["cmake", "--preset", "mac_check", "-B", str(self.directory),
-                      f"-DVSTTORTURE_MAC_TARGET={self.triple}", f"-DCMAKE_OSX_DEPLOYMENT_TARGET={version}"], cwd=ROOT)
+                      f"-DVSTTORTURE_MAC_TARGET={self.triple}", f"-DCMAKE_OSX_ARCHITECTURES={self.name}",
+                      f"-DCMAKE_OSX_DEPLOYMENT_TARGET={version}"], cwd=ROOT)
         if result.returncode != 0:
             return report(f"{self.name}: CMake configures the build for macOS", False, result.stdout)
         for entry in json.loads((self.directory / "compile_commands.json").read_text()):
@@ -109,6 +116,16 @@ class Target:
             if result.returncode == 0 or control[-1] not in result.stdout:
                 missed += f"not found: {control[0]}\n{result.stdout}\n"
         report(f"{self.name}: control: {len(controls)} faults do not compile", not missed, missed)
+
+    def check_layout(self):
+        """The records of the plug-in interface, whose offsets a compiler alone can check."""
+        model = "support/exceptions.cpp"
+        command = [str(ROOT / LAYOUT_CHECK) if word == str(ROOT / model) else word for word in self.commands[model]]
+        command[command.index("-o") + 1] = str(self.directory / "layout.o")
+        self.commands[LAYOUT_CHECK] = command
+        result = run(command, cwd=self.directory)
+        report(f"{self.name}: every field of the plug-in interface lies in its place", result.returncode == 0,
+               result.stdout)
 
     # Linking. Both kinds of fault: a name that the program should not use, a name that is not offered.
 
@@ -214,6 +231,7 @@ def main():
             check_completeness(target.commands)
         if not target.compile():
             continue
+        target.check_layout()
         target.compile_controls()
         if target.name == "i386":
             target.check_undefined()
