@@ -99,6 +99,7 @@ def main():
         print(f"not fetched: {package}")
     (folder / "missing").write_text("".join(f"{package}\n" for package in missing))
     if LEAST in missing:
+        print(f"{LEAST} did not come, so there is no 32-bit plug-in that is sure to load", file=sys.stderr)
         return 1
     if not missing:
         (folder / "done").touch()

@@ -87,7 +87,13 @@ class Fetch(unittest.TestCase):
         self.assertFalse((self.folder / "done").exists())
 
     def test_without_the_plugins_that_need_no_library_it_fails(self):
-        self.assertEqual(self.fetch(NOT_IN_THE_ARCHIVE="dpf-plugins-vst")[0], 1)
+        with contextlib.redirect_stderr(io.StringIO()) as errors:
+            status, output = self.fetch(NOT_IN_THE_ARCHIVE="dpf-plugins-vst")
+        self.assertEqual(status, 1)
+        self.assertIn("not fetched: dpf-plugins-vst\n", output)
+        self.assertEqual(errors.getvalue(),
+                         "dpf-plugins-vst did not come, so there is no 32-bit plug-in that is sure to load\n")
+        self.assertFalse((self.folder / "done").exists())
 
     def test_apt_keeps_to_a_folder_of_its_own(self):
         apt = fetch_i386.Apt(self.folder)

@@ -130,6 +130,29 @@ class Unpacked(ScriptedProgram):
         self.assertRegex(output, r"\n1 plug-ins run in \d+ s, 0 deviations\n$")
         self.assertEqual(status, 0)
 
+    def test_the_five_modules_that_need_no_library_are_never_left_out(self):
+        names = ["Kars-vst.so", "MaBitcrush-vst.so", "MaFreeverb-vst.so", "MaGigaverb-vst.so", "MaPitchshift-vst.so"]
+        for name in [*names, "MVerb-vst.so"]:
+            self.put(f"dpf-plugins-vst/usr/lib/vst/{name}")
+        self.put("missing", "libgl1\n")
+        self.write(self.LACKS_A_LIBRARY)
+        status, output = self.main({"dpf-plugins-vst": dict.fromkeys([*names, "MVerb-vst.so"], "passes")})
+        self.assertEqual(status, 1)
+        for name in names:
+            self.assertIn(f"dpf-plugins-vst {name}: expected passes; seen ", output)
+        self.assertIn("left out: dpf-plugins-vst MVerb-vst.so, ", output)
+        self.assertRegex(output, r"\n5 plug-ins run in \d+ s, 5 deviations\n$")
+
+    def test_nor_is_their_package_when_required(self):
+        self.put("missing", "dpf-plugins-vst\n")
+        table = {"dpf-plugins-vst": {"Kars-vst.so": "passes"}}
+        self.assertEqual(self.main(table, "--required")[0], 1)
+        self.assertEqual(self.main(table)[0], 77)
+
+    def test_the_table_names_them(self):
+        modules = real_plugins.expected_ends("expectations_i386.tsv")["dpf-plugins-vst"]
+        self.assertEqual(real_plugins.NEED_NO_LIBRARY["dpf-plugins-vst"] - modules.keys(), set())
+
     def test_a_library_that_lacks_though_everything_was_fetched_is_a_deviation(self):
         self.put("missing", "")
         self.write(self.LACKS_A_LIBRARY)
