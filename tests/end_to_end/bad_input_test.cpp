@@ -40,6 +40,15 @@ std::string forTheOtherArchitecture(std::string library) {
   return library;
 }
 
+/// The same as if it were made for a machine of 64 bits in big-endian order.
+std::string forS390x(std::string library) {
+  library[4] = 2;
+  library[5] = 2;
+  library[18] = 0;
+  library[19] = 22;
+  return library;
+}
+
 #if defined(__x86_64__)
 constexpr const char* kBothArchitectures = "is for i386, this program is for x86_64";
 #elif defined(__i386__)
@@ -78,6 +87,30 @@ const BadInput kBadInputs[] = {
      [](const auto& folder) {
        return madeOf(folder, forTheOtherArchitecture(textOf(samplePlugin("well_behaved_effect"))));
      }},
+    {"OtherArchitectureInFolder", "is for s390x, this program is for ",
+     [](const auto& folder) {
+       std::filesystem::create_directories(folder / "Odd.vst/Contents/Linux");
+       writeFile(folder / "Odd.vst/Contents/Linux/Odd.so",
+                 forS390x(textOf(samplePlugin("well_behaved_effect"))));
+       return (folder / "Odd.vst").string();
+     }},
+    {"OtherArchitectureBehindLink", kBothArchitectures,
+     [](const auto& folder) {
+       const std::string file =
+           madeOf(folder, forTheOtherArchitecture(textOf(samplePlugin("well_behaved_effect"))));
+       std::filesystem::create_directory(folder / "Odd.vst");
+       std::filesystem::create_symlink(file, folder / "Odd.vst/Odd.so");
+       return (folder / "Odd.vst").string();
+     }},
+    {"ModuleForMacOS", "is a module for macOS, not a shared object for Linux",
+     [](const auto& folder) { return madeOf(folder, "\xCF\xFA\xED\xFE" + std::string(1000, '\1')); }},
+    {"ModuleForWindows", "is a module for Windows, not a shared object for Linux",
+     [](const auto& folder) { return madeOf(folder, "MZ" + std::string(1000, '\1')); }},
+    {"StaticLibrary", "is a static library, not a shared object for Linux",
+     [](const auto& folder) { return madeOf(folder, "!<arch>\n" + std::string(1000, '\1')); }},
+    {"Script", "is a script, not a shared object for Linux",
+     [](const auto& folder) { return madeOf(folder, "#!/bin/sh\necho total, 64\n"); }},
+    {"Program", "executable", [](const auto&) { return std::string(VSTTORTURE_PROGRAM); }},
     {"UndefinedSymbol", "numberThatNobodyDefines",
      [](const auto&) { return samplePlugin("undefined_symbol"); }},
     {"InvalidUtf8", "\\xff\\xfe", [](const auto&) { return std::string("/x/\xff\xfe.so"); }},
