@@ -20,11 +20,6 @@ namespace {
 
 struct Oddity {};
 
-int exitStatus() {
-  const char* text = std::getenv("FAULT_STATUS");
-  return text == nullptr ? 0 : std::atoi(text);
-}
-
 /// The one of several faults that is being committed. Made when first asked for: a fault may come while the
 /// module's own objects are still being made.
 std::string& kindUnderWay() {
@@ -100,19 +95,34 @@ constexpr Fault kFaults[] = {
     {"crash_under_destructor_lock", crashUnderDestructorLock},
     {"thread_crash", crashOnAThread},
     {"thread_throw", throwOnAThread},
+    {"thread_stack_overflow", overflowTheStackOfAThread},
     {"thread_crash_behind_the_run", crashOnAThreadBehindTheRun},
+    {"exit_on_a_thread", exitOnAThread},
+    {"leave_the_thread", leaveTheThread},
     {"crash_in_atexit", crashInAtExit},
     {"crash_in_every_atexit", crashInEveryAtExit},
     {"crash_in_static_destructor", crashInStaticDestructor},
+    {"hang_in_atexit", hangInAtExit},
+    {"use_heap_in_atexit", useHeapInAtExit},
+    {"throw_when_unloaded", throwWhenUnloaded},
+    {"print_when_unloaded", printWhenUnloaded},
     {"replace_handlers_then_crash", replaceHandlersThenCrash},
     {"block_signals_then_crash", blockSignalsThenCrash},
     {"block_signals", blockSignalsButCrashes},
     {"print", printWithoutNewline},
+    {"buffer_stdout", bufferStdout},
     {"close_stdout", closeStdout},
+    {"close_stderr", [] { close(STDERR_FILENO); }},
+    {"hold_stdout_lock", holdStdoutLock},
     {"flood_stdout", floodStdout},
     {"long_texts", answerLongTexts},
     {"no_instance", [] { yieldsNoInstance = true; }},
     {"fork_keeping_stdout", forkKeepingStdout},
+    {"fork_child_goes_on", forkChildThatGoesOn},
+    {"fork_child_exits", forkChildThatExits},
+    {"fork_child_crashes", forkChildThatCrashes},
+    {"vfork_child_crashes", vforkChildThatCrashes},
+    {"exec", becomeAnotherProgram},
     {"change_locale_and_directory", changeLocaleAndDirectory},
     {"trap_floating_point", trapFloatingPoint},
     {"hang", hang},
@@ -142,6 +152,11 @@ void commitFault() {
 void complain(const std::string& problem) {
   std::fprintf(stderr, "faulty: %s\n", problem.c_str());
   _exit(125);
+}
+
+int exitStatus() {
+  const char* text = std::getenv("FAULT_STATUS");
+  return text == nullptr ? 0 : std::atoi(text);
 }
 
 void storeToAddressZero() {

@@ -26,6 +26,9 @@ extern bool yieldsNoInstance;
 /// A test asked for something that does not exist: says so on standard error and ends the process with 125.
 [[noreturn]] void complain(const std::string& problem);
 
+/// What the exiting faults end with.
+int exitStatus();
+
 /// The plainest crash.
 void storeToAddressZero();
 
@@ -40,28 +43,48 @@ void crashWithHeapLock();
 void crashWithStdoutLock();
 void crashWithOwnStdoutLock();
 void crashUnderDestructorLock();
+/// No crash: the next one who prints waits for ever.
+void holdStdoutLock();
 
 // Faults on a thread of the plug-in's own.
 void crashOnAThread();
 void throwOnAThread();
+void overflowTheStackOfAThread();
 /// The crash of one thread has begun and waits in an exit handler; the run goes on meanwhile.
 void crashOnAThreadBehindTheRun();
+/// The process ends on one thread, slowly; the run goes on meanwhile.
+void exitOnAThread();
+/// Ends the thread that the host called on.
+void leaveTheThread();
 
 // Faults that wait until the process ends.
 void crashInAtExit();
 /// Each time one of them crashes, the next one stands there already.
 void crashInEveryAtExit();
 void crashInStaticDestructor();
+void hangInAtExit();
+void useHeapInAtExit();
+/// Behind every exit handler.
+void throwWhenUnloaded();
+void printWhenUnloaded();
 
 // Faults of the process: the plug-in changes what it shares with its host.
 void replaceHandlersThenCrash();
 void blockSignalsThenCrash();
 /// Those that tell of a crash still arrive.
 void blockSignalsButCrashes();
+void bufferStdout();
 void closeStdout();
 void floodStdout();
-void forkKeepingStdout();
 void changeLocaleAndDirectory();
 void trapFloatingPoint();
+
+// Faults of processes that the plug-in starts.
+void forkKeepingStdout();
+void forkChildThatGoesOn();
+void forkChildThatExits();
+void forkChildThatCrashes();
+void vforkChildThatCrashes();
+void becomeAnotherProgram();
 
 }  // namespace sample_plugins

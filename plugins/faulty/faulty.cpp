@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 #include <optional>
+#include <string>
 
 #include "plugins/faulty/faults.h"
 #include "plugins/faulty/place.h"
@@ -51,25 +52,35 @@ bool isAnsweredAtLength(VstInt32 opcode) {
   return opcode == longTextRequest || (longTextRequest == kEveryRequest && isTextRequest(opcode));
 }
 
-/// Some texts are asked for only after another answer: the product's name when the effect has none, a
-/// program's name by its number when the program cannot be selected, the next child of a shell.
-std::optional<VstIntPtr> answerThatLeadsToTheText(VstInt32 opcode) {
-  if (opcode == effGetEffectName && longTextRequest == effGetProductString) return 0;
-  if (opcode == effSetProgram && longTextRequest == effGetProgramNameIndexed) return 0;
-  if (opcode == effGetPlugCategory && longTextRequest == effShellGetNextPlugin) return kPlugCategShell;
+bool isWanted(VstInt32 opcode) { return longTextRequest == opcode || waitsForRequest(opcode); }
+
+/// Some requests are made only after another answer: the product's name when the effect has none, a program's
+/// name by its number when the program cannot be selected, the next child of a shell, a new name for a
+/// program whose name is another each time.
+std::optional<VstIntPtr> answerThatLeadsToTheFault(VstInt32 opcode, void* ptr) {
+  if (opcode == effGetEffectName && isWanted(effGetProductString)) return 0;
+  if (opcode == effSetProgram && isWanted(effGetProgramNameIndexed)) return 0;
+  if (opcode == effGetPlugCategory && isWanted(effShellGetNextPlugin)) return kPlugCategShell;
+  if (opcode == effGetProgramName && isWanted(effSetProgramName)) {
+    static int names = 0;
+    putText(ptr, "Name " + std::to_string(++names), kProgramNameSize);
+    return 0;
+  }
   return std::nullopt;
 }
 
 /// Counts the places that it gets to.
 class Faulty : public WellBehavedEffect {
  public:
-  using WellBehavedEffect::WellBehavedEffect;
+  explicit Faulty(audioMasterCallback host) : WellBehavedEffect(host) {
+    if (isWanted(effGetChunk) || isWanted(effSetChunk)) effect()->flags |= effFlagsProgramChunks;
+  }
 
  protected:
   VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
     logRequest(opcode);
     reach(Moment::dispatch, opcode);
-    if (const auto answer = answerThatLeadsToTheText(opcode)) return *answer;
+    if (const auto answer = answerThatLeadsToTheFault(opcode, ptr)) return *answer;
     if (isAnsweredAtLength(opcode)) {
       std::memset(ptr, 'x', 3999);
       static_cast<char*>(ptr)[3999] = '\0';

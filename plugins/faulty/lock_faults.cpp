@@ -33,8 +33,8 @@ struct CleansUpAtExit {
 
 }  // namespace
 
-/// The heap stumbles over a damaged list of free blocks inside malloc, while it holds its own lock. It takes
-/// that lock only once a second thread exists.
+/// The heap notices a damaged list of free blocks inside malloc, while it holds its own lock. It takes that
+/// lock only once a second thread exists.
 void crashWithHeapLock() {
   doOnAThreadThatStays([] {});
   constexpr std::size_t kSize = 65536;  // Neither cached nor mapped on its own.
@@ -42,9 +42,10 @@ void crashWithHeapLock() {
   void* volatile damaged = std::malloc(kSize);
   void* volatile after = std::malloc(kSize);
   std::free(damaged);
-  // A free block begins with the links to the next and the last one in its list: no such address.
+  // A free block begins with the links to the next and the last one in its list. This one is in no list.
+  static std::uintptr_t another[64];
   auto* links = static_cast<volatile std::uintptr_t*>(damaged);
-  links[0] = links[1] = 16;
+  links[0] = links[1] = reinterpret_cast<std::uintptr_t>(another);
   void* volatile more = std::malloc(kSize + kSize / 2);
   std::free(more);
   std::free(before);
@@ -56,6 +57,10 @@ void crashWithHeapLock() {
 void crashWithStdoutLock() {
   doOnAThreadThatStays([] { flockfile(stdout); });
   storeToAddressZero();
+}
+
+void holdStdoutLock() {
+  doOnAThreadThatStays([] { flockfile(stdout); });
 }
 
 /// The crashing thread holds the stream's lock itself.

@@ -67,6 +67,10 @@ const std::optional<Place>& wantedPlace() {
 
 bool waitsForSetParameter() { return wantedPlace() && wantedPlace()->moment == Moment::setParameter; }
 
+bool waitsForRequest(VstInt32 opcode) {
+  return wantedPlace() && wantedPlace()->moment == Moment::dispatch && wantedPlace()->opcode == opcode;
+}
+
 void reach(Moment moment, VstInt32 opcode) {
   if (!wantedPlace()) return;
   const Place& wanted = *wantedPlace();

@@ -17,6 +17,8 @@ enum class Moment { load, entry, dispatch, getParameter, setParameter };
 
 /// Whether the fault happens when a parameter is set.
 bool waitsForSetParameter();
+/// Whether the fault happens when this request arrives.
+bool waitsForRequest(VstInt32 opcode);
 
 /// Tells that the plug-in has got there. The fault is committed when this is the place, and its turn.
 /// `opcode` tells requests apart; other moments have none.

@@ -1,36 +1,29 @@
-// Faults on a plug-in's own thread, at the end of the process, and in what a plug-in shares with its host.
+// Faults on a plug-in's own thread, and in what a plug-in shares with its host.
 #include <algorithm>
 #include <cfenv>
 #include <chrono>
 #include <clocale>
 #include <csignal>
+#include <cstdio>
 #include <cstdlib>
 #include <future>
 #include <string>
 #include <thread>
 
+#include <pthread.h>
 #include <unistd.h>
 
 #include "plugins/faulty/faults.h"
 
 namespace sample_plugins {
-namespace {
-
-bool crashesWhenDestroyed = false;
-
-struct CrashesWhenDestroyed {
-  ~CrashesWhenDestroyed() {
-    if (crashesWhenDestroyed) storeToAddressZero();
-  }
-} crashesAtExit;
-
-}  // namespace
 
 void crashOnAThread() { std::thread(storeToAddressZero).join(); }
 
 void throwOnAThread() {
   std::thread([] { throw 5; }).join();
 }
+
+void overflowTheStackOfAThread() { std::thread(overflowTheStack).join(); }
 
 /// One second is what the way out of a process may take.
 void crashOnAThreadBehindTheRun() {
@@ -42,17 +35,6 @@ void crashOnAThreadBehindTheRun() {
   std::thread(storeToAddressZero).detach();
   leaving.get_future().wait();
 }
-
-void crashInEveryAtExit() {
-  std::atexit([] {
-    crashInEveryAtExit();
-    storeToAddressZero();
-  });
-}
-
-void crashInAtExit() { std::atexit(storeToAddressZero); }
-
-void crashInStaticDestructor() { crashesWhenDestroyed = true; }
 
 void replaceHandlersThenCrash() {
   for (const int number :
@@ -78,6 +60,13 @@ void blockSignalsButCrashes() {
   pthread_sigmask(SIG_BLOCK, &most, nullptr);
 }
 
+void leaveTheThread() { pthread_exit(nullptr); }
+
+void bufferStdout() {
+  static char buffer[65536];
+  if (std::setvbuf(stdout, buffer, _IOFBF, sizeof buffer) != 0) complain("no buffer for standard output");
+}
+
 void closeStdout() { close(STDOUT_FILENO); }
 
 /// 8 MiB, more than any pipe takes in without a reader.
@@ -90,13 +79,6 @@ void floodStdout() {
       done += static_cast<std::size_t>(count);
     }
   }
-}
-
-/// The child holds on to the stream for half a minute, longer than its host should wait.
-void forkKeepingStdout() {
-  if (fork() != 0) return;
-  sleep(30);
-  _exit(0);
 }
 
 void changeLocaleAndDirectory() {

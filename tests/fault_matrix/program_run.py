@@ -142,7 +142,7 @@ def without_noise(row, output):
         if output.count(FLOOD) < 65536:
             return None
         output = output.replace(FLOOD, "")
-    if "print" in kinds:
+    if "print" in kinds or "print_when_unloaded" in kinds:
         if output.count(TEXT_WITHOUT_END) != 1:
             return None
         output = output.replace(TEXT_WITHOUT_END, "")

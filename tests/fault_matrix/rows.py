@@ -35,7 +35,8 @@ TEXT_WITHOUT_END = "a text without an end"
 # instance", or "no second instance" (the description before the first drawn test does without); parameter calls
 # swallow it.
 
-Place = collections.namedtuple("Place", "name steps phase thrown")
+# total: 51 for a place that only a shell gets to; its whole run is one step.
+Place = collections.namedtuple("Place", "name steps phase thrown total", defaults=(64,))
 
 CREATE = "create and initialize"
 GATHER = "gather info"
@@ -61,6 +62,7 @@ PLACES = [
     Place("dispatch:51", 0, None, "no instance"),         # can do
     Place("dispatch:35", 0, CREATE, "line"),              # category
     Place("dispatch:45", 1, GATHER, "line"),              # effect name
+    Place("dispatch:48", 1, GATHER, "line"),              # product
     Place("dispatch:47", 1, GATHER, "line"),              # vendor
     Place("dispatch:58", 1, GATHER, "line"),              # version of the interface
     Place("dispatch:35:2", 1, GATHER, "line"),
@@ -71,6 +73,7 @@ PLACES = [
     Place("dispatch:26", 1, GATHER, "line"),              # can be automated
     Place("dispatch:56", 1, GATHER, "line"),              # parameter properties
     Place("dispatch:56:3", 1, GATHER, "line"),
+    Place("dispatch:70", 1, GATHER, "line", 51),          # next child of a shell
     Place("getParameter", 1, None, "swallowed"),
     Place("setParameter", 1, None, "swallowed"),
     Place("dispatch:45:2", 2, CLASS_INFO, "line"),
@@ -79,18 +82,24 @@ PLACES = [
     Place("dispatch:51:9", 2, CLASS_INFO, "line"),
     Place("dispatch:3", 3, PRESET_INFO, "line"),          # which program
     Place("dispatch:5", 3, PRESET_INFO, "line"),          # program name
+    Place("dispatch:29", 3, PRESET_INFO, "line"),         # program name by its number
+    Place("dispatch:4", 3, PRESET_INFO, "line"),          # set the program's name
     Place("dispatch:2:2", 3, PRESET_INFO, "line"),
     Place("dispatch:3:22", 3, PRESET_INFO, "line"),
     Place("dispatch:27", 4, PARAMETER_INFO, "line"),      # value from a text
     Place("dispatch:56:6", 4, PARAMETER_INFO, "line"),
     Place("dispatch:10:2", 5, SETTING_STATE, "line"),
     Place("dispatch:11:2", 5, SETTING_STATE, "line"),
+    Place("dispatch:23", 5, SETTING_STATE, "line"),       # get a program's chunk
+    Place("dispatch:23:2", 5, SETTING_STATE, "line"),     # get a bank's chunk
+    Place("dispatch:24", 5, SETTING_STATE, "line"),       # set a program's chunk
+    Place("dispatch:24:2", 5, SETTING_STATE, "line"),     # set a bank's chunk
     Place("dispatch:12", 5, SETTING_STATE, "line"),       # on
     Place("dispatch:44", 5, SETTING_STATE, "line"),       # bypass
     Place("dispatch:44:2", 5, SETTING_STATE, "line"),
     Place("dispatch:12:2", 5, SETTING_STATE, "line"),
     Place("dispatch:52", 6, LATENCY, "line"),             # tail size
-    # Steps 7 and 8, the stream format, make no request of an ordinary plug-in.
+    # Steps 7 and 8, the stream format, make no request.
     Place("dispatch:52:2", 9, LATENCY, "line"),
     Place("dispatch:10:3", 10, SETTING_STATE, "line"),
     Place("dispatch:12:4", 10, SETTING_STATE, "line"),
@@ -151,12 +160,13 @@ KINDS = [
          errors="vsttorture: uncaught system exception: illegal instruction (SIGILL)\n"),
     Kind("double_free", CRASH),
     Kind("heap_corruption", CRASH),
-    Kind("crash_with_heap_lock", CRASH),
+    Kind("crash_with_heap_lock", CRASH, errors="malloc(): unsorted double linked list corrupted\n"),
     Kind("crash_with_stdout_lock", CRASH),
     Kind("crash_with_own_stdout_lock", CRASH),
     Kind("crash_under_destructor_lock", CRASH),
     Kind("thread_crash", CRASH),
     Kind("thread_throw", CRASH, errors="terminate called after throwing an instance of 'int'\n"),
+    Kind("thread_stack_overflow", KILLED, 11),
     Kind("thread_crash_behind_the_run", CRASH),
     Kind("crash_in_atexit", LATE),
     Kind("crash_in_every_atexit", LATE),
@@ -187,12 +197,12 @@ KIND_OF = {kind.name: kind for kind in KINDS}
 End = collections.namedtuple("End", "steps tail status verdict errors total", defaults=(None, 64))
 
 
-def crash_at(steps, errors=None):
-    return End(steps, LAST_WORDS, 7, "crashed at {}", errors)
+def crash_at(steps, errors=None, total=64):
+    return End(steps, LAST_WORDS, 7, "crashed at {}", errors, total)
 
 
-def passed(errors=""):
-    return End(ALL_STEPS, "", 0, "passed", errors)
+def passed(errors="", total=64):
+    return End(1, "", 1, "shell", errors, 51) if total == 51 else End(ALL_STEPS, "", 0, "passed", errors)
 
 
 def gone_at(steps, status):
@@ -202,6 +212,12 @@ def gone_at(steps, status):
     if steps == ALL_STEPS and status == 0:
         return End(steps, "", status, "passed", "")
     return End(steps, "", status, "crashed at {}" if status == 7 else f"exited at {{}} with {status}", "")
+
+
+def muted_at(place):
+    """Where no line follows, none is missing."""
+    whole_run = passed(total=place.total)
+    return whole_run if place.steps == whole_run.steps else gone_at(place.steps, 0)
 
 
 def thrown_at(place, said):
@@ -215,6 +231,10 @@ def thrown_at(place, said):
 
 
 def end_of(kind, place):
+    return end_of_kind(kind, place)._replace(total=place.total)
+
+
+def end_of_kind(kind, place):
     if kind.leads_to == THROWN:
         return thrown_at(place, kind.detail)
     return {
@@ -222,9 +242,9 @@ def end_of(kind, place):
         EXIT: lambda: End(place.steps, LAST_WORDS, kind.detail, f"exited at {{}} with {kind.detail}", ""),
         GONE: lambda: gone_at(place.steps, kind.detail),
         KILLED: lambda: End(place.steps, "", -kind.detail, f"killed by signal {kind.detail}", ""),
-        PASS: passed,
-        LATE: lambda: End(ALL_STEPS, "", 7, "crashed at {}", ""),
-        MUTE: lambda: gone_at(place.steps, 0),
+        PASS: lambda: passed(total=place.total),
+        LATE: lambda: End(passed(total=place.total).steps, "", 7, "crashed at {}", ""),
+        MUTE: lambda: muted_at(place),
         HANG: lambda: End(place.steps, "", None, "timed out at {}", ""),
     }[kind.leads_to]()
 
@@ -248,7 +268,7 @@ def rows_of_the_own_runtime():
     """The program's own runtime meets an unwinder that is not its own, and aborts: a crash, wherever it is."""
     for kind in ["throw_int", "throw_runtime_error", "throw_struct"]:
         for place in PLACES:
-            yield row(KIND_OF[kind], place, "faulty_own_runtime", crash_at(place.steps, ""))
+            yield row(KIND_OF[kind], place, "faulty_own_runtime", crash_at(place.steps, "", place.total))
     for kind in ["null_store", "thread_throw", "exit", "stack_overflow"]:
         for place in ["load", "dispatch:52"]:
             yield row(KIND_OF[kind], PLACE_OF[place], "faulty_own_runtime")
@@ -275,7 +295,7 @@ def rows_of_long_texts():
     for opcode, step in LONG_TEXTS:
         end = crash_at(step)
         yield Row(f"faulty/long_texts:{opcode}@entry", "faulty", f"long_texts:{opcode}", "entry", 9, end)
-    end = End(1, LAST_WORDS, 7, "crashed at {}", None, 51)
+    end = crash_at(1, total=51)
     yield Row("faulty/long_texts:70@entry", "faulty", "long_texts:70", "entry", 9, end)  # next child of a shell
     yield Row("faulty/long_texts@entry", "faulty", "long_texts", "entry", 9, crash_at(1))
 
@@ -298,6 +318,9 @@ def rows_of_combinations():
     for name, place in [("hang", "load"), ("hang", "dispatch:0"), ("hang", "dispatch:52"), ("hang", "dispatch:1:2"),
                         ("spin", "dispatch:52")]:
         yield row(Kind(name, HANG), PLACE_OF[place])
+    for name, place in [("hold_stdout_lock", "dispatch:52"), ("raise:SIGSTOP", "dispatch:52"),
+                        ("hang_in_atexit", "dispatch:1:2"), ("hang_in_atexit+exit", "dispatch:52")]:
+        yield row(Kind(name, HANG), PLACE_OF[place])
     for place, steps in [("entry", 0), ("entry:2", 16)]:
         yield Row(f"faulty/no_instance@{place}", "faulty", "no_instance", place, 9, crash_at(steps, ""))
     for place in ["load", "dispatch:52", "dispatch:1:2"]:
@@ -308,6 +331,21 @@ def rows_of_combinations():
         yield row(Kind("print", PASS), PLACE_OF[place])
         yield row(Kind("print+null_store", CRASH), PLACE_OF[place])
         yield row(Kind("crash_in_static_destructor+crash_in_atexit+raise:SIGTERM", CRASH), PLACE_OF[place])
+        yield row(Kind("hang_in_atexit+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("use_heap_in_atexit+crash_with_heap_lock", CRASH), PLACE_OF[place])
+        yield row(Kind("buffer_stdout", PASS), PLACE_OF[place])
+        yield row(Kind("buffer_stdout+print+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("close_stderr", PASS), PLACE_OF[place])
+        yield row(Kind("close_stderr+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("exec", GONE, 9), PLACE_OF[place])
+        for name, number in [("SIGQUIT", 3), ("SIGUSR1", 10), ("SIGPIPE", 13), ("SIGALRM", 14), ("SIGXCPU", 24),
+                             ("SIGVTALRM", 26)]:
+            yield row(Kind(f"raise:{name}", KILLED, number), PLACE_OF[place])
+    # The forced unwinding passes the handler of the phase, which must not end it.
+    not_rethrown = "FATAL: exception not rethrown\n"
+    yield Row("faulty/leave_the_thread@entry", "faulty", "leave_the_thread", "entry", 9, crash_at(0, not_rethrown))
+    yield Row("faulty/leave_the_thread@dispatch:52", "faulty", "leave_the_thread", "dispatch:52", 9,
+              End(6, f"!{LATENCY} failed, unknown error\n{LAST_WORDS}", 7, "crashed at {}", not_rethrown))
 
 
 def rows_of_whole_plugins():

@@ -37,6 +37,8 @@ NEEDED_BY = {
     "timer": {
         "faulty/crash_with_stdout_lock@dispatch:52": ("timed out at 6", False),
         "faulty/crash_under_destructor_lock@dispatch:52": ("timed out at 6", False),
+        "faulty/hang_in_atexit+null_store@dispatch:52": ("timed out at 6", False),
+        "faulty/use_heap_in_atexit+crash_with_heap_lock@dispatch:52": ("timed out at 6", False),
     },
     "closed_report": {
         "faulty/thread_crash_behind_the_run@dispatch:52": ("passed", False),

@@ -5,9 +5,9 @@
 //                                        answers
 //
 // Prints a line after each step; "caught ..." and status 9 when the plug-in throws. All signals are the
-// system's own, except with TINY_HOST_ON_CRASH: a SIGSEGV then prints "crashed", uses what it names (malloc,
-// stdout or exit), prints "not locked" and ends with status 8. With TINY_HOST_SECONDS, SIGALRM ends it after
-// that time.
+// system's own, except with TINY_HOST_ON_CRASH: a SIGSEGV or SIGABRT then prints "crashed", uses what it
+// names (malloc, stdout or exit), prints "not locked" and ends with status 8. With TINY_HOST_SECONDS, SIGALRM
+// ends it after that time.
 #include <array>
 #include <cmath>
 #include <csignal>
@@ -81,7 +81,7 @@ void setUpSignals() {
   }
   if (const char* used = std::getenv("TINY_HOST_ON_CRASH")) {
     usedOnCrash = used;
-    std::signal(SIGSEGV, handleCrash);
+    for (const int number : {SIGSEGV, SIGABRT}) std::signal(number, handleCrash);
   }
 }
 

@@ -1,0 +1,55 @@
+// Faults of processes that the plug-in starts: they share its output, and are no part of the run.
+#include <cstdlib>
+
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include "plugins/faulty/faults.h"
+
+namespace sample_plugins {
+namespace {
+
+/// Forks; the child does `work`, and the plug-in waits for its end.
+void doInAChild(void (*work)()) {
+  const pid_t child = fork();
+  if (child == 0) {
+    work();
+    _exit(0);
+  }
+  waitpid(child, nullptr, 0);
+}
+
+}  // namespace
+
+/// The child holds on to the stream for half a minute, longer than its host should wait.
+void forkKeepingStdout() {
+  if (fork() != 0) return;
+  sleep(30);
+  _exit(0);
+}
+
+/// From here on there are two of them.
+void forkChildThatGoesOn() { static_cast<void>(fork()); }
+
+void forkChildThatExits() {
+  doInAChild([] { std::exit(9); });
+}
+
+void forkChildThatCrashes() { doInAChild(storeToAddressZero); }
+
+/// The child works in its parent's memory.
+void vforkChildThatCrashes() {
+  const pid_t child = vfork();  // NOLINT(clang-analyzer-security.insecureAPI.vfork): that is the point
+  if (child == 0) {
+    storeToAddressZero();
+    _exit(0);
+  }
+  waitpid(child, nullptr, 0);
+}
+
+void becomeAnotherProgram() {
+  execl("/bin/sh", "sh", "-c", "exit 9", nullptr);
+  complain("there is no shell");
+}
+
+}  // namespace sample_plugins
