@@ -46,8 +46,10 @@ void setupBundle(int count, int limit, VSTBundle& out) {
 }
 
 const std::vector<PrototypeVSTVariant>& GetPrototypeVariants() {
-  static const std::vector<PrototypeVSTVariant> variants(std::begin(kPrototypes), std::end(kPrototypes));
-  return variants;
+  // On purpose: never destroyed. A plug-in's thread may be in exit() while the run still reads them.
+  static const auto* const variants =
+      new std::vector<PrototypeVSTVariant>(std::begin(kPrototypes), std::end(kPrototypes));
+  return *variants;
 }
 
 VSTVariant::VSTVariant(const PrototypeVSTVariant& p, const VSTBundle& in, const VSTBundle& out)

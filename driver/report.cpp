@@ -3,9 +3,11 @@
 #include <atomic>
 #include <csignal>
 #include <cstdio>
+#include <cstdlib>
 #include <ctime>
 
 #include <poll.h>
+#include <pthread.h>
 #include <unistd.h>
 
 int gStep = 0;
@@ -22,6 +24,7 @@ enum class LastWords { kUnsaid, kBeingSaid, kSaid };
 
 std::atomic<LastWords> lastWords{LastWords::kUnsaid};
 std::atomic<bool> reportIsClosed{false};
+std::atomic<pthread_t> closer{};
 
 /// The name of the phase under way, in a buffer of its own; empty before the first phase.
 void copyPhaseName(char (&phase)[kPhaseNameSize]) {
@@ -152,8 +155,13 @@ void printUnexpectedExitDirectly() {
   lastWords = LastWords::kSaid;
 }
 
-void closeReport() { reportIsClosed = true; }
+void closeReport() {
+  closer = pthread_self();
+  reportIsClosed = true;
+}
 
 void waitIfReportIsClosed() {
-  while (reportIsClosed) pause();
+  if (!reportIsClosed) return;
+  if (pthread_equal(closer, pthread_self()) != 0) std::abort();
+  for (;;) pause();
 }

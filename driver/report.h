@@ -32,7 +32,8 @@ void printUnexpectedExit();
 void printUnexpectedExitDirectly();
 
 /// Nothing may follow the last words: from now on a thread that wants to print a line waits for the end of
-/// the process instead. Safe inside a signal handler.
+/// the process instead. Safe inside a signal handler. Called by the thread that ends the process.
 void closeReport();
-/// Waits for the end of the process if the report is closed. Called before a verdict is given.
+/// Waits for the end of the process if the report is closed. Called before a verdict is given. The thread that
+/// closed it would wait for itself: an exit handler has thrown it out of exit(), which is a crash.
 void waitIfReportIsClosed();

@@ -73,5 +73,7 @@ void leaveAfterCrash() {
 }
 
 void atExitFunction() {
-  if (!gExpectedEnd) printUnexpectedExit();
+  if (gExpectedEnd) return;
+  if (isSpread(SafetyNet::kClosedReport)) closeReport();
+  printUnexpectedExit();
 }

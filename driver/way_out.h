@@ -19,5 +19,6 @@ void prepareSignalStack();
 /// Leaves through exit(gCrashCode), with the nets spread out. For signal handlers of any thread.
 [[noreturn]] void leaveAfterCrash();
 
-/// The at-exit guard: writes "unexpected exit" unless the end is expected.
+/// The at-exit guard: writes "unexpected exit" unless the end is expected. The run may still go on when it is
+/// another thread that ends the process; it prints nothing any more.
 void atExitFunction();

@@ -168,6 +168,7 @@ KINDS = [
     Kind("thread_throw", CRASH, errors="terminate called after throwing an instance of 'int'\n"),
     Kind("thread_stack_overflow", KILLED, 11),
     Kind("thread_crash_behind_the_run", CRASH),
+    Kind("exit_on_a_thread", EXIT, 9),
     Kind("crash_in_atexit", LATE),
     Kind("crash_in_every_atexit", LATE),
     Kind("crash_in_static_destructor", LATE),
@@ -337,6 +338,8 @@ def rows_of_combinations():
         yield row(Kind("buffer_stdout+print+null_store", CRASH), PLACE_OF[place])
         yield row(Kind("close_stderr", PASS), PLACE_OF[place])
         yield row(Kind("close_stderr+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("throw_when_unloaded+exit", CRASH), PLACE_OF[place])
+        yield row(Kind("throw_when_unloaded+null_store", CRASH), PLACE_OF[place])
         yield row(Kind("exec", GONE, 9), PLACE_OF[place])
         for name, number in [("SIGQUIT", 3), ("SIGUSR1", 10), ("SIGPIPE", 13), ("SIGALRM", 14), ("SIGXCPU", 24),
                              ("SIGVTALRM", 26)]:

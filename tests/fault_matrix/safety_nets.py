@@ -43,6 +43,7 @@ NEEDED_BY = {
     "closed_report": {
         "faulty/thread_crash_behind_the_run@dispatch:52": ("passed", False),
         "faulty/thread_crash_behind_the_run@dispatch:1": ("passed", False),
+        "faulty/exit_on_a_thread@dispatch:52": ("exited at 65 with 0", False),
     },
     "direct_last_words": {
         "faulty/crash_with_stdout_lock@dispatch:52": ("crashed at 6", False),
