@@ -10,6 +10,8 @@
 #include <pthread.h>
 #include <unistd.h>
 
+#include "driver/safety_nets.h"
+
 int gStep = 0;
 const char* gCurTest = nullptr;
 
@@ -25,6 +27,7 @@ enum class LastWords { kUnsaid, kBeingSaid, kSaid };
 std::atomic<LastWords> lastWords{LastWords::kUnsaid};
 std::atomic<bool> reportIsClosed{false};
 std::atomic<pthread_t> closer{};
+pid_t owner = 0;  // Nobody's, before the report is opened.
 
 /// The name of the phase under way, in a buffer of its own; empty before the first phase.
 void copyPhaseName(char (&phase)[kPhaseNameSize]) {
@@ -34,7 +37,7 @@ void copyPhaseName(char (&phase)[kPhaseNameSize]) {
 void printLine(const char* line) {
   // Asked under the output's lock, so that nobody's last words get between the question and the line.
   flockfile(stdout);
-  if (!reportIsClosed) {
+  if (!reportIsClosed && isReportOurs()) {
     std::printf("%s", line);
     std::fflush(stdout);
   }
@@ -102,7 +105,10 @@ void sayLastWords() {
 void openReport() {
   std::setvbuf(stdout, nullptr, _IONBF, 0);
   lastWords = LastWords::kUnsaid;
+  owner = getpid();
 }
+
+bool isReportOurs() { return owner == 0 || owner == getpid() || !isSpread(SafetyNet::kOwnProcess); }
 
 void printUsage() { printLine("!too few arguments. syntax is command pathtovst childID(optional)\n"); }
 
@@ -149,6 +155,7 @@ void printUnexpectedExit() {
 }
 
 void printUnexpectedExitDirectly() {
+  if (!isReportOurs()) return;
   if (!claimLastWords()) waitForLastWords();
   if (lastWords == LastWords::kSaid || !outputTakesMore()) return;
   [[maybe_unused]] const ssize_t written = write(STDOUT_FILENO, kLastWords, sizeof kLastWords - 1);

@@ -12,7 +12,12 @@ extern const char* gCurTest;
 
 /// Before the first line: from now on standard output keeps nothing back. What exit() finds in a buffer it
 /// writes, and a signal at the wrong moment would leave a line there that has been written already.
+/// The report belongs to the process that opens it.
 void openReport();
+
+/// False in a process that the plug-in has forked: it shares the output, but what it prints would be taken
+/// for the run's. Nothing here prints a line there. Safe inside a signal handler.
+bool isReportOurs();
 
 /// "!too few arguments. syntax is command pathtovst childID(optional)"
 void printUsage();
@@ -34,6 +39,6 @@ void printUnexpectedExitDirectly();
 /// Nothing may follow the last words: from now on a thread that wants to print a line waits for the end of
 /// the process instead. Safe inside a signal handler. Called by the thread that ends the process.
 void closeReport();
-/// Waits for the end of the process if the report is closed. Called before a verdict is given. The thread that
-/// closed it would wait for itself: an exit handler has thrown it out of exit(), which is a crash.
+/// Waits for the end of the process if the report is closed. Called before a verdict is given. The thread
+/// that closed it would wait for itself: an exit handler has thrown it out of exit(), which is a crash.
 void waitIfReportIsClosed();

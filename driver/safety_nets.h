@@ -16,6 +16,7 @@ enum class SafetyNet {
   kTimer,            ///< The way out takes a second at most.
   kClosedReport,     ///< No other thread prints a line any more.
   kDirectLastWords,  ///< The last words get past standard output's lock.
+  kOwnProcess,       ///< A process that the plug-in has forked says nothing.
 };
 
 /// False in the one variant that lacks the net.

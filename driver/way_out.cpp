@@ -65,6 +65,8 @@ void prepareSignalStack() {
 }
 
 void leaveAfterCrash() {
+  // A child of vfork() shares the memory: its crash must leave no trace there.
+  if (!isReportOurs()) _exit(gCrashCode);
   if (leaving.exchange(true) && isSpread(SafetyNet::kEndAtOnce)) endAtOnce();
   if (isSpread(SafetyNet::kClosedReport)) closeReport();
   if (isSpread(SafetyNet::kTimer)) limitTheWayOut();
@@ -73,7 +75,7 @@ void leaveAfterCrash() {
 }
 
 void atExitFunction() {
-  if (gExpectedEnd) return;
+  if (gExpectedEnd || !isReportOurs()) return;
   if (isSpread(SafetyNet::kClosedReport)) closeReport();
   printUnexpectedExit();
 }

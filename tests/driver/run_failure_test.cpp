@@ -14,6 +14,7 @@
 #include <unistd.h>
 
 #include "driver/crash_guard.h"
+#include "driver/report.h"
 #include "driver/torture_test.h"
 #include "driver/way_out.h"
 #include "gmock/gmock.h"
@@ -245,6 +246,7 @@ class CrashingRunDeathTest : public TortureFixture {
   }
   [[noreturn]] void runBehindTheGuard() {
     dup2(STDERR_FILENO, STDOUT_FILENO);
+    openReport();
     const CPPAutoReleasePool pool(7);
     std::atexit(atExitFunction);
     bool isShellPlugin = false;

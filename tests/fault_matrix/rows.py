@@ -185,6 +185,10 @@ KINDS = [
     Kind("close_stdout", MUTE),
     Kind("flood_stdout", PASS),
     Kind("fork_keeping_stdout", PASS),
+    Kind("fork_child_goes_on", PASS),
+    Kind("fork_child_exits", PASS),
+    Kind("fork_child_crashes", PASS),
+    Kind("vfork_child_crashes", PASS),
     Kind("change_locale_and_directory", PASS),
     Kind("trap_floating_point", PASS),
 ]

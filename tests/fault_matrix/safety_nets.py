@@ -50,6 +50,11 @@ NEEDED_BY = {
         "faulty/crash_in_atexit+null_store@dispatch:52": ("crashed at 6", False),
         "faulty/block_signals+raise:SIGTERM+null_store@dispatch:52": ("crashed at 6", False),
     },
+    "own_process": {
+        "faulty/fork_child_exits@dispatch:1:2": ("exited at 65 with 0", True),
+        "faulty/fork_child_crashes@dispatch:1:2": ("exited at 65 with 0", True),
+        "faulty/vfork_child_crashes@dispatch:52": ("crashed at 6", True),
+    },
     "exception_handler": {
         "faulty/raise:SIGILL@dispatch:52": ("killed by signal 4", False),
         "faulty/raise:SIGTRAP@dispatch:52": ("killed by signal 5", False),
