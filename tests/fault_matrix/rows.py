@@ -342,6 +342,10 @@ def rows_of_combinations():
         yield row(Kind("buffer_stdout+print+null_store", CRASH), PLACE_OF[place])
         yield row(Kind("close_stderr", PASS), PLACE_OF[place])
         yield row(Kind("close_stderr+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("print_when_unloaded", PASS), PLACE_OF[place])
+        yield row(Kind("print_when_unloaded+exit", EXIT, 9), PLACE_OF[place])
+        yield row(Kind("print_when_unloaded+null_store", CRASH), PLACE_OF[place])
+        yield row(Kind("print_when_unloaded+throw_int", THROWN, " failed 5"), PLACE_OF[place])
         yield row(Kind("throw_when_unloaded+exit", CRASH), PLACE_OF[place])
         yield row(Kind("throw_when_unloaded+null_store", CRASH), PLACE_OF[place])
         yield row(Kind("exec", GONE, 9), PLACE_OF[place])
@@ -353,6 +357,8 @@ def rows_of_combinations():
     yield Row("faulty/leave_the_thread@entry", "faulty", "leave_the_thread", "entry", 9, crash_at(0, not_rethrown))
     yield Row("faulty/leave_the_thread@dispatch:52", "faulty", "leave_the_thread", "dispatch:52", 9,
               End(6, f"!{LATENCY} failed, unknown error\n{LAST_WORDS}", 7, "crashed at {}", not_rethrown))
+    yield Row("faulty/print_when_unloaded+exit(0)@dispatch:1:2", "faulty", "print_when_unloaded+exit",
+              "dispatch:1:2", 0, End(ALL_STEPS, LAST_WORDS, 0, "exited at {} with 0", ""))
 
 
 def rows_of_whole_plugins():
