@@ -20,7 +20,7 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import try_plugin  # noqa: E402
 from program_run import (LIMIT_IN_SECONDS, Seen, differences, environment_of, plugin_path,  # noqa: E402
-                         run_row)
+                         run_row, take_default_signals)
 from rows import all_rows  # noqa: E402
 from sanitizers import proofs, reason_to_leave_out  # noqa: E402
 
@@ -63,6 +63,7 @@ def main():
         return 1
 
     resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+    take_default_signals()
     started = time.monotonic()
     program, plugins = os.path.abspath(arguments.program), os.path.abspath(arguments.plugins)
     sanitizer = arguments.sanitizer

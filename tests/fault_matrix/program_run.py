@@ -18,6 +18,12 @@ FLOOD = "x" * 127 + "\n"
 Seen = collections.namedtuple("Seen", "output errors status seconds leftovers")
 
 
+def take_default_signals():
+    """A shell starts what it sends to the background with SIGQUIT ignored, and each run would inherit that."""
+    for number in (signal.SIGQUIT, signal.SIGUSR1, signal.SIGALRM, signal.SIGXCPU, signal.SIGVTALRM):
+        signal.signal(number, signal.SIG_DFL)
+
+
 class Child:
     """A program in a process group of its own, and a reader of its output."""
 

@@ -14,7 +14,7 @@ import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import try_plugin  # noqa: E402
-from program_run import run_row  # noqa: E402
+from program_run import run_row, take_default_signals  # noqa: E402
 from rows import all_rows  # noqa: E402
 
 JOBS = 8  # Those that hang only wait.
@@ -82,6 +82,7 @@ def main():
     arguments = parser.parse_args()
 
     resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+    take_default_signals()
     started = time.monotonic()
     rows = {row.name: row for row in all_rows()}
     programs = dict(variant.split("=", 1) for variant in arguments.variants)

@@ -21,7 +21,7 @@ import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import try_plugin  # noqa: E402
-from program_run import run_row  # noqa: E402
+from program_run import run_row, take_default_signals  # noqa: E402
 from rows import KINDS, End, Row  # noqa: E402
 
 SHARE_OF_OTHER_SAMPLES = 0.1
@@ -79,6 +79,7 @@ def main():
     print(f"seed {arguments.seed}", flush=True)
 
     allow_cores()
+    take_default_signals()
     program, plugins = os.path.realpath(arguments.program), os.path.abspath(arguments.plugins)
     samples = sorted(path.stem for path in pathlib.Path(plugins).glob("*.so"))
     draw = random.Random(arguments.seed)
