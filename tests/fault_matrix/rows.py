@@ -319,6 +319,35 @@ def rows_of_statuses():
                 yield Row(f"faulty/{kind}({status})@{place}", "faulty", kind, place, status, end)
 
 
+# Faults that follow each other, and others that need not be tried at every place.
+COMBINATIONS = [
+    Kind("flood_stdout+null_store", CRASH),
+    Kind("fork_keeping_stdout+null_store", CRASH),
+    Kind("print", PASS),
+    Kind("print+null_store", CRASH),
+    Kind("crash_in_static_destructor+crash_in_atexit+raise:SIGTERM", CRASH),
+    Kind("hang_in_atexit+null_store", CRASH),
+    Kind("use_heap_in_atexit+crash_with_heap_lock", CRASH),
+    Kind("buffer_stdout", PASS),
+    Kind("buffer_stdout+print+null_store", CRASH),
+    Kind("close_stderr", PASS),
+    Kind("close_stderr+null_store", CRASH),
+    Kind("print_when_unloaded", PASS),
+    Kind("print_when_unloaded+exit", EXIT, 9),
+    Kind("print_when_unloaded+null_store", CRASH),
+    Kind("print_when_unloaded+throw_int", THROWN, " failed 5"),
+    Kind("throw_when_unloaded+exit", CRASH),
+    Kind("throw_when_unloaded+null_store", CRASH),
+    Kind("exec", GONE, 9),
+    Kind("raise:SIGQUIT", KILLED, 3),
+    Kind("raise:SIGUSR1", KILLED, 10),
+    Kind("raise:SIGPIPE", KILLED, 13),
+    Kind("raise:SIGALRM", KILLED, 14),
+    Kind("raise:SIGXCPU", KILLED, 24),
+    Kind("raise:SIGVTALRM", KILLED, 26),
+]
+
+
 def rows_of_combinations():
     for name, place in [("hang", "load"), ("hang", "dispatch:0"), ("hang", "dispatch:52"), ("hang", "dispatch:1:2"),
                         ("spin", "dispatch:52")]:
@@ -331,27 +360,8 @@ def rows_of_combinations():
     for place in ["load", "dispatch:52", "dispatch:1:2"]:
         steps = PLACE_OF[place].steps
         yield row(Kind("close_stdout+null_store", MUTE), PLACE_OF[place], end=End(steps, "", 7, "crashed at {}", ""))
-        yield row(Kind("flood_stdout+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("fork_keeping_stdout+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("print", PASS), PLACE_OF[place])
-        yield row(Kind("print+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("crash_in_static_destructor+crash_in_atexit+raise:SIGTERM", CRASH), PLACE_OF[place])
-        yield row(Kind("hang_in_atexit+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("use_heap_in_atexit+crash_with_heap_lock", CRASH), PLACE_OF[place])
-        yield row(Kind("buffer_stdout", PASS), PLACE_OF[place])
-        yield row(Kind("buffer_stdout+print+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("close_stderr", PASS), PLACE_OF[place])
-        yield row(Kind("close_stderr+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("print_when_unloaded", PASS), PLACE_OF[place])
-        yield row(Kind("print_when_unloaded+exit", EXIT, 9), PLACE_OF[place])
-        yield row(Kind("print_when_unloaded+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("print_when_unloaded+throw_int", THROWN, " failed 5"), PLACE_OF[place])
-        yield row(Kind("throw_when_unloaded+exit", CRASH), PLACE_OF[place])
-        yield row(Kind("throw_when_unloaded+null_store", CRASH), PLACE_OF[place])
-        yield row(Kind("exec", GONE, 9), PLACE_OF[place])
-        for name, number in [("SIGQUIT", 3), ("SIGUSR1", 10), ("SIGPIPE", 13), ("SIGALRM", 14), ("SIGXCPU", 24),
-                             ("SIGVTALRM", 26)]:
-            yield row(Kind(f"raise:{name}", KILLED, number), PLACE_OF[place])
+        for kind in COMBINATIONS:
+            yield row(kind, PLACE_OF[place])
     # The forced unwinding passes the handler of the phase, which must not end it.
     not_rethrown = "FATAL: exception not rethrown\n"
     yield Row("faulty/leave_the_thread@entry", "faulty", "leave_the_thread", "entry", 9, crash_at(0, not_rethrown))
