@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What saving and loading a bank costs for each parameter of each program, in process, on the plug-in that
 // answers nothing. `per_value` is that cost in seconds; a loop over the values alone stands beside it.
 #include <cstdlib>

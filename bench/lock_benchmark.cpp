@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The wrapper's lock against the standard one while nobody else wants it: taken and given back, and once more
 // by the thread that holds it.
 #include <mutex>

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: MIT
 """Holds the cost of vsttorture against the bare C host of bench/floor, whole processes in pairs.
 
     cmake --preset bench && cmake --build --preset bench

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # Gives the files that cpack is about to pack the form that Debian wants: folders open to everybody, whatever the
 # umask, and man page and changelog compressed (-n: without the time of day).
 if(CPACK_GENERATOR STREQUAL "DEB")

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # What every target of ours is compiled with.
 set(CMAKE_CXX_STANDARD 17)
 set(CMAKE_CXX_STANDARD_REQUIRED ON)

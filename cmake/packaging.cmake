@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # What `cmake --install` puts in place, and the Debian package that `cpack` makes of it.
 include(GNUInstallDirs)
 install(TARGETS vsttorture RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})

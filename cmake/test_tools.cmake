@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # Decides whether the tests are built: sets BUILD_THE_TESTS.
 #
 # The program itself needs a compiler only, so a machine without the tests' tools still builds it.

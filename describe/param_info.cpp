@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "describe/param_info.h"
 
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The description of one parameter.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "describe/speaker_arrangement.h"
 
 #include <cstddef>

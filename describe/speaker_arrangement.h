@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Speaker arrangements for a channel count and a surround model.
 #pragma once
 

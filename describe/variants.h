@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The input/output configurations that a plug-in may be offered.
 //
 // Every variant starts from a row of one fixed table of prototypes and adds how the plug-in's own channels

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "describe/vst_info.h"
 
 #include <functional>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the program learns about one plug-in.
 //
 // Building a record asks the plug-in everything that can be asked about it, which is the point of building

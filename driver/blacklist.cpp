@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "driver/blacklist.h"
 
 #include <cctype>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "driver/crash_guard.h"
 
 #include <csignal>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The guard that turns crashes, signals and exceptions that nobody caught into a known exit status.
 #pragma once
 

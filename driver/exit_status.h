@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the process ends with.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // vsttorture: tries out one VST 2.x plug-in, so that a host need not find out in its own process.
 #include <cstdio>
 #include <cstdlib>

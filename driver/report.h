@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The lines that a host reads: everything that this program prints on standard output.
 //
 // Each line is flushed before the work that it announces begins, so the last line names the step in which a

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What is done with a plug-in once it has been created.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The safety nets around the way out, by name.
 //
 // The program spreads all of them. A test builds it without one at a time (VSTTORTURE_WITHOUT=kTimer) and

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "driver/test_catalogue.h"
 
 #include <algorithm>

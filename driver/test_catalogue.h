@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The six tests that every plug-in goes through.
 //
 //   0  inspect class info          names, category, pin properties, capabilities

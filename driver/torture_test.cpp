@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "driver/torture_test.h"
 
 #include "driver/crash_guard.h"

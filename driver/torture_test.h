@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The torture test of one plug-in: its frame from loading to the verdict.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "driver/way_out.h"
 
 #include <atomic>

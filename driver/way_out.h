@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The way out after a crash, which always ends.
 //
 // A crash leaves through exit(), so that the at-exit guard speaks and standard output is flushed. exit() runs

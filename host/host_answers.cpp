@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "host/host_answers.h"
 
 #include <cstring>

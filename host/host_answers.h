@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The answers of the host callback that need a little arithmetic or a table.
 #pragma once
 

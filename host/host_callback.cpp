@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The host's side of the conversation: what plug-ins are answered when they call their host.
 //
 // Threads: any that the plug-in has. Reads VSTWrapper::gCurrentLoadID and no other state, never the instance:

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "host/host_identity.h"
 
 void GetHostVersion(KelClientVersion& version) { version = {8, 0, 0}; }

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Who this host says it is.
 #pragma once
 

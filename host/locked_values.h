@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Parameter values of an instance, one after the other under one hold of the wrapper's lock.
 //
 // The lock costs more than a plug-in that just tells a value. Where all values are read or written in a row

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "host/preset_format.h"
 
 #include <algorithm>

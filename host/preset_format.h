@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Reading and writing the fields of preset and bank data.
 //
 // The data is big-endian and this program runs on little-endian processors only, so every field is reversed,

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The host side of one plug-in instance.
 //
 // VSTWrapper owns an instance from its creation through the module's entry point to effClose (1), and turns

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: creation, destruction and basic queries.
 #include <exception>
 

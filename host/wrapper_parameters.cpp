@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: parameters.
 #include "host/locked_values.h"
 #include "host/vst_wrapper.h"

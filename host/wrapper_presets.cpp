@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: preset and bank data.
 //
 // Four forms: one program or a bank of all, each with parameter values or with the plug-in's own chunk. The

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: programs, and the store that saves the current one while others are visited.
 //
 // A temporary parameter store is the program's name (64 bytes, zero-terminated), then one 32-bit float for

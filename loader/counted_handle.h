@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Counted handles to objects that carry their own count.
 //
 // Threads: one. Counts are plain integers.

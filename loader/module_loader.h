@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Loads plug-in bundles and shares them.
 //
 // Ask for a bundle with VSTPluginLoader::demandLoadedPlugin(); asking twice for the same path gives the same

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "loader/plugin_identity.h"
 
 #include <utility>

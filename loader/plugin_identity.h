@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The records that name a plug-in: the bundle it comes in, and the child of a shell that it may be.
 //
 // Plain values, copied freely; each owns its strings. putTo and getFrom travel over an INiduStream and let

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The stream form of the identity records.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A stream of typed values, through which identity records are stored and sent.
 //
 // The records fix the order of the values; how a value is encoded is the stream's own business. This program

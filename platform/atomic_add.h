@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The atomic addition that locks are counted with: macOS has one, elsewhere it is written here.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // CoreFoundation, as far as this program uses it: strings, file URLs, bundles and the user's locale.
 //
 // On macOS this is the system's own header. Elsewhere the same names are declared here and implemented by

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The name under which the oldest plug-ins of this system export their entry point.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The system's handler for exceptions that nobody caught, and the pool and delegate that arm it.
 //
 // On macOS: Foundation's NSAutoreleasePool and NSExceptionHandler with an Objective-C++ delegate. On Linux:

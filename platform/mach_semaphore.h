@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Counting semaphores of the Mach kernel.
 //
 // On macOS these are the system's own; elsewhere this header declares the few that the program uses and

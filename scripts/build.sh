@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # What ./run, ./check and .ci/run share. Sourced by them; functions work in the source folder.
 # shellcheck shell=bash
 

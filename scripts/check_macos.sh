@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: MIT
 # Checks the sources for macOS on Debian 12: compiles them for three kinds of Mac, links them, and runs the
 # Objective-C++ one on GNUstep. One line for each check; status 1 when one fails. docs/MACOS.md says what is checked.
 set -euo pipefail

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: MIT
 # Checks the Debian packages, amd64 out of build/release and i386 out of build/x86: makes each, installs it on a fresh
 # Debian 12 that holds what the package asks for and nothing else, runs the program there, and removes it again.
 # One line for each check; status 1 when one fails. Works as root, else through sudo; all it makes is in a folder of

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The atomic addition under the lock's counter.
 #pragma once
 

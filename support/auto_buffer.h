@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An owned block of bytes: preset, bank and chunk data are put together in one, parameter values saved in
 // one.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Byte order.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "support/exceptions.h"
 
 #include <exception>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The two things this program throws, and the checks that throw them.
 //
 // A needed resource that cannot be had is the plain int -1. A failed stream operation is a NiduException, a

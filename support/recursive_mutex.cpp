@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The recursive lock: an atomic counter, and a semaphore for those who come too late.
 #include "support/recursive_mutex.h"
 

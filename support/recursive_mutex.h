@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A lock that its owner may take again, cheap while nobody else wants it.
 //
 // The first lock costs one atomic addition, each further one by the owner none. Only threads that have to

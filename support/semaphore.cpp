@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A counting semaphore on those of the Mach kernel.
 #include "support/semaphore.h"
 

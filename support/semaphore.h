@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A counting semaphore that starts without a token.
 //
 // Failures: a semaphore that could not be created stays as an empty one: wait() and signal() then return

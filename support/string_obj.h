@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A text with three integers, as the description of a plug-in keeps its texts.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The fixed text buffers that are cleared, handed to the plug-in and read back.
 //
 // Their sizes (114 bytes for names of plug-ins and makers, 500 for a parameter's name, 256 for other texts of

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The identity of a thread as a value that can also be "no thread".
 //
 // Threads: one thread may assign while others compare. They read the old value or the new one, and nothing

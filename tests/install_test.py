@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Tests of `cmake --install`: what lies where, below a staging folder and below prefixes of all kinds.
 
     install_test.py BUILD SAMPLE_PLUGIN

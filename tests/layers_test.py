@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Holds the program's sources against the map of its folders.
 
 A folder may include itself and those below it; vst2/ may be included by host/ and above. Only platform/ asks

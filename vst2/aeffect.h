@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The record through which host and plug-in instance know each other.
 //
 // A plug-in may have allocated less than the whole record: some own no memory behind processReplacing. Read

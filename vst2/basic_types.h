@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The integer types of the VST 2.x interface and its four-character codes.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The one door through which a request leaves the host.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The requests that the host makes of a plug-in, through its dispatcher.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The requests that a plug-in makes of its host, through the host callback.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Preset and bank data: the big-endian layout of fxp and fxb files.
 //
 // The content that follows each record (parameter values, programs, or a size and a chunk) is reached through

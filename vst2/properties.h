@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The records that a plug-in fills to describe a pin or a parameter.
 //
 // Clear a record before every query: plug-ins fill it in part, and some write to it and then answer 0.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Speaker arrangements: which loudspeaker each channel of a bus feeds.
 #pragma once
 

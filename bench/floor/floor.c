@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* The floor under vsttorture's cost: a bare C host that holds the same conversation with a plug-in, with the
  * same buffers and the same lines of output, and does nothing else. No C++ runtime, no lock around values, no
  * guards, no description kept.

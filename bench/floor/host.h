@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* What the floor answers to a plug-in: the same as the program. */
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* One plug-in instance in the floor: created, asked and closed with the program's requests and buffers, and
  * with nothing around them. */
 #pragma once

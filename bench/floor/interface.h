@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* The part of the VST 2.x interface that the floor uses, in C and apart from vst2/, so that a slip there
  * shows up as a difference between the two conversations. */
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "presets.h"
 
 #include <stdlib.h>

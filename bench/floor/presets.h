@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* Saving and loading the state, as one program or as a bank. */
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* What a run is made of: descriptions and numbered tests. */
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 /* A plug-in that answers nothing, in constant time: every request is 0 and every value is 0, so that a run on
  * it costs what its host costs. NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS say how many it has. */
 #include <stdint.h>

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: MIT
 """Tries out a plug-in with vsttorture, as a host does, and prints one verdict:
 
     try_plugin.py [--limit SECONDS] VSTTORTURE BUNDLE [CHILD_ID]

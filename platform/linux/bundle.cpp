@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // CoreFoundation's bundles on the dynamic loader.
 #include <filesystem>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Which file is a bundle's executable.
 #include "platform/linux/bundle_layout.h"
 

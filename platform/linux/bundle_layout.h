@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Which file is a bundle's executable.
 //
 // A regular file is its own bundle. In a directory the executable is called by the key CFBundleExecutable of

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // CoreFoundation's counting, strings, file URLs and locale. Its bundles are in bundle.cpp.
 #include "platform/core_foundation.h"
 

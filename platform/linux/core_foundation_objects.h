@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The objects behind CoreFoundation's references: one counted base and the two kinds that several sources
 // look into.
 //

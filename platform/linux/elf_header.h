@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // For which architecture a shared object was made.
 #pragma once
 

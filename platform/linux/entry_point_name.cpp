@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // On Linux the oldest plug-ins export "main".
 #include "platform/entry_point_name.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The default exception handler on Linux: system exceptions, as they arrive as signals.
 #include "platform/exception_handler.h"
 

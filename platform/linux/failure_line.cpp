@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How a failed service tells its reason.
 #include "platform/linux/failure_line.h"
 

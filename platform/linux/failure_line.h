@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How a failed service tells its reason: one line on standard error.
 #pragma once
 

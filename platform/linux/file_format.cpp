@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What a file is that is no shared object of this system: a table of first bytes.
 #include "platform/linux/file_format.h"
 

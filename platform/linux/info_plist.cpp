@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Reads the name of a bundle's executable from its Info.plist.
 #include "platform/linux/info_plist.h"
 

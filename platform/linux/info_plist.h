@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Reads the name of a bundle's executable from its Info.plist.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Which locale the user's environment names.
 #include "platform/linux/locale_identifier.h"
 

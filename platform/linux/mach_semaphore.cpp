@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Mach semaphores on futexes.
 //
 // Tokens are handed over, not put down: a signal takes the first waiter out of the queue and writes its

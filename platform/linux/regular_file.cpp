@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Reading the beginning of a file that may turn out to be anything.
 #include "platform/linux/regular_file.h"
 

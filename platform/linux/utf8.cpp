@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What is text: a table of the well-formed byte sequences.
 #include "platform/linux/utf8.h"
 

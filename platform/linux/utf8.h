@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What is text: UTF-8 and its ASCII part.
 #pragma once
 

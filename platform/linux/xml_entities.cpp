@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Entities and character references in the text of an XML document.
 #include "platform/linux/xml_entities.h"
 

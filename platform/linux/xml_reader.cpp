@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A small reader of XML: elements and their text, nothing else.
 #include "platform/linux/xml_reader.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A small reader of XML: elements and their text, nothing else.
 //
 // Comments, declarations, processing instructions, the document type and attributes are passed over. The

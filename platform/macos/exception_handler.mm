@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The default exception handler on macOS: Foundation's, with a delegate of ours.
 #include "platform/exception_handler.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that asks its host everything a host can be asked, three times: in its entry point, when opened,
 // when closed. Used by end_to_end_tests, which read the answers from the file named in ASKS_HOST_LOG, one a
 // line:

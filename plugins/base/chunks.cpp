@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The state of a sample in chunks, all 32-bit floats in the machine's own byte order: a program's chunk is
 // its values; a bank's is the number of the current program, then the values of all programs.
 #include <cstring>

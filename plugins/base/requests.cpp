@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A working answer to every request that a host makes while it tries a plug-in out.
 #include <cstdio>
 #include <cstdlib>

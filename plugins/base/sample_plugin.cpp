@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The record that the host holds, and the C functions behind it.
 #include "plugins/base/sample_plugin.h"
 

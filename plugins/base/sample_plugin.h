@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What all sample plug-ins share: the interface's record, its C functions, and a working answer to every
 // request that a host makes while it tries a plug-in out.
 //

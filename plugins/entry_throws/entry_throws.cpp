@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A plug-in whose entry point throws a std::runtime_error.
 // Used by end_to_end_tests: the program drops it and is left without an instance.
 #include <stdexcept>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect whose parameters read as 1/3 in all the digits of the register that a quotient is made in: on
 // 32-bit x86 that is 64 bits and no float at all. Used by end_to_end_tests, which read the file named in
 // EXCESS_PRECISION_LOG, "getParameter INDEX" or "setParameter INDEX" a line.

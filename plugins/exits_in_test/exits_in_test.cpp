@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that ends the process with status 42 when it is asked for its tail size.
 // Used by end_to_end_tests: the lines up to "inspect latency" stand, "unexpected exit" and the status follow.
 #include <cstdlib>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that ends the process with status 0 when it is opened.
 // Used by end_to_end_tests: "unexpected exit" tells this end from a pass.
 #include <cstdlib>

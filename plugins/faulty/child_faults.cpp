@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Faults of processes that the plug-in starts: they share its output, and are no part of the run.
 #include <cstdlib>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Faults that wait until the process ends.
 #include <atomic>
 #include <chrono>

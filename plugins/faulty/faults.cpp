@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The table of faults, and those of a line or two.
 #include "plugins/faulty/faults.h"
 

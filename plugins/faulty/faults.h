@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What goes wrong, as the environment variable FAULT_KIND says. The names stand in the table of faults.cpp.
 //
 // Several faults, joined by a plus sign, are committed one after the other: print+null_store.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The well-behaved effect with one fault, chosen by FAULT_KIND and FAULT_PLACE (see faults.h and place.h).
 // Used by end_to_end_tests for every way in which a plug-in can end or disturb its process. The requests that
 // it receives are written to the file named in FAULT_LOG: "request OPCODE", one a line.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Crashes that leave something locked which the way out of a process may need.
 #include <cstdint>
 #include <cstdio>

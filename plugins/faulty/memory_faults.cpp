@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Faults in the memory. Volatile pointers to volatile memory keep the compiler from seeing what is done on
 // purpose.
 #include <cstdlib>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Where a fault happens.
 #include "plugins/faulty/place.h"
 

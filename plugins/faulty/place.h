@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Where a fault happens, as the environment variable FAULT_PLACE says:
 //
 //   load                the module is being loaded

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Faults on a plug-in's own thread, and in what a plug-in shares with its host.
 #include <algorithm>
 #include <cfenv>

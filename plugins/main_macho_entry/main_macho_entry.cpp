@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect whose only entry point is `main_macho`.
 // Used by end_to_end_tests: the program finds the second of its names, and the run passes.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect whose only entry point is `main`, as older plug-ins export it.
 // Used by end_to_end_tests: the program finds that name last, and the run passes.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that stores to address zero when it is opened.
 // Used by end_to_end_tests: status 7 after "unexpected exit", before any other line.
 #include "plugins/base/sample_plugin.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that throws a std::runtime_error when it is opened.
 // Used by end_to_end_tests: the program drops it and is left without an instance.
 #include <stdexcept>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that throws an int when it is opened.
 // Used by end_to_end_tests: the program drops it and is left without an instance.
 #include "plugins/base/sample_plugin.h"

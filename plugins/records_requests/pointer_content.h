@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the host passed by pointer, as text that is the same in every run.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that writes down everything its host does with it: 2 inputs, 3 outputs, 3 programs, 3 parameters
 // (the last one stepped). Used by end_to_end_tests, which read the file named in RECORDS_REQUESTS_LOG, one
 // event a line:

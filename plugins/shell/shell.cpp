@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A shell with three children: while the host names one as the current child, the entry point makes that
 // child. Used by end_to_end_tests for the short run of a shell and for runs of a child, known or not.
 #include "plugins/base/sample_plugin.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that calls a function which nobody defines.
 // Used by end_to_end_tests: the module must fail to load, and not crash later at the call.
 #include "plugins/base/sample_plugin.h"

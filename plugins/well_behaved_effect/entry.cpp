@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect with parameters and programs that does everything right.
 // Used by `./run` and wherever a test needs a run that passes.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The effect that does everything right: a volume control.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"
 

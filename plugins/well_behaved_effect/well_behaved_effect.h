@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The effect that does everything right; other samples are this one with something wrong.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An instrument without inputs that takes MIDI, saves its state in chunks, and does everything right.
 // Used by end_to_end_tests for a run that passes with chunks, and for the synth flag of a description.
 #include "plugins/base/sample_plugin.h"

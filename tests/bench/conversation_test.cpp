@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The bare host that benchmarks compare the program with holds the same conversation: a plug-in that writes
 // down everything its host does writes the same lines for both.
 #include <filesystem>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Which variants fit a plug-in's channel counts.
 #include <climits>
 #include <cstdint>

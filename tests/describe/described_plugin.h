@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the tests of the description start from: a live wrapper on an instance in this process.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // This test program's memory: no single object may be larger than 1 GiB. A count that no memory can hold thus
 // fails in the same way on every machine and in every build, also where the system promises what it lacks.
 #include <cstddef>

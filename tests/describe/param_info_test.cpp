@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The description of one parameter: the conversation, the record, and the texts of integer steps.
 #include <climits>
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The description of a shell: its children, and whether they have changed.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Speaker arrangements, byte by byte: 4 bytes type, 4 bytes channel count, 20 entries of 112 bytes with the
 // speaker's type at 80.
 #include <climits>

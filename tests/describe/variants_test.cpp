@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The table of prototypes, and the variants made from its rows.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Descriptions of plug-ins that throw, or that state counts which cannot be true.
 #include <climits>
 #include <stdexcept>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The description of a plug-in: what is asked, what is kept, and the record that is made without a plug-in.
 #include <cstdint>
 #include <stdexcept>

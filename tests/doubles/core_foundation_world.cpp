@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How the recording CoreFoundation keeps its objects and its record.
 #include "tests/doubles/core_foundation_world.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the recording CoreFoundation knows, shared by the test's side and the program's side of it.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The table of request names, in the order of their numbers.
 #include "tests/doubles/effect_opcode_names.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The names of the requests that a host makes of a plug-in, for messages of failing tests.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Entry points without an argument that tells them apart: one function for each plug-in that can exist.
 #include "tests/doubles/in_process_plugin.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A plug-in module that lives in the test program: a bundle of the recording CoreFoundation whose entry point
 // hands out the instances that the test prepared.
 //

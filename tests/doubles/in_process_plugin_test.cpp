@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The in-process plug-in: that its entry point does what was prepared, once each and in order.
 #include <stdexcept>
 

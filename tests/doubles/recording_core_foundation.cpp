@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The test's side of the recording CoreFoundation: what it sets, and what it is told.
 #include "tests/doubles/recording_core_foundation.h"
 

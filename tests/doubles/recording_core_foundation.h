@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Another implementation of platform/core_foundation.h: it records every call and takes its bundles and its
 // locale from the test.
 //

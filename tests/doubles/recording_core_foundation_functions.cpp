@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The program's side of the recording CoreFoundation: all functions of platform/core_foundation.h and of
 // platform/entry_point_name.h.
 #include <algorithm>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The recording CoreFoundation: that it records exactly what was called, fails where it was told to, and
 // counts references as the real one does.
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How the recording instance records and answers.
 #include "tests/doubles/recording_effect.h"
 

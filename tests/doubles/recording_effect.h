@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An in-process plug-in instance for tests of the host: it records every request, and answers as it was told.
 //
 //   RecordingEffect effect;

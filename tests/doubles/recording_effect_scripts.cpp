@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How a test tells the recording instance what to answer.
 #include <algorithm>
 #include <cstring>

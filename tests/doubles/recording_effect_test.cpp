@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The recording instance: that it records exactly what was asked and answers exactly what it was told.
 #include <stdexcept>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The stream in memory: values in a queue, and trouble on demand.
 #include "tests/doubles/recording_stream.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A stream of typed values in memory: it keeps what is written and gives it back, and it records each
 // operation.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How requests are read, expected and compared.
 #include "tests/doubles/request.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // One request that a host made of a plug-in instance, kept as a value: compared with ==, printed by
 // GoogleTest.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // How requests print in the messages of failing tests.
 #include <cstdio>
 #include <cstdlib>

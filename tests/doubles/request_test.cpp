@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Requests as values: what is read from a call, what counts as equal, and how they print.
 #include <cmath>
 #include <limits>

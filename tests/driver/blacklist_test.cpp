@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The bundles that are refused by name, and the comparison behind it.
 #include <string>
 #include <vector>

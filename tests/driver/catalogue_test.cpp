@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The six tests: their names, their texts, and every request that each of them makes, in order.
 #include <climits>
 #include <cstring>

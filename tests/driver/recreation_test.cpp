@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Deleting and creating the instance anew: the order of opening and closing, and what is thrown on the way.
 #include <memory>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The lines on standard output, character by character.
 #include <cstdio>
 #include <string>

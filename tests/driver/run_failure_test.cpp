@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Runs that end at a failure: the failure line, what the plug-in is still asked, and the crash on purpose
 // where there is no instance.
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The whole run of a plug-in that survives it: its lines, its order, its draws, and the short run of a shell.
 #include <cstdint>
 #include <string>

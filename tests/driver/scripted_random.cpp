@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "tests/driver/scripted_random.h"
 
 #include <cstddef>

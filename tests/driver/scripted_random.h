@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The system's random generator and processor clock, as the test scripts them: this test program defines
 // srand, rand and clock itself.
 #pragma once

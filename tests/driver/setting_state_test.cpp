@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The test of settings and state: its requests for each kind of plug-in, and the wrapper's flags as the
 // plug-in finds them during the requests.
 #include <cstdint>

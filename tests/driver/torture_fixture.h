@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the tests of the driver start from: plug-ins in this process, and standard output as text.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Paths that name no plug-in: one failure line, one line of reason on standard error, never a crash.
 #include <csignal>
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the arguments mean, and the bundles that are refused by name.
 #include <gmock/gmock.h>
 

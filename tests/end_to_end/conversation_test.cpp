@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What a plug-in is asked, request by request, between which lines: the whole conversation of a run.
 //
 // The recording sample writes the requests to the program's own standard output, so each stands behind the

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Every end of a process is a known end: crashes and exits of a plug-in, seen through pipes.
 #include <gmock/gmock.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What a plug-in throws: from where it is caught, and which line tells of it.
 #include <gmock/gmock.h>
 

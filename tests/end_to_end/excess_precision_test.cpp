@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A value that a plug-in answers in a register wider than a float, as on 32-bit x86: what was read is
 // written back as the 32-bit float that it is, finds itself in place, and is not sent.
 #include <gmock/gmock.h>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Golden files: the exact lines that a run is expected to give.
 #include "tests/end_to_end/golden_file.h"
 

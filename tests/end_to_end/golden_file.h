@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Golden files: the exact lines that a run is expected to give, kept in tests/end_to_end/golden/.
 //
 // The random pass of a run, steps 16 to 65, stands there as one line, kRandomPass. It stands for fifty step

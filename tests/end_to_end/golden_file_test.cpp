@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The comparison with golden files: what it takes, and what it must not let through.
 #include <gmock/gmock.h>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What a plug-in hears from its host, asked from a real shared object.
 #include <gmock/gmock.h>
 

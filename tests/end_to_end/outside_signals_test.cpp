@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Signals that a host sends to a run which has hung: one line more, a known status, and soon.
 #include <csignal>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The harness itself: hosts that interrupt a program, or do not read what it prints.
 #include <csignal>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Runs a program as a host application does: fork, exec, two pipes, and a thread that waits for the end.
 #include "tests/end_to_end/program_run.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Runs a program as a host application does, and tells everything that a host can see of it.
 //
 //   const ProgramRun run = runVstTorture({samplePlugin("shell")});

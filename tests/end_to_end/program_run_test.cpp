@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The harness itself, tried on shell scripts that end in every way.
 #include <cerrno>
 #include <csignal>

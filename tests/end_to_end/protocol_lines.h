@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The lines that every run of an ordinary plug-in begins with, and how long an end may take.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What goes otherwise in a build with a sanitizer: faults that it takes from the program, leaks that it
 // counts.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Nothing that was printed is lost, and nothing that happens to standard output keeps the process alive.
 #include <csignal>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Whole runs of plug-ins that do nothing wrong: the exact lines and the end.
 #include <gmock/gmock.h>
 

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Every end is a known end: the program with a faulty plug-in, one run for each kind of fault at each place.
 
     fault_matrix.py --program build/release/vsttorture --plugins build/release/plugins [--only REGEX] [--list]

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A system that has no handler for exceptions which nobody caught: the delegate is made, and never asked.
 #include "platform/exception_handler.h"
 

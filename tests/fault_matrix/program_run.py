@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Runs vsttorture as a host does, and compares what is seen with what a row of the matrix demands."""
 import collections
 import os

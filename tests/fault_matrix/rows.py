@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """The rows of the fault matrix: what goes wrong, where, and what a host then has to see.
 
 A run is described by the lines that stand (the first N steps), what follows them, and the status. Nothing here is

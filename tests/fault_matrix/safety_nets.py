@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Each safety net around the way out is needed: without it, rows of the fault matrix fail in a known way.
 
     safety_nets.py --plugins build/release/plugins NET=PROGRAM...

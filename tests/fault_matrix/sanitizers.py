@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """The matrix on a build of the program with a sanitizer: what does not apply there, and why.
 
 The sample plug-ins are never built with one: what they do is not what is looked for.

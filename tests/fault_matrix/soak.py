@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Many runs over the sample plug-ins with faults at random places: none may hang or leave anything behind.
 
     soak.py --program build/release/vsttorture --plugins build/release/plugins [--runs 1000] [--seed N]

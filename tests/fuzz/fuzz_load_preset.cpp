@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Fuzz target: preset and bank data from nowhere, loaded into a plug-in whose numbers are from nowhere too.
 //
 // Input: five bytes of plug-in (flags, programs, parameters, current program and bits: 1 names its programs

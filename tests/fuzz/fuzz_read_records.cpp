@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Fuzz target: the identity records, read from a stream that makes its values of the input.
 //
 // A text is a length byte, doubled, and as many bytes of the input, cut to the length that the record allows.

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: MIT
 """Writes the first inputs of the fuzz targets into corpus/, one small file per case.
 
     tests/fuzz/make_corpus.py

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Gives the files of the folders named on the command line to a fuzz target, once each: how builds without a
 // fuzzer keep trying what fuzzers found.
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::getChunkData and setChunkData: a plug-in's state as the plug-in keeps it.
 #include <cstdint>
 #include <limits>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::setCurrentProgram and changeProgramName: selecting and renaming the current program.
 #include <climits>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Sizes of data whose counts come from a plug-in.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper and the memory of an instance: some plug-ins own only part of the record, and all of them free
 // it when they are closed. The address sanitizer sees a host that reads elsewhere.
 #include <cstddef>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The replaced operators. They stand apart from the tests, so that no new is matched with a free by inlining.
 #include "tests/host/failing_new.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An operator new that fails once, when it is told to. For test programs of their own: it replaces the real
 // one in the whole program.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::masterCallback: the answer to every request that a plug-in can make.
 #include <climits>
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // audioMasterCanDo (37): the capabilities that the host claims.
 #include <cctype>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Who the host says it is.
 #include "gtest/gtest.h"
 #include "host/host_answers.h"

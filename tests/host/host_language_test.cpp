@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // audioMasterGetLanguage (38): the language of the user's locale.
 #include <string>
 

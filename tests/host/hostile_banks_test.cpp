@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Current programs, names and strides that lie: nothing of ours is read or written out of bounds, which the
 // address sanitizer watches.
 #include <cstdint>

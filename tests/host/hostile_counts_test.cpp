@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Counts and program numbers that lie or change while the host works: nothing of ours is read or written out
 // of bounds, which the address sanitizer watches, and what is saved has the size that was asked for at the
 // start.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Sizes that a plug-in makes up: what cannot be allocated is the int -1, and the caller's buffer stays.
 #include <cstdint>
 #include <cstring>

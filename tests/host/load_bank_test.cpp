@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData: banks, program by program or as one chunk.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData: programs with a chunk.
 #include <string>
 

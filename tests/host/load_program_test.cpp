@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData: programs, and what goes to the plug-in for them.
 #include <cstdint>
 #include <string>

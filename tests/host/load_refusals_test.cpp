@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData: what is refused, what just passes, and that a refusal changes nothing.
 #include <cstdint>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData: parameter values of every kind of bits.
 #include <cstdint>
 #include <cstring>

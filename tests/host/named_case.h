@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Names for the rows of a table of tests.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::lock: held while the instance's getParameter and setParameter run, free again afterwards
 // whatever happens.
 #include "tests/host/wrapper_fixture.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: names, units, values as text and properties of parameters.
 #include <climits>
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::getParameter and setParameter: what the instance's own two functions are asked.
 #include <climits>
 #include <cmath>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Preset and bank data, written by hand.
 #include "tests/host/preset_bytes.h"
 

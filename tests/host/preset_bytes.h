@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Preset and bank data as a test writes it down: byte by byte, from texts and numbers in reading order.
 //
 // Nothing here uses the program's own offsets or swaps.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The fixture of the preset tests, and the conversations that they are made of.
 #include "tests/host/preset_fixture.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A wrapper around the recording instance, for tests that save and load its state.
 //
 //   open();

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The fields of preset and bank data: byte order, texts, what a form magic says.
 #include <cstdint>
 #include <cstring>

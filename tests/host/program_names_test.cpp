@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::getCurrentProgramName and getProgramName, and the names that they store and find.
 #include <climits>
 #include <string>

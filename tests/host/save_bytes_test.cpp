@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::saveToFXBData: the exact bytes of the four forms.
 #include <cstdint>
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::saveToFXBData: what the plug-in is asked, in which order, and that it ends as it was.
 #include <string>
 

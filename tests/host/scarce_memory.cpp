@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The doors that memory comes through, with a limit.
 #include "tests/host/scarce_memory.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Makes memory scarce: while a ScarceMemory lives, no block above its limit can be had.
 //
 // malloc answers null and operator new throws std::bad_alloc, whatever the machine has and whichever

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The child of a shell that is wanted: what plug-ins are told while VSTWrapper::New runs, and afterwards.
 #include <climits>
 #include <vector>

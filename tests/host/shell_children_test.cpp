@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::getNextShellPlugin: the children that a shell offers.
 #include <climits>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::updateStoredProgramNames: the walk through all programs, and the way back.
 #include <algorithm>
 #include <climits>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::createTempParameterStore and restoreFromTempParameterStore: bytes and conversation.
 #include <climits>
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: answers of more than 32 bits. Built where VstIntPtr has 64.
 //
 // Answers that the interface calls 32-bit numbers lose their upper half; answers that mean yes or no are

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::New: what a new instance is asked, and what the wrapper is like afterwards.
 #include <climits>
 #include <cstdint>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // ~VSTWrapper: switching off, closing, and what the plug-in throws meanwhile.
 #include <cstdint>
 #include <memory>

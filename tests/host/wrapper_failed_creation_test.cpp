@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::New where the plug-in gives no instance: null, nothing thrown, nothing left over.
 #include <stdexcept>
 

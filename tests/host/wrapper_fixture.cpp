@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The fixture of the wrapper tests.
 #include "tests/host/wrapper_fixture.h"
 

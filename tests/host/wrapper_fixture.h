@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A wrapper around the recording instance, for tests of its conversation with the plug-in.
 //
 //   effect.setParameters({0.25f});

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: the names of plug-in and maker.
 #include <string>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // All operations of the wrapper that ask the plug-in through its dispatcher, one row each: what the plug-in
 // throws passes to the caller, and no lock is held.
 #include <cstring>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper: category, rates, speaker arrangements and pins.
 #include <climits>
 #include <cstring>

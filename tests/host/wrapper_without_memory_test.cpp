@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // VSTWrapper::New where memory runs out: each of its allocations fails once, and that of every double on its
 // way.
 #include <memory>

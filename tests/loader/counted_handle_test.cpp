@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Counted handles: when a reference is taken, when one is given back, and in which order.
 #include <cstdint>
 #include <functional>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 #include "tests/loader/identity_samples.h"
 
 namespace {

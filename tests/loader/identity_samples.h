@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The four identity records as the tests of their stream form drive them: one old, one new, and the fields of
 // any as texts.
 #pragma once

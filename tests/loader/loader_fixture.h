@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the tests of the module loader start from: a recorded CoreFoundation and an empty cache.
 #pragma once
 

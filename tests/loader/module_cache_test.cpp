@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The cache of loaded modules: what is shared, what is loaded anew, and who holds which reference.
 #include <string>
 #include <vector>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Loading a bundle, call by call: what is asked of CoreFoundation, what is released, what each failure
 // leaves.
 #include <optional>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The stream form of the four identity records: order of values, and what stands after a failure at every
 // single operation.
 #include <algorithm>

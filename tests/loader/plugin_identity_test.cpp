@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The records that name a plug-in: how they are made and copied, their order, their names.
 #include <climits>
 #include <cstddef>

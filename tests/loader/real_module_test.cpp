@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The loader on real shared objects and the system's own bundle service.
 #include <cstdio>
 #include <fstream>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A set kept as a sorted vector.
 #include <cstddef>
 #include <functional>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The table of operations that every stream implements.
 #include <type_traits>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Where a virtual operation stands in its class's table.
 #pragma once
 

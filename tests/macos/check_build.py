@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Compiles the program for macOS with each of its three targets and links it where there is a linker.
 
 The sources are those of CMake's own build for macOS (preset mac_check). Each check has controls: a fault is put in,

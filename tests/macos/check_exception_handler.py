@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Runs the Objective-C++ source of macOS on GNUstep, with a double of macOS's exception handler.
 
 First the guard alone, whose double tells each thing that is done to it; then the whole program on a plug-in that

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """What the checks of the macOS sources share: running commands and one line of result for each check."""
 
 import os

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 # Builds the program for macOS on a machine that is none, to check its sources: clang, libc++'s headers, the C
 # library's headers of this machine, and stubs of our own in place of an SDK. What comes out of it never runs.
 #

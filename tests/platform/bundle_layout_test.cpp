@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Which file of a bundle is loaded, on folders made for each test.
 #include <filesystem>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // CFBundle on real shared objects: what loads, what is found in it, and the line that each refusal leaves.
 #include <cstring>
 #include <filesystem>

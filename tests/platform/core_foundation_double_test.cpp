@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A program may define CoreFoundation by itself. This one does, on counters, and links the library as well:
 // it would not link if the library's own functions came along.
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Strings, counts, URLs and the current locale.
 #include <filesystem>
 #include <limits>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Architectures in ELF headers, byte by byte.
 #include <optional>
 #include <string>

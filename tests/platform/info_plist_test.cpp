@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What an Info.plist calls its executable, friendly and hostile documents alike.
 #include <optional>
 #include <string>

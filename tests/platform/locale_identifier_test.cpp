@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The locale rule as a table.
 #include <gtest/gtest.h>
 

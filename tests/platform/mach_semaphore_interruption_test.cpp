@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Semaphores whose waiters are interrupted by a signal handler, or lose their semaphore.
 #include <atomic>
 #include <chrono>

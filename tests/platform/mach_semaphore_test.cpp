@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Semaphores: results, order of arrival, hand-over. Interruption and destruction have files of their own.
 #include <cstdlib>
 #include <memory>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Threads under observation, by what /proc says of them.
 #include "tests/platform/observed_thread.h"
 

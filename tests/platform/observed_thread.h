@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A thread that runs one body, and can be seen asleep on a futex and be interrupted there.
 //
 // Sleeping for a while in a test proves nothing about who waits; asking the kernel does.

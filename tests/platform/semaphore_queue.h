@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A semaphore with threads that queue up for it one after the other.
 #pragma once
 

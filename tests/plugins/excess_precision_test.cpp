@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The sample with the wide answers gives them: without that, the test of the host proves nothing.
 #include <cstring>
 

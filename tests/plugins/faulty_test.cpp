@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Each fault of the faulty sample ends or disturbs its process as its name says, at the place asked for.
 #include <ostream>
 

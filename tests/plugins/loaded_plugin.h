@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // One sample plug-in, loaded and driven by hand: the smallest host there is.
 #pragma once
 

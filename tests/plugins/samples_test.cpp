@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Each sample does its one thing, in a host that is a process of its own.
 #include <fstream>
 #include <iterator>

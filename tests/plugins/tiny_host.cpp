@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The smallest host that is a program: loads one module, drives one instance, says how far it got.
 //
 //   tiny_host MODULE [ENTRY [CHILD]]     ENTRY is VSTPluginMain when not given, CHILD what

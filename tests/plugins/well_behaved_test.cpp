@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The well-behaved samples answer as a good plug-in does.
 #include <cstring>
 #include <vector>

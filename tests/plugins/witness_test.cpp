@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the recording sample makes of a pointer, and the shell's list of children.
 #include <cstdlib>
 

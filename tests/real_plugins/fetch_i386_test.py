@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Tests of fetch_i386: what the archive lacks is told, and keeps nothing else away.
 
 Two shell scripts stand in for apt-get and dpkg.

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Gives the program a real plug-in of the other architecture and demands the failure that a host can read.
 
     other_architecture.py --program PROGRAM --architecture i386 --other x86_64 FOLDER...

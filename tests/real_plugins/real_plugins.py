@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Runs vsttorture over every plug-in of some Debian packages and demands the end that expectations.tsv names.
 
     real_plugins.py --program build/release/vsttorture [--jobs 2] [--table] [--required] [PACKAGE...]

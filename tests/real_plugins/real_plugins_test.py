@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Tests of real_plugins: no deviation goes unnoticed, and a run sees a world of its own."""
 import contextlib
 import io

@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """How one run of vsttorture ended, in a few words, told from what it printed and its exit status.
 
 A run that went through is "passes"; any other end names the last step that was printed, what followed it,

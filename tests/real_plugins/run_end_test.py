@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: MIT
 """Tests of run_end: each way in which a run can differ from a pass shows in its words."""
 import unittest
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The addition under the lock's counter.
 #include <cstdint>
 #include <thread>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The owned block of bytes, down to each malloc and free.
 #include <cstdlib>
 #include <cstring>

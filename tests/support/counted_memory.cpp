@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // No container is used while memory is recorded: its own memory would come out of what is recorded.
 #include "tests/support/counted_memory.h"
 

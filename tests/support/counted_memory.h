@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The malloc and free of a test program, as the linker hands them over (--wrap): they record what passes
 // through and fail as told.
 //

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Byte order.
 #include <string>
 #include <vector>

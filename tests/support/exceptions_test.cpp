@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The two things that are thrown, and the checks that throw them.
 #include <algorithm>
 #include <cstddef>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What the semaphore and the lock ask of the kernel, call by call.
 #include <thread>
 

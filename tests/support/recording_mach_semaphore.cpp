@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The stand-in takes the place of the system's functions at link time.
 #include "tests/support/recording_mach_semaphore.h"
 

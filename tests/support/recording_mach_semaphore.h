@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A stand-in for the kernel's semaphores that never sleeps: it records the calls and answers as told.
 #pragma once
 

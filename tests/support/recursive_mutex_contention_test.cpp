@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The recursive lock under many threads.
 #include <memory>
 #include <thread>

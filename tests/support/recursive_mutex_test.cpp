@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The recursive lock, one or two threads at a time.
 #include <functional>
 #include <thread>

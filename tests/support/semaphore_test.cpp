@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The semaphore, on the system's.
 #include <type_traits>
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A text with three integers.
 #include <cstring>
 #include <string>

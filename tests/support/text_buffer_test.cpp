@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The fixed text buffers.
 #include <cstring>
 #include <string>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Identities of threads.
 #include <thread>
 

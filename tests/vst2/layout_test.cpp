@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Offsets, sizes and numbers of the plug-in interface, as literals: a plug-in was compiled against these.
 #include "gtest/gtest.h"
 #include "tests/vst2/record_layout.h"

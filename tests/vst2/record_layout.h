@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Where the fields of the plug-in interface's records lie, as literals: a plug-in was compiled against these.
 //
 // Constant expressions throughout, so that a compiler alone can check them, also for systems whose programs

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Compiles where every field of the plug-in interface's records lies in its place; nothing of it is run.
 // Used by check_build.py, which compiles it for macOS.
 #include "tests/vst2/record_layout.h"

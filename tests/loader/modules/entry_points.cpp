@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A module that exports the entry points that its build asks for; each answers a number of its own. For the
 // tests of VSTPluginLoader on real modules.
 extern "C" {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A double of macOS's exception handler, which GNUstep lacks: it tells on standard error what the program
 // does to it, and passes every exception that is raised on to its delegate, as macOS does.
 //

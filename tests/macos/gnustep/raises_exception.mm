@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // An effect that raises an exception of Foundation when it is asked for its vendor.
 // Used by check_exception_handler.py: the exception reaches the exception handler's delegate.
 #import <Foundation/Foundation.h>

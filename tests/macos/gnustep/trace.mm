@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Makes the program's guard and lets it go again, as main() does, and tells on standard error what happens in
 // between: what the delegate is, what it answers, when the pool is drained.
 #include <cstdio>

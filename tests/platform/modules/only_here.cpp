@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A small module that needs a library of its own. For the tests of CFBundle: what is found in it, and whether
 // it was unloaded.
 extern "C" {

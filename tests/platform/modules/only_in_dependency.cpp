@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The library that the module only_here needs. For the tests of CFBundleGetFunctionPointerForName.
 extern "C" int onlyInDependency();
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // A module whose static constructor throws the int 42. The exception must reach the caller of
 // CFBundleLoadExecutable.
 namespace {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What this program uses of macOS's CoreFoundation, declared from general knowledge, to compile the macOS
 // sources on another system. A test, not a header to build with: it holds nothing else.
 #pragma once

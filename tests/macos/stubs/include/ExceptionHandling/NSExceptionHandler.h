@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // macOS's handler of exceptions, as far as this program and its test double use it, declared from general
 // knowledge. The bits of the mask are those that the delegate is told.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What this program uses of macOS's Foundation, declared from general knowledge, to compile the Objective-C++
 // source on another system. The run on GNUstep takes that system's own Foundation instead.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The atomic addition of macOS, declared from general knowledge; old, unless the including source says that
 // it knows.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // What this program uses of the Mach kernel's services, declared from general knowledge: ports are numbers.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Waiting on and signalling a semaphore of the Mach kernel.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // The order in which threads that wait on a Mach semaphore are served.
 #pragma once
 

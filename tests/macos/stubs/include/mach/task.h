@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: MIT
 // Semaphores as property of a task of the Mach kernel.
 #pragma once
 
