@@ -30,8 +30,7 @@ class KelVSTSupportEffect;
 
 class VSTWrapper {
  public:
-  // ---- Lifecycle
-  // -------------------------------------------------------------------------------------------
+  // ---- Lifecycle ------------------------------------------------------------------------------------------
 
   /// Creates and opens an instance of `child` in `module`: 44100 Hz, blocks of 512 frames, program 0, all
   /// pins connected, switched off. The caller owns it and deletes it to close the instance. Null when there
@@ -46,8 +45,7 @@ class VSTWrapper {
   VSTWrapper(const VSTWrapper&) = delete;
   VSTWrapper& operator=(const VSTWrapper&) = delete;
 
-  // ---- Host callback
-  // ---------------------------------------------------------------------------------------
+  // ---- Host callback --------------------------------------------------------------------------------------
 
   /// What every plug-in calls to reach this host (an audioMasterCallback). Opcodes: VstHostOpcode, and 'NIDU'
   /// for the vendor's own service. Answers 0 to what it does not know.
@@ -57,8 +55,7 @@ class VSTWrapper {
   /// The function that the vendor's service hands out: the track's sample position, always 0.0.
   static double trackSamplePosThunk(AEffect* effect);
 
-  // ---- Basic queries and settings
-  // --------------------------------------------------------------------------
+  // ---- Basic queries and settings -------------------------------------------------------------------------
 
   /// The plug-in's category (effGetPlugCategory, 35), a VstPlugCategory value.
   VstInt32 getEffectCategory() const;
@@ -91,8 +88,7 @@ class VSTWrapper {
   /// False when there is none left.
   bool getNextShellPlugin(VST_ChildSpec& child);
 
-  // ---- Parameters
-  // ------------------------------------------------------------------------------------------
+  // ---- Parameters -----------------------------------------------------------------------------------------
 
   /// A parameter's value, through the instance's own function and under the lock. 0.0 for an index outside 0
   /// to numParams - 1 (nothing is asked), and when the plug-in throws.
@@ -119,8 +115,7 @@ class VSTWrapper {
   /// the record before.
   bool getParameterProps(int index, VstParameterProperties& props);
 
-  // ---- Programs
-  // --------------------------------------------------------------------------------------------
+  // ---- Programs -------------------------------------------------------------------------------------------
 
   /// Selects a program (effSetProgram, 2), clamped to 0 to numPrograms - 1. Sends nothing when `index` is the
   /// current program already, or when there are no programs.
@@ -151,8 +146,7 @@ class VSTWrapper {
   /// On purpose: a store of another number of parameters is not refused.
   void restoreFromTempParameterStore(const AutoBuffer<char>& store);
 
-  // ---- Preset and bank data
-  // --------------------------------------------------------------------------------
+  // ---- Preset and bank data -------------------------------------------------------------------------------
 
   /// Writes the state into `out` in the layout of fxp (one program) or fxb (bank) data, as a chunk where the
   /// plug-in has effFlagsProgramChunks, else as parameter values. Always true.
@@ -183,8 +177,7 @@ class VSTWrapper {
   /// The plug-in identifier in preset or bank data. Reads the first 20 bytes.
   static VstInt32 getEffectIDFromPresetData(const char* data);
 
-  // ---- State
-  // -----------------------------------------------------------------------------------------------
+  // ---- State ----------------------------------------------------------------------------------------------
 
   NiduCOM::i_ptr<VSTPluginLoader> loader;
   VST_ChildSpec childSpec;             ///< Which plug-in of the module this is.
