@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: MIT
-"""Holds the cost of vsttorture against the bare C host of bench/floor, whole processes in pairs.
+"""Holds the cost of vsttorture against the bare C host of bench/bare_host, whole processes in pairs.
 
     cmake --preset bench && cmake --build --preset bench
     bench/whole_process.py [--build build/bench] [--pairs FACTOR] [CASE ...]
@@ -9,7 +9,7 @@ Cases: light, null, real, linear, instructions; without any, all of them. Needs 
 the Debian packages time (peak memory) and valgrind (instructions); real plug-ins come from amsynth and
 zynaddsubfx-vst.
 
-A pair is a run of the program and then one of the floor, which repeats the random tests that the program drew:
+A pair is a run of the program and then one of the bare host, which repeats the random tests that the program drew:
 both print the same lines, which is checked. Ratios are taken within a pair; the median of all pairs is printed,
 with the quartiles. CPU time is user and system time, which other work on the machine disturbs less.
 """
@@ -31,7 +31,7 @@ LARGE = {"NULL_PLUGIN_PARAMETERS": "10000", "NULL_PLUGIN_PROGRAMS": "1000"}
 class Bench:
     def __init__(self, build, factor, folder):
         self.tool = os.path.join(build, "vsttorture")
-        self.floor = os.path.join(build, "bench", "floor")
+        self.bare_host = os.path.join(build, "bench", "bare_host")
         self.plugins = os.path.join(build, "plugins")
         self.factor = factor
         self.lines = os.path.join(folder, "lines")
@@ -58,17 +58,17 @@ class Bench:
 
     def pair(self, plugin, extra=None):
         tool = self.run([self.tool, plugin], self.lines, extra)
-        floor = self.run([self.floor, self.lines, plugin], self.replayed, extra)
-        if tool.lines != floor.lines:
+        bare_host = self.run([self.bare_host, self.lines, plugin], self.replayed, extra)
+        if tool.lines != bare_host.lines:
             sys.exit(f"{plugin}: the two runs printed different lines")
-        return tool, floor
+        return tool, bare_host
 
     def compare(self, name, plugin, pairs, extra=None):
         pairs = max(3, int(pairs * self.factor))
         self.pair(plugin, extra)  # Warms the caches.
         measured = [self.pair(plugin, extra) for _ in range(pairs)]
         for what in ("wall", "cpu"):
-            ratios = [getattr(tool, what) / getattr(floor, what) for tool, floor in measured]
+            ratios = [getattr(tool, what) / getattr(bare_host, what) for tool, bare_host in measured]
             low, middle, high = statistics.quantiles(ratios, n=4)
             times = [statistics.median(getattr(cost, what) for cost in side) for side in zip(*measured)]
             print(f"{name:24} {what:4} ratio {middle:5.3f} ({low:5.3f} to {high:5.3f}), "
@@ -84,8 +84,8 @@ class Bench:
     def compare_memory(self, name, plugin, runs=15):
         self.run([self.tool, plugin], self.lines)
         tool = statistics.median(self.peak_memory([self.tool, plugin]) for _ in range(runs))
-        floor = statistics.median(self.peak_memory([self.floor, self.lines, plugin]) for _ in range(runs))
-        print(f"{name:24} peak {tool:.0f} KiB against {floor:.0f} KiB, {tool - floor:+.0f} KiB, median of {runs}",
+        bare_host = statistics.median(self.peak_memory([self.bare_host, self.lines, plugin]) for _ in range(runs))
+        print(f"{name:24} peak {tool:.0f} KiB against {bare_host:.0f} KiB, {tool - bare_host:+.0f} KiB, median of {runs}",
               flush=True)
 
 
@@ -138,19 +138,19 @@ def instructions_by_object(bench, command, extra):
 
 
 def instructions(bench):
-    """Where the instructions of a run are spent, on a small null plug-in, in the program and in the floor."""
+    """Where the instructions of a run are spent, on a small null plug-in, in the program and in the bare host."""
     extra = {"NULL_PLUGIN_PARAMETERS": "2000", "NULL_PLUGIN_PROGRAMS": "100"}
     plugin = bench.sample("null_plugin")
     bench.run([bench.tool, plugin], bench.lines, extra)
     # Under valgrind the program draws anew, so its own lines are replayed.
     tool = instructions_by_object(bench, [bench.tool, plugin], extra)
     os.replace(bench.replayed, bench.lines)
-    floor = instructions_by_object(bench, [bench.floor, bench.lines, plugin], extra)
-    for name, counts in (("vsttorture", tool), ("floor", floor)):
+    bare_host = instructions_by_object(bench, [bench.bare_host, bench.lines, plugin], extra)
+    for name, counts in (("vsttorture", tool), ("bare_host", bare_host)):
         total = sum(counts.values())
         shares = ", ".join(f"{key} {count / total:.1%}" for key, count in counts.most_common(5))
         print(f"{name:12} {total:12,} instructions: {shares}")
-    print(f"ratio {sum(tool.values()) / sum(floor.values()):.2f}", flush=True)
+    print(f"ratio {sum(tool.values()) / sum(bare_host.values()):.2f}", flush=True)
 
 
 CASES = {case.__name__: case for case in (light, null, real, linear, instructions)}

@@ -4,7 +4,7 @@
 #include <functional>
 
 #include "host/vst_wrapper.h"
-#include "loader/sorted_vector_set.h"
+#include "support/sorted_vector_set.h"
 #include "vst2/dispatch.h"
 
 namespace KelVSTInfoCache {

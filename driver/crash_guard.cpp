@@ -4,8 +4,8 @@
 #include <csignal>
 #include <cstdlib>
 
+#include "driver/crash_exit.h"
 #include "driver/safety_nets.h"
-#include "driver/way_out.h"
 #include "platform/exception_handler.h"
 
 namespace {
@@ -18,12 +18,12 @@ void makeHandlerSafe(int signal) {
   struct sigaction action = {};
   if (sigaction(signal, nullptr, &action) != 0) return;
   action.sa_flags |= SA_ONSTACK;
-  if (isSpread(SafetyNet::kSecondSignal)) action.sa_flags |= SA_NODEFER;
+  if (isEnabled(SafetyNet::kSecondSignal)) action.sa_flags |= SA_NODEFER;
   sigaction(signal, &action, nullptr);
 }
 
 void installSignalGuard() {
-  prepareSignalStack();
+  installSignalStack();
   for (const int signal : kGuardedSignals) {
     std::signal(signal, signal_callback_handler);
     makeHandlerSafe(signal);
@@ -32,12 +32,12 @@ void installSignalGuard() {
 
 }  // namespace
 
-void signal_callback_handler(int) { leaveAfterCrash(); }
+void signal_callback_handler(int) { exitAfterCrash(); }
 
 CPPAutoReleasePool::CPPAutoReleasePool(int crashCode) {
   gCrashCode = crashCode;
   pool = makeAutoreleasePool();
-  delegate = makeExceptionDelegate({installSignalGuard, leaveAfterCrash});
+  delegate = makeExceptionDelegate({installSignalGuard, exitAfterCrash});
 }
 
 CPPAutoReleasePool::~CPPAutoReleasePool() {
@@ -46,8 +46,7 @@ CPPAutoReleasePool::~CPPAutoReleasePool() {
 }
 
 __attribute__((no_sanitize("undefined"))) void crashOnPurpose() {
-  // Both the pointer and what it points to are volatile: the optimiser removes any other store to address
-  // zero.
+  // Both the pointer and what it points to are volatile: the optimiser removes any other store to address 0.
   volatile int* volatile nowhere = nullptr;
   *nowhere = 0;  // NOLINT(clang-analyzer-core.NullDereference): that is the point
   std::abort();

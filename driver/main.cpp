@@ -5,18 +5,20 @@
 #include <string>
 
 #include "driver/blacklist.h"
+#include "driver/crash_exit.h"
 #include "driver/crash_guard.h"
 #include "driver/exit_status.h"
+#include "driver/last_words.h"
 #include "driver/report.h"
-#include "driver/torture_test.h"
-#include "driver/way_out.h"
+#include "driver/torture_run.h"
 
 namespace {
 
-/// The child that the second argument names. A text that is no number counts as 0, given.
+/// The child that the second argument selects. Text that is not a number selects child 0; hasChildID is still
+/// true.
 VST_loadID childNamed(const char* argument) {
   int id = 0;
-  // NOLINTNEXTLINE(cert-err34-c): whatever does not scan leaves 0, which is what is wanted.
+  // NOLINTNEXTLINE(cert-err34-c): text that is not a number leaves `id` at 0, as wanted
   static_cast<void>(std::sscanf(argument, "%d", &id));
   return {true, id};
 }

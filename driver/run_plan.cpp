@@ -5,9 +5,9 @@
 #include <ctime>
 
 #include "describe/vst_info.h"
+#include "driver/catalogue.h"
+#include "driver/instance.h"
 #include "driver/report.h"
-#include "driver/test_catalogue.h"
-#include "driver/torture_test.h"
 
 namespace {
 

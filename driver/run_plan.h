@@ -6,9 +6,9 @@
 #include <memory>
 
 #include "host/vst_wrapper.h"
-#include "loader/counted_handle.h"
 #include "loader/module_loader.h"
 #include "loader/plugin_identity.h"
+#include "support/counted_handle.h"
 
 /// The full plan: description, every test forwards and backwards, re-creation, description, fifty tests at
 /// random. `wrapper` holds the re-created instance afterwards. Catches nothing.

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
-// The safety nets around the way out, by name.
+// The safety nets around the exit after a crash, by name.
 //
-// The program spreads all of them. A test builds it without one at a time (VSTTORTURE_WITHOUT=kTimer) and
-// shows what a host would see then.
+// The program has all of them. A test builds it without one at a time (VSTTORTURE_WITHOUT=kTimer) and shows
+// what a host would see then.
 #pragma once
 
 #ifndef VSTTORTURE_WITHOUT
@@ -11,14 +11,14 @@
 
 enum class SafetyNet {
   kNone,
-  kSignalStack,      ///< The main thread's handlers have a stack of their own.
-  kEndAtOnce,        ///< A second signal on the way out ends the process at once.
-  kSecondSignal,     ///< It can arrive at all: nothing stays blocked on the way out.
-  kTimer,            ///< The way out takes a second at most.
+  kSignalStack,      ///< Signal handlers of the main thread have a stack of their own.
+  kExitNow,          ///< A second signal during the exit ends the process at once.
+  kSecondSignal,     ///< No signal of ours stays blocked during the exit, so that a second one can arrive.
+  kTimer,            ///< The exit takes a second at most.
   kClosedReport,     ///< No other thread prints a line any more.
-  kDirectLastWords,  ///< The last words get past standard output's lock.
-  kOwnProcess,       ///< A process that the plug-in has forked says nothing.
+  kDirectLastWords,  ///< "unexpected exit" is printed even when stdout's lock is held.
+  kOwnProcess,       ///< A process that the plug-in has forked prints nothing.
 };
 
-/// False in the one variant that lacks the net.
-constexpr bool isSpread(SafetyNet net) { return net != SafetyNet::VSTTORTURE_WITHOUT; }
+/// False in the one variant of the program that is built without the net.
+constexpr bool isEnabled(SafetyNet net) { return net != SafetyNet::VSTTORTURE_WITHOUT; }

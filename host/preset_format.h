@@ -10,24 +10,7 @@
 #include <string>
 
 #include "support/endian.h"
-#include "vst2/basic_types.h"
-
-/// Offsets in bytes from the start of a program, a bank or both.
-enum PresetOffset : std::size_t {
-  kChunkMagicAt = 0,
-  kByteSizeAt = 4,
-  kFormMagicAt = 8,
-  kFormatVersionAt = 12,
-  kPluginIdAt = 16,
-  kPluginVersionAt = 20,
-  kCountAt = 24,
-  kProgramNameAt = 28,
-  kProgramContentAt = 56,
-  kBankContentAt = 156,
-};
-
-/// Room for the name in a program, its terminating zero byte included.
-constexpr std::size_t kProgramNameSize = 28;
+#include "vst2/preset_data.h"
 
 /// Reverses the four bytes of a value.
 inline VstInt32 vst_swap(VstInt32 value) {

@@ -16,10 +16,10 @@
 #include <string>
 #include <vector>
 
-#include "loader/counted_handle.h"
 #include "loader/module_loader.h"
 #include "loader/plugin_identity.h"
 #include "support/auto_buffer.h"
+#include "support/counted_handle.h"
 #include "support/recursive_mutex.h"
 #include "vst2/aeffect.h"
 #include "vst2/preset_data.h"

@@ -7,10 +7,10 @@
 #include <cstring>
 #include <limits>
 
-#include "host/data_sizes.h"
 #include "host/locked_values.h"
 #include "host/preset_format.h"
 #include "host/vst_wrapper.h"
+#include "support/data_sizes.h"
 #include "vst2/dispatch.h"
 
 namespace {

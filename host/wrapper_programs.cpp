@@ -6,9 +6,9 @@
 #include <algorithm>
 #include <cstring>
 
-#include "host/data_sizes.h"
 #include "host/locked_values.h"
 #include "host/vst_wrapper.h"
+#include "support/data_sizes.h"
 #include "support/text_buffer.h"
 #include "vst2/dispatch.h"
 

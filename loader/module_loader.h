@@ -12,10 +12,10 @@
 
 #include <cstdint>
 
-#include "loader/counted_handle.h"
 #include "loader/plugin_identity.h"
-#include "loader/sorted_vector_set.h"
 #include "platform/core_foundation.h"
+#include "support/counted_handle.h"
+#include "support/sorted_vector_set.h"
 
 class VSTPluginLoader;
 

@@ -13,7 +13,7 @@
 /// What the delegate does at two points of its life.
 struct ExceptionDelegateActions {
   void (*installSignalGuard)();  ///< At the end of its init.
-  void (*leaveProcess)();        ///< When it is asked to handle an exception. Does not return.
+  void (*exitProcess)();         ///< When it is asked to handle an exception. Does not return.
 };
 
 struct AutoreleasePool;

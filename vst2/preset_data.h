@@ -20,6 +20,23 @@ constexpr VstInt32 kReversedParameterBankMagic = fourCharacterCode('k', 'B', 'x'
 constexpr VstInt32 kReversedChunkProgramMagic = fourCharacterCode('h', 'C', 'P', 'F');
 constexpr VstInt32 kReversedChunkBankMagic = fourCharacterCode('h', 'C', 'B', 'F');
 
+/// Offsets in bytes from the start of a program, a bank or both.
+enum PresetOffset : std::size_t {
+  kChunkMagicAt = 0,
+  kByteSizeAt = 4,
+  kFormMagicAt = 8,
+  kFormatVersionAt = 12,
+  kPluginIdAt = 16,
+  kPluginVersionAt = 20,
+  kCountAt = 24,
+  kProgramNameAt = 28,
+  kProgramContentAt = 56,
+  kBankContentAt = 156,
+};
+
+/// Room for the name in a program, its terminating zero byte included.
+constexpr std::size_t kProgramNameSize = 28;
+
 /// One program (preset). Parameter values, or the size of a chunk and the chunk, follow at byte 56.
 struct fxProgram {
   VstInt32 chunkMagic;  ///< 'CcnK'

@@ -4,7 +4,7 @@
 #include <stdint.h>
 #include <stdlib.h>
 
-#include "bench/floor/interface.h"
+#include "bench/bare_host/interface.h"
 
 static intptr_t answerNothing(AEffect* effect, int32_t opcode, int32_t index, intptr_t value, void* ptr,
                               float opt) {

@@ -37,12 +37,12 @@ class nidu_VST_Support_ExceptionHandlerDelegate {
   [[nodiscard]] bool shouldDisplayException() const { return false; }
   [[nodiscard]] bool shouldLogException(const SystemException&, unsigned) const { return true; }
   bool shouldHandleException(const SystemException&, unsigned) const {
-    leaveProcess();
+    exitProcess();
     return true;
   }
 
  private:
-  void (*leaveProcess)() = nullptr;
+  void (*exitProcess)() = nullptr;
 };
 
 struct ExceptionDelegate : nidu_VST_Support_ExceptionHandlerDelegate {};
@@ -98,7 +98,7 @@ void ExceptionHandler::raise(const SystemException& exception) const {
 }  // namespace
 
 void nidu_VST_Support_ExceptionHandlerDelegate::init(const ExceptionDelegateActions& actions) {
-  leaveProcess = actions.leaveProcess;
+  exitProcess = actions.exitProcess;
   defaultExceptionHandler.setDelegate(this);
   defaultExceptionHandler.setExceptionHandlingMask(kAllExceptionsMask);
   actions.installSignalGuard();

@@ -51,7 +51,7 @@ ExceptionDelegateActions delegateActions;
   (void)sender;
   (void)exception;
   (void)mask;
-  delegateActions.leaveProcess();
+  delegateActions.exitProcess();
   return YES;
 }
 

@@ -39,7 +39,7 @@ void overflowTheStack();
 void freeTwice();
 void writeBehindABlock();
 
-// Crashes that leave something locked which the way out of a process may need.
+// Crashes that leave something locked which exit() may need.
 void crashWithHeapLock();
 void crashWithStdoutLock();
 void crashWithOwnStdoutLock();

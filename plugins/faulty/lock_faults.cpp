@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Crashes that leave something locked which the way out of a process may need.
+// Crashes that leave something locked which exit() may need.
 #include <cstdint>
 #include <cstdio>
 #include <cstdlib>

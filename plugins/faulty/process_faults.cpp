@@ -26,7 +26,7 @@ void throwOnAThread() {
 
 void overflowTheStackOfAThread() { std::thread(overflowTheStack).join(); }
 
-/// One second is what the way out of a process may take.
+/// The exit after a crash may take one second.
 void crashOnAThreadBehindTheRun() {
   static std::promise<void> leaving;
   std::atexit([] {

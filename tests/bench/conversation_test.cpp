@@ -7,8 +7,8 @@
 
 #include <gmock/gmock.h>
 
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/temporary_directory.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/temporary_directory.h"
 
 using testing::Contains;
 using testing::HasSubstr;
@@ -32,9 +32,9 @@ class FloorConversation : public testing::Test {
  protected:
   Recording recordProgram() { return record(runTool, {samplePlugin("records_requests")}); }
 
-  /// The floor, with the random tests that the program drew in `run`.
+  /// The bare host, with the random tests that the program drew in `run`.
   Recording recordFloor(const ProgramRun& run) {
-    return record(runFloor, {keepLines(run), samplePlugin("records_requests")});
+    return record(runBareHost, {keepLines(run), samplePlugin("records_requests")});
   }
 
   std::string keepLines(const ProgramRun& run) {
@@ -44,7 +44,7 @@ class FloorConversation : public testing::Test {
   }
 
   static ProgramRun runTool(const ProgramCall& call) { return runVstTorture(call); }
-  static ProgramRun runFloor(const ProgramCall& call) { return runProgram(FLOOR, call); }
+  static ProgramRun runBareHost(const ProgramCall& call) { return runProgram(BARE_HOST, call); }
 
   std::map<std::string, std::string> environment;
 
@@ -64,13 +64,13 @@ class FloorConversation : public testing::Test {
 };
 
 /// One request that only the state in question leads to, so that an empty recording proves nothing.
-void expectSameConversation(const Recording& program, const Recording& floor, const std::string& mark) {
+void expectSameConversation(const Recording& program, const Recording& bareHost, const std::string& mark) {
   EXPECT_EQ(program.run.end, "exit status 0");
-  EXPECT_EQ(floor.run.end, "exit status 0");
-  EXPECT_EQ(floor.run.standardError, "");
-  EXPECT_EQ(lines(floor.run.standardOutput), lines(program.run.standardOutput));
+  EXPECT_EQ(bareHost.run.end, "exit status 0");
+  EXPECT_EQ(bareHost.run.standardError, "");
+  EXPECT_EQ(lines(bareHost.run.standardOutput), lines(program.run.standardOutput));
   EXPECT_THAT(lines(program.conversation), Contains(HasSubstr(mark)));
-  EXPECT_EQ(lines(floor.conversation), lines(program.conversation));
+  EXPECT_EQ(lines(bareHost.conversation), lines(program.conversation));
 }
 
 TEST_F(FloorConversation, IsTheProgramsWhereTheStateIsParameterValues) {
@@ -93,27 +93,27 @@ TEST_F(FloorConversation, IsTheProgramsWhereProgramsHaveNoNameByIndex) {
 
 TEST_F(FloorConversation, OfAShellEndsAfterItsDescription) {
   const ProgramRun program = runVstTorture({samplePlugin("shell")});
-  const ProgramRun floor = runFloor({{keepLines(program), samplePlugin("shell")}});
-  EXPECT_EQ(floor.end, "exit status 1");
-  EXPECT_EQ(floor.standardOutput, "total, 51\n1, test gathering info\n");
-  EXPECT_EQ(floor.standardOutput, program.standardOutput);
+  const ProgramRun bareHost = runBareHost({{keepLines(program), samplePlugin("shell")}});
+  EXPECT_EQ(bareHost.end, "exit status 1");
+  EXPECT_EQ(bareHost.standardOutput, "total, 51\n1, test gathering info\n");
+  EXPECT_EQ(bareHost.standardOutput, program.standardOutput);
 }
 
 TEST_F(FloorConversation, OfAShellsChildIsAFullRun) {
   const ProgramRun program = runVstTorture({samplePlugin("shell"), "1234"});
-  const ProgramRun floor = runFloor({{keepLines(program), samplePlugin("shell"), "1234"}});
-  EXPECT_EQ(floor.end, "exit status 0");
-  EXPECT_THAT(floor.standardOutput, StartsWith("total, 64\n"));
-  EXPECT_EQ(floor.standardOutput, program.standardOutput);
+  const ProgramRun bareHost = runBareHost({{keepLines(program), samplePlugin("shell"), "1234"}});
+  EXPECT_EQ(bareHost.end, "exit status 0");
+  EXPECT_THAT(bareHost.standardOutput, StartsWith("total, 64\n"));
+  EXPECT_EQ(bareHost.standardOutput, program.standardOutput);
 }
 
 TEST_F(FloorConversation, IsRefusedWithoutTheLinesOfARunThatPassed) {
   ProgramRun cut;
   cut.standardOutput = "total, 64\n1, test gathering info\n16, inspect latency\n";
-  const ProgramRun floor = runFloor({{keepLines(cut), samplePlugin("well_behaved_effect")}});
-  EXPECT_EQ(floor.end, "exit status 2");
-  EXPECT_THAT(floor.standardError, HasSubstr("is not the output of a run that passed"));
-  EXPECT_EQ(floor.standardOutput, "");
+  const ProgramRun bareHost = runBareHost({{keepLines(cut), samplePlugin("well_behaved_effect")}});
+  EXPECT_EQ(bareHost.end, "exit status 2");
+  EXPECT_THAT(bareHost.standardError, HasSubstr("is not the output of a run that passed"));
+  EXPECT_EQ(bareHost.standardOutput, "");
 }
 
 }  // namespace

@@ -8,7 +8,7 @@
 
 #include "gtest/gtest.h"
 #include "host/vst_wrapper.h"
-#include "tests/doubles/in_process_plugin.h"
+#include "tests/shared/in_process_plugin.h"
 
 class DescribedPlugin : public testing::Test {
  protected:

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "driver/test_catalogue.h"
+#include "driver/catalogue.h"
 #include "gmock/gmock.h"
 #include "tests/driver/torture_fixture.h"
 

@@ -8,6 +8,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "driver/last_words.h"
 #include "driver/report.h"
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"

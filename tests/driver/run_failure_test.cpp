@@ -14,10 +14,10 @@
 
 #include <unistd.h>
 
+#include "driver/crash_exit.h"
 #include "driver/crash_guard.h"
 #include "driver/report.h"
-#include "driver/torture_test.h"
-#include "driver/way_out.h"
+#include "driver/torture_run.h"
 #include "gmock/gmock.h"
 #include "support/exceptions.h"
 #include "tests/driver/torture_fixture.h"

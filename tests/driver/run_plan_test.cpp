@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "driver/run_plan.h"
-#include "driver/torture_test.h"
+#include "driver/torture_run.h"
 #include "gmock/gmock.h"
 #include "tests/driver/torture_fixture.h"
 #include "vst2/host_opcodes.h"

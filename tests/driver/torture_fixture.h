@@ -11,8 +11,8 @@
 #include "driver/report.h"
 #include "gtest/gtest.h"
 #include "host/vst_wrapper.h"
-#include "tests/doubles/in_process_plugin.h"
 #include "tests/driver/scripted_random.h"
+#include "tests/shared/in_process_plugin.h"
 
 using doubles::Request;
 using Requests = std::vector<Request>;

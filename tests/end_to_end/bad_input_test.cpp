@@ -11,10 +11,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/protocol_lines.h"
-#include "tests/end_to_end/sanitizer.h"
-#include "tests/end_to_end/temporary_directory.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/protocol_lines.h"
+#include "tests/shared/sanitizer.h"
+#include "tests/shared/temporary_directory.h"
 
 using testing::AllOf;
 using testing::EndsWith;

@@ -3,8 +3,8 @@
 #include <gmock/gmock.h>
 
 #include "tests/end_to_end/golden_file.h"
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/temporary_directory.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/temporary_directory.h"
 
 using testing::ElementsAre;
 

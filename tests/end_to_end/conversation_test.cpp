@@ -13,8 +13,8 @@
 #include <gmock/gmock.h>
 
 #include "tests/end_to_end/golden_file.h"
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/sanitizer.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/sanitizer.h"
 
 using testing::ElementsAre;
 

@@ -3,9 +3,9 @@
 #include <gmock/gmock.h>
 
 #include "tests/end_to_end/golden_file.h"
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/protocol_lines.h"
-#include "tests/end_to_end/sanitizer.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/protocol_lines.h"
+#include "tests/shared/sanitizer.h"
 
 using testing::SizeIs;
 

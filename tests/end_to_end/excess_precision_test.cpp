@@ -3,7 +3,7 @@
 // written back as the 32-bit float that it is, finds itself in place, and is not sent.
 #include <gmock/gmock.h>
 
-#include "tests/end_to_end/program_run.h"
+#include "tests/shared/program_run.h"
 
 using testing::Contains;
 using testing::Each;

@@ -8,7 +8,7 @@
 #include <fstream>
 #include <iterator>
 
-#include "tests/end_to_end/program_run.h"
+#include "tests/shared/program_run.h"
 
 namespace {
 

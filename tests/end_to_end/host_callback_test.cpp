@@ -3,7 +3,7 @@
 #include <gmock/gmock.h>
 
 #include "tests/end_to_end/golden_file.h"
-#include "tests/end_to_end/program_run.h"
+#include "tests/shared/program_run.h"
 
 using testing::Contains;
 using testing::ElementsAre;

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: MIT
-"""Each safety net around the way out is needed: without it, rows of the fault matrix fail in a known way.
+"""Each safety net around the exit after a crash is needed: without it, rows of the fault matrix fail in a known way.
 
     safety_nets.py --plugins build/release/plugins NET=PROGRAM...
 
@@ -28,7 +28,7 @@ NEEDED_BY = {
         "faulty/stack_overflow@load": ("killed by signal 11", False),
         "faulty_own_runtime/stack_overflow@dispatch:52": ("killed by signal 11", False),
     },
-    "end_at_once": {
+    "exit_now": {
         "faulty/crash_in_every_atexit+null_store@dispatch:52": ("killed by signal 11", False),
         "faulty/crash_in_every_atexit@dispatch:52": ("killed by signal 11", False),
     },

@@ -33,7 +33,7 @@ OPTIONS = {
     # Leaks are what the other tests look for. Here an instance that throws while it is being created is never
     # closed, and one that crashes neither.
     "address": ("ASAN_OPTIONS", "detect_leaks=0"),
-    # The way out of a crash goes through exit() inside the signal handler, which is more than the sanitizer wants;
+    # A crash ends the process through exit() inside the signal handler, which is more than the sanitizer wants;
     # and it must not wait for reports there.
     "thread": ("TSAN_OPTIONS", f"report_signal_unsafe=0:atexit_sleep_ms=0:suppressions={SUPPRESSIONS}"),
 }

@@ -16,9 +16,9 @@
 #include <string>
 
 #include "host/vst_wrapper.h"
-#include "tests/doubles/in_process_plugin.h"
-#include "tests/doubles/recording_core_foundation.h"
-#include "tests/doubles/recording_effect.h"
+#include "tests/shared/in_process_plugin.h"
+#include "tests/shared/recording_core_foundation.h"
+#include "tests/shared/recording_effect.h"
 
 namespace {
 

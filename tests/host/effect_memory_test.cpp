@@ -5,7 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

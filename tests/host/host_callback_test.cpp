@@ -9,7 +9,7 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "host/vst_wrapper.h"
-#include "tests/doubles/recording_core_foundation.h"
+#include "tests/shared/recording_core_foundation.h"
 
 namespace {
 

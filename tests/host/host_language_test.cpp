@@ -6,8 +6,8 @@
 #include "gtest/gtest.h"
 #include "host/host_answers.h"
 #include "host/vst_wrapper.h"
-#include "tests/doubles/recording_core_foundation.h"
 #include "tests/host/named_case.h"
+#include "tests/shared/recording_core_foundation.h"
 
 namespace {
 

@@ -7,7 +7,7 @@
 #include <string>
 
 #include "tests/host/preset_fixture.h"
-#include "tests/host/scarce_memory.h"
+#include "tests/shared/scarce_memory.h"
 
 namespace {
 

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
 // VSTWrapper::lock: held while the instance's getParameter and setParameter run, free again afterwards
 // whatever happens.
-#include "tests/host/wrapper_fixture.h"
-#include "tests/platform/observed_thread.h"
+#include "tests/shared/observed_thread.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

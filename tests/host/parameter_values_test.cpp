@@ -4,7 +4,7 @@
 #include <cmath>
 #include <limits>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

@@ -13,10 +13,10 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "host/vst_wrapper.h"
-#include "tests/doubles/in_process_plugin.h"
-#include "tests/doubles/recording_core_foundation.h"
-#include "tests/doubles/recording_effect.h"
 #include "tests/host/preset_bytes.h"
+#include "tests/shared/in_process_plugin.h"
+#include "tests/shared/recording_core_foundation.h"
+#include "tests/shared/recording_effect.h"
 
 namespace preset_tests {
 

@@ -3,7 +3,7 @@
 #include <climits>
 #include <string>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

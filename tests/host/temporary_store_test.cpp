@@ -4,7 +4,7 @@
 #include <cstring>
 #include <string>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

@@ -3,7 +3,7 @@
 //
 // Answers that the interface calls 32-bit numbers lose their upper half; answers that mean yes or no are
 // judged whole.
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 #include "vst2/speakers.h"
 
 namespace {

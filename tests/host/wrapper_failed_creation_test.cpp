@@ -2,7 +2,7 @@
 // VSTWrapper::New where the plug-in gives no instance: null, nothing thrown, nothing left over.
 #include <stdexcept>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

@@ -2,7 +2,7 @@
 // VSTWrapper: the names of plug-in and maker.
 #include <string>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 

@@ -4,7 +4,7 @@
 #include <cstring>
 #include <stdexcept>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 #include "vst2/speakers.h"
 
 namespace {

@@ -3,7 +3,7 @@
 #include <climits>
 #include <cstring>
 
-#include "tests/host/wrapper_fixture.h"
+#include "tests/shared/wrapper_fixture.h"
 #include "vst2/speakers.h"
 
 namespace {

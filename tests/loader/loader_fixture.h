@@ -9,7 +9,7 @@
 
 #include "gtest/gtest.h"
 #include "loader/module_loader.h"
-#include "tests/doubles/recording_core_foundation.h"
+#include "tests/shared/recording_core_foundation.h"
 
 using LoaderHandle = NiduCOM::i_ptr<VSTPluginLoader>;
 

@@ -9,8 +9,8 @@
 
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
-#include "tests/doubles/recording_stream.h"
 #include "tests/loader/identity_samples.h"
+#include "tests/shared/recording_stream.h"
 
 namespace {
 

@@ -10,7 +10,7 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "loader/plugin_identity.h"
-#include "loader/sorted_vector_set.h"
+#include "support/sorted_vector_set.h"
 #include "tests/loader/identity_samples.h"
 #include "tests/loader/virtual_slot.h"
 

@@ -7,8 +7,8 @@
 
 #include "gtest/gtest.h"
 #include "platform/mach_semaphore.h"
-#include "tests/platform/observed_thread.h"
 #include "tests/platform/semaphore_queue.h"
+#include "tests/shared/observed_thread.h"
 
 namespace {
 

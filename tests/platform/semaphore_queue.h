@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "platform/mach_semaphore.h"
-#include "tests/platform/observed_thread.h"
+#include "tests/shared/observed_thread.h"
 
 class SemaphoreQueue {
  public:

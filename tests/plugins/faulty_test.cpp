@@ -4,7 +4,7 @@
 
 #include <gmock/gmock.h>
 
-#include "tests/end_to_end/program_run.h"
+#include "tests/shared/program_run.h"
 
 using testing::AllOf;
 using testing::ElementsAre;

@@ -5,8 +5,8 @@
 
 #include <gmock/gmock.h>
 
-#include "tests/end_to_end/program_run.h"
-#include "tests/end_to_end/temporary_directory.h"
+#include "tests/shared/program_run.h"
+#include "tests/shared/temporary_directory.h"
 
 using testing::AllOf;
 using testing::Contains;

@@ -8,7 +8,7 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "support/auto_buffer.h"
-#include "tests/support/counted_memory.h"
+#include "tests/shared/counted_memory.h"
 
 namespace {
 

@@ -7,7 +7,7 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "support/recursive_mutex.h"
-#include "tests/platform/observed_thread.h"
+#include "tests/shared/observed_thread.h"
 
 namespace {
 

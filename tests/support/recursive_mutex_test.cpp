@@ -9,7 +9,7 @@
 #include "gtest/gtest.h"
 #include "support/atomic_add.h"
 #include "support/recursive_mutex.h"
-#include "tests/platform/observed_thread.h"
+#include "tests/shared/observed_thread.h"
 
 namespace {
 

@@ -6,7 +6,7 @@
 
 #include "gtest/gtest.h"
 #include "support/semaphore.h"
-#include "tests/platform/observed_thread.h"
+#include "tests/shared/observed_thread.h"
 
 namespace {
 

@@ -1,0 +1,163 @@
+// SPDX-License-Identifier: MIT
+// An in-process plug-in instance for tests of the host: it records every request, and answers as it was told.
+//
+//   RecordingEffect effect;
+//   effect.aeffect.numInputs = 2;
+//   effect.setPrograms({{"Soft", {0.1f, 0.2f}}, {"Loud", {0.8f, 0.9f}}});
+//   effect.setText(effGetVendorString, "Play");
+//   ... the host works on &effect.aeffect ...
+//   EXPECT_THAT(effect.requestsOf(effConnectInput), ElementsAre(connectInput(1), connectInput(0)));
+//
+// A request goes this way: it is recorded; onRequest runs (what it throws reaches the host); the texts,
+// records, programs and chunks below do their part; the answer is a scripted number if there is one, else
+// theirs, else 0.
+//
+// Ownership: the test owns the instance, also after effClose: later requests are still recorded, so that it
+//            can see them. The processing functions are null; no host in this program may call them.
+// Threads:   recording is safe from several threads, the rest from one.
+#pragma once
+
+#include <deque>
+#include <functional>
+#include <initializer_list>
+#include <map>
+#include <mutex>
+#include <optional>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "tests/shared/request.h"
+#include "vst2/aeffect.h"
+#include "vst2/effect_opcodes.h"
+#include "vst2/properties.h"
+
+namespace doubles {
+
+/// One of the instance's programs: its name and the values of its parameters (0 for those beyond the vector).
+struct Program {
+  std::string name;
+  std::vector<float> parameters;
+};
+
+/// A plug-in that a shell offers.
+struct ShellChild {
+  VstInt32 id;
+  std::string name;
+};
+
+class RecordingEffect {
+ public:
+  RecordingEffect();
+  RecordingEffect(const RecordingEffect&) = delete;
+  RecordingEffect& operator=(const RecordingEffect&) = delete;
+
+  /// What the host gets. Tests set its counts, flags, uniqueID and version.
+  AEffect aeffect{};
+
+  // ---- What was asked ----
+
+  /// Everything asked since the start or the last forget(), in order.
+  std::vector<Request> requests() const;
+  /// Of these only the dispatcher calls with one of these opcodes.
+  std::vector<Request> requestsOf(VstEffectOpcode opcode) const { return requestsOf({opcode}); }
+  std::vector<Request> requestsOf(std::initializer_list<VstEffectOpcode> opcodes) const;
+  /// Of these only the calls of getParameter, or of setParameter.
+  std::vector<Request> parameterReads() const;
+  std::vector<Request> parameterWrites() const;
+  /// Forgets the requests so far, and nothing else.
+  void forget();
+  /// How often effClose (1) came in; forget() does not change it.
+  int timesClosed() const { return closings; }
+  bool closed() const { return closings > 0; }
+
+  /// Runs in the middle of every request, before the answer is made: may throw, script answers, change
+  /// aeffect, make further requests, or write through request.pointee.address.
+  std::function<void(const Request&)> onRequest;
+
+  // ---- Scripted answers ----
+
+  /// The number to answer to an opcode, with any index or with one index. It replaces nothing but the number.
+  void answer(VstEffectOpcode opcode, VstIntPtr number);
+  void answerAt(VstEffectOpcode opcode, VstInt32 index, VstIntPtr number);
+  /// The numbers to answer to the next requests with this opcode; they go before the ones above.
+  void answerNext(VstEffectOpcode opcode, std::initializer_list<VstIntPtr> numbers);
+
+  /// The text to write for an opcode, with any index or with one index; answered with 1.
+  void setText(VstEffectOpcode opcode, const std::string& text);
+  void setTextAt(VstEffectOpcode opcode, VstInt32 index, const std::string& text);
+  /// Instead of a text: `size` bytes `fill` and no zero byte, whatever the size of the host's buffer.
+  void setUnterminatedText(VstEffectOpcode opcode, std::size_t size, char fill = 'x');
+
+  /// The answer to effCanDo (51) for one capability; the others get 0.
+  void setCapability(const std::string& capability, VstIntPtr number);
+
+  /// The records to write for opcodes 56, 33 and 34; answered with 1. They are written also where a scripted
+  /// number says 0, as some plug-ins do.
+  void setParameterProperties(VstInt32 parameter, const VstParameterProperties& properties);
+  void setInputProperties(VstInt32 pin, const VstPinProperties& properties);
+  void setOutputProperties(VstInt32 pin, const VstPinProperties& properties);
+
+  /// What effShellGetNextPlugin (70) answers, one child a call, then 0 without a text, then all over again.
+  void setShellChildren(std::vector<ShellChild> offered);
+
+  /// Requests with this opcode are recorded and have no effect: no text, no change of program.
+  void ignore(VstEffectOpcode opcode);
+
+  // ---- Programs, parameters, chunks ----
+
+  /// Replaces all programs, selects program 0, and sets aeffect.numPrograms and numParams to fit.
+  /// effSetProgram (2) selects if 0 <= value < numPrograms, effGetProgram (3) answers the selected one,
+  /// effSetProgramName (4) renames it, effGetProgramName (5) writes its name; a plug-in without programs
+  /// still has one set of parameters and one name.
+  void setPrograms(std::vector<Program> replacement);
+  /// Replaces the values of the selected program, and sets aeffect.numParams to fit.
+  void setParameters(std::vector<float> values);
+  /// A program as it stands.
+  Program program(VstInt32 index) const;
+  VstInt32 currentProgram = 0;
+  /// Whether effGetProgramNameIndexed (29) writes names, for 0 <= index < numPrograms. Otherwise it answers
+  /// 0.
+  bool namesProgramsByIndex = false;
+
+  /// State for effGetChunk (23) and effSetChunk (24): index 0 is the bank, any other the program. Without
+  /// effFlagsProgramChunks both requests answer 0 and do nothing. The memory that effGetChunk lends is valid
+  /// until the next one or effClose.
+  std::string bankChunk;
+  std::string programChunk;
+
+ private:
+  // Values by opcode and index; an entry for one index goes before the one for any index.
+  template <typename Value>
+  using ByIndex = std::map<std::pair<VstInt32, std::optional<VstInt32>>, Value>;
+
+  VstIntPtr dispatched(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
+  float parameterRead(VstInt32 index);
+  void parameterWritten(VstInt32 index, float value);
+
+  void received(const Request& request);
+  VstIntPtr perform(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr);
+  VstIntPtr performOnPrograms(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr);
+  VstIntPtr nextShellChild(void* ptr);
+  VstIntPtr lendChunk(VstInt32 index, void* ptr);
+  VstIntPtr takeChunk(VstInt32 index, VstIntPtr size, const void* ptr);
+  std::optional<VstIntPtr> scriptedAnswer(VstInt32 opcode, VstInt32 index);
+  std::vector<Request> requestsOf(Request::Kind kind) const;
+
+  mutable std::mutex recording;
+  std::vector<Request> recorded;
+  int closings = 0;
+
+  ByIndex<VstIntPtr> answers;
+  std::map<VstInt32, std::deque<VstIntPtr>> nextAnswers;
+  ByIndex<std::string> written;  // The bytes to write: texts with their zero byte, and records.
+  std::map<std::string, VstIntPtr> capabilities;
+  std::set<VstInt32> ignored;
+  std::vector<ShellChild> children;
+  std::size_t nextChild = 0;
+  std::map<VstInt32, Program> programs;
+  std::vector<char> lentChunk;
+};
+
+}  // namespace doubles

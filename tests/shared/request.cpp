@@ -1,0 +1,168 @@
+// SPDX-License-Identifier: MIT
+// How requests are read, expected and compared.
+#include "tests/shared/request.h"
+
+#include <algorithm>
+#include <cstring>
+#include <utility>
+
+namespace doubles {
+namespace {
+
+// The host's own buffer sizes, and the sizes of the interface's records.
+std::size_t roomSizeOf(VstInt32 opcode) {
+  switch (opcode) {
+    case effGetProgramName:
+    case effGetParamLabel:
+    case effGetParamDisplay:
+    case effGetProgramNameIndexed:
+      return 256;
+    case effGetParamName:
+      return 500;
+    case effGetEffectName:
+    case effGetVendorString:
+    case effGetProductString:
+    case effShellGetNextPlugin:
+      return 114;
+    case effGetInputProperties:
+    case effGetOutputProperties:
+      return 128;
+    case effGetParameterProperties:
+      return 152;
+    case effGetChunk:
+      return sizeof(void*);
+    default:
+      return 0;
+  }
+}
+
+bool bringsText(VstInt32 opcode) {
+  return opcode == effSetProgramName || opcode == effString2Parameter || opcode == effCanDo;
+}
+
+Pointee text(const std::string& content) {
+  Pointee pointee;
+  pointee.kind = Pointee::Kind::kText;
+  pointee.content = content;
+  return pointee;
+}
+
+Pointee bytes(const std::string& content) {
+  Pointee pointee;
+  pointee.kind = Pointee::Kind::kBytes;
+  pointee.content = content;
+  return pointee;
+}
+
+Pointee room(std::size_t size, std::size_t zeroBytes) {
+  Pointee pointee;
+  pointee.kind = Pointee::Kind::kRoom;
+  pointee.roomSize = size;
+  pointee.zeroBytes = zeroBytes;
+  return pointee;
+}
+
+Pointee address(const void* ptr) {
+  Pointee pointee;
+  pointee.kind = Pointee::Kind::kAddress;
+  pointee.address = const_cast<void*>(ptr);
+  return pointee;
+}
+
+Pointee readPointee(VstInt32 opcode, VstIntPtr value, void* ptr) {
+  if (ptr == nullptr) return {};
+  const char* const start = static_cast<const char*>(ptr);
+  if (bringsText(opcode)) return text(start);
+  if (opcode == effSetChunk)
+    return bytes(std::string(start, value > 0 ? static_cast<std::size_t>(value) : 0));
+  const std::size_t size = roomSizeOf(opcode);
+  if (size == 0) return address(ptr);
+  return room(size, static_cast<std::size_t>(std::count(start, start + size, '\0')));
+}
+
+bool sameBits(float a, float b) { return std::memcmp(&a, &b, sizeof a) == 0; }
+
+Request withPointee(VstEffectOpcode opcode, VstInt32 index, VstIntPtr value, Pointee pointee) {
+  Request expected;
+  expected.opcode = opcode;
+  expected.index = index;
+  expected.value = value;
+  expected.pointee = std::move(pointee);
+  return expected;
+}
+
+}  // namespace
+
+bool Pointee::operator==(const Pointee& other) const {
+  return kind == other.kind && content == other.content && roomSize == other.roomSize &&
+         zeroBytes == other.zeroBytes && (kind != Kind::kAddress || address == other.address);
+}
+
+bool Request::operator==(const Request& other) const {
+  return kind == other.kind && opcode == other.opcode && index == other.index && value == other.value &&
+         pointee == other.pointee && sameBits(opt, other.opt);
+}
+
+Request Request::withZeroBytes(std::size_t zeroBytes) const {
+  Request changed = *this;
+  changed.pointee.zeroBytes = zeroBytes;
+  return changed;
+}
+
+Request receivedRequest(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) {
+  Request received;
+  received.opcode = opcode;
+  received.index = index;
+  received.value = value;
+  received.pointee = readPointee(opcode, value, ptr);
+  received.pointee.address = ptr;
+  received.opt = opt;
+  return received;
+}
+
+Request request(VstEffectOpcode opcode, VstInt32 index, VstIntPtr value, float opt) {
+  const std::size_t size = roomSizeOf(opcode);
+  Request expected = withPointee(opcode, index, value, size == 0 ? Pointee{} : room(size, size));
+  expected.opt = opt;
+  return expected;
+}
+
+Request setProgram(VstIntPtr program) { return request(effSetProgram, 0, program); }
+Request setProgramName(const std::string& name) { return withPointee(effSetProgramName, 0, 0, text(name)); }
+Request programNameIndexed(VstInt32 program) { return request(effGetProgramNameIndexed, program, -1); }
+Request setSampleRate(float rateInHz) { return request(effSetSampleRate, 0, 0, rateInHz); }
+Request setBlockSize(VstIntPtr frames) { return request(effSetBlockSize, 0, frames); }
+Request mainsChanged(VstIntPtr on) { return request(effMainsChanged, 0, on); }
+Request setBypass(VstIntPtr on) { return request(effSetBypass, 0, on); }
+Request connectInput(VstInt32 pin, VstIntPtr on) { return request(effConnectInput, pin, on); }
+Request connectOutput(VstInt32 pin, VstIntPtr on) { return request(effConnectOutput, pin, on); }
+Request canDo(const std::string& capability) { return withPointee(effCanDo, 0, 0, text(capability)); }
+Request canParameterBeSetFromText(VstInt32 parameter) { return request(effString2Parameter, parameter); }
+Request setParameterFromText(VstInt32 parameter, const std::string& value) {
+  return withPointee(effString2Parameter, parameter, 0, text(value));
+}
+Request getChunk(VstInt32 index) { return request(effGetChunk, index); }
+Request setChunk(VstInt32 index, const std::string& content) {
+  return withPointee(effSetChunk, index, static_cast<VstIntPtr>(content.size()), bytes(content));
+}
+Request speakerArrangement(const void* input, const void* output) {
+  return withPointee(effGetSpeakerArrangement, 0, reinterpret_cast<VstIntPtr>(input),
+                     output == nullptr ? Pointee{} : address(output));
+}
+
+Request getParameterOf(VstInt32 parameter) {
+  Request expected;
+  expected.kind = Request::Kind::kGetParameter;
+  expected.index = parameter;
+  return expected;
+}
+
+Request setParameterTo(VstInt32 parameter, float value) {
+  Request expected;
+  expected.kind = Request::Kind::kSetParameter;
+  expected.index = parameter;
+  expected.opt = value;
+  return expected;
+}
+
+}  // namespace doubles
