@@ -12,23 +12,22 @@ class VSTWrapper;
 
 namespace KelVSTInfoCache {
 
-/// A plain value.
+/// A plain value; it owns its texts.
 struct ParamInfo {
-  /// Asks the plug-in.
+  /// Asks the plug-in about the parameter with this index. Throws what the plug-in throws.
   /// On purpose: a parameter with up to 100 integer steps is set to each of them, as the integer itself and
   /// not as a value from 0 to 1, and stays at the last.
   ParamInfo(VSTWrapper* wrapper, int index);
 
   VstInt32 paramIndex;
-  VstParameterProperties
-      props;  ///< As the plug-in filled it in, its texts ended within their fields; or zeros.
-  double minValue = 0.0;
-  double maxValue = 1.0;  ///< The range is the integer range where the plug-in has one.
-  double currentValue;    ///< When the entry was made, before any step was tried.
+  VstParameterProperties props;  ///< The plug-in's, with its texts terminated; zeros when it has none.
+  double minValue = 0.0;         ///< The lowest integer where the properties have an integer range.
+  double maxValue = 1.0;         ///< The highest integer where the properties have an integer range.
+  double currentValue;           ///< Read before any step is tried.
   bool automatable = false;
   NiduStringObj paramName;
   NiduStringObj paramLabel;             ///< The unit.
-  std::vector<std::string> valueTexts;  ///< Of every integer step; empty for all other parameters.
+  std::vector<std::string> valueTexts;  ///< The display text of each integer step; empty without such steps.
 
  private:
   [[nodiscard]] bool hasFewIntegerSteps() const;

@@ -2,12 +2,12 @@
 // Speaker arrangements for a channel count and a surround model.
 #pragma once
 
-#include <cstdlib>
 #include <memory>
+#include <new>
 
 #include "vst2/speakers.h"
 
-/// Which kind of surround a variant is meant for.
+/// The kind of surround that a variant is meant for, with its channel count.
 enum KelSurroundModel : VstInt32 {
   kKelSurroundMonoStereo = 1,  ///< 1 or 2 channels.
   kKelSurroundQuad = 2,        ///< 4: L R Ls Rs. The only value that is ever tested.
@@ -18,25 +18,26 @@ enum KelSurroundModel : VstInt32 {
   kKelSurround102 = 7,         ///< 12.
 };
 
-/// Frees an arrangement, whose block is larger than the record that the interface declares.
+/// Frees the whole block of an arrangement, which is larger than the record that the interface declares.
 struct FreeSpeakerArrangement {
-  void operator()(VstSpeakerArrangement* arrangement) const { std::free(arrangement); }
+  void operator()(VstSpeakerArrangement* arrangement) const { ::operator delete(arrangement); }
 };
 using OwnedSpeakerArrangement = std::unique_ptr<VstSpeakerArrangement, FreeSpeakerArrangement>;
 
-/// Room for this many speakers in every arrangement made here; unused ones are zero.
+/// Every arrangement made here has room for this many speakers; unused entries are zero.
 constexpr int kSpeakerEntries = 20;
 
-/// One speaker entry, 0 to 19. Borrowed.
+/// The speaker entry with an index of 0 to 19. It belongs to the arrangement.
 VstSpeakerProperties* speakerIn(VstSpeakerArrangement& arrangement, int index);
 
-/// A new arrangement with these values and, for its first speakers, these types; -1 leaves a type at zero.
-/// On purpose: the thirteenth type is ignored, only twelve are ever stored.
-/// Throws std::bad_alloc when there is no memory.
+/// A new arrangement with this type and channel count, whose first entries have these speaker types; -1
+/// leaves an entry's type at zero. Throws std::bad_alloc when there is no memory.
+/// On purpose: the thirteenth speaker type is ignored; only twelve are stored.
 OwnedSpeakerArrangement initSpeakerArrangement(int type, int numChannels, int s0, int s1, int s2, int s3,
                                                int s4, int s5, int s6, int s7, int s8, int s9, int s10,
                                                int s11, int s12);
 
-/// A new arrangement for this many channels. A count that is not known becomes stereo. The model decides
-/// between the two arrangements of four channels and nothing else.
+/// A new arrangement for this many channels. The model matters only for four channels, which are quad or
+/// LCRS. Throws std::bad_alloc when there is no memory.
+/// On purpose: a count without an arrangement of its own, such as 5 or -1, becomes stereo with 2 channels.
 OwnedSpeakerArrangement getSpeakerArrangement(int numChannels, KelSurroundModel model);

@@ -36,7 +36,7 @@ constexpr PrototypeVSTVariant kPrototypes[] = {
     {25, 0, 4, kKelSurroundLCRS},        // instrument, LCRS out
     {26, 0, 7, kKelSurround61},          // instrument, 6.1 out
     {27, 0, 8, kKelSurround71},          // instrument, 7.1 out
-    {28, 0, 8, kKelSurround102},  // On purpose: 8 outputs with the 10.2 model, so this comes out as 7.1.
+    {28, 0, 8, kKelSurround102},         // On purpose: 8 outputs, so its output arrangement is 7.1.
 };
 
 }  // namespace
@@ -47,7 +47,7 @@ void setupBundle(int count, int limit, VSTBundle& out) {
 }
 
 const std::vector<PrototypeVSTVariant>& GetPrototypeVariants() {
-  // On purpose: never destroyed. A plug-in's thread may be in exit() while the run still reads them.
+  // On purpose: never destroyed. The run may still read the table while a plug-in's thread is in exit().
   static const auto* const variants =
       new std::vector<PrototypeVSTVariant>(std::begin(kPrototypes), std::end(kPrototypes));
   return *variants;

@@ -13,7 +13,7 @@ namespace {
 constexpr std::uint32_t kNeedsRefresh = 0x100000;
 constexpr VstInt32 kInvalidRecordVersion = 2400;
 
-/// Far above any shell's number of children: one that names more will not stop.
+/// Far more children than any shell has: one that names more would never stop.
 constexpr std::size_t kMostChildren = 1u << 20;
 
 constexpr int kNoLimit = 100;
@@ -77,7 +77,7 @@ void VSTInfo::BuildBasicInfo(VSTWrapper* wrapper) {
     refreshChildIDs(wrapper);
     return;
   }
-  // Room for all at once: a count that no memory can hold fails here and not after minutes of asking.
+  // Room for all at once, so that a count too large for the memory fails here and not minutes later.
   const VstInt32 count = effect.numParams;
   if (count > 0) allocateOrFail([&] { params.reserve(params.size() + static_cast<std::size_t>(count)); });
   for (VstInt32 index = 0; index < effect.numParams; ++index) {

@@ -13,12 +13,12 @@ constexpr const char* kRefusedBundles[] = {
     "NIDU Parlo Instrument.vst",
     "Wexlo2 VST 5.1.vst",
     "Wexlo2 VST 7.1.vst",
-    "Wexlo2 VST 5.1.vst",    // On purpose: stands here twice.
-    "WeXlo2 VST. Quad.vst",  // On purpose: with this capital and this point.
+    "Wexlo2 VST 5.1.vst",    // On purpose: listed twice.
+    "WeXlo2 VST. Quad.vst",  // On purpose: this capital X and this full stop.
     "Wexlo2 VST.vst",
 };
 
-/// toupper for the characters of a plain C string, which are signed: those below 0 stay as they are.
+/// toupper() for a signed character: characters below 0 stay as they are.
 signed char upperCase(char c) {
   return static_cast<signed char>(c < 0 ? c : static_cast<char>(std::toupper(c)));
 }

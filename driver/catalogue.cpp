@@ -3,7 +3,6 @@
 
 #include <algorithm>
 
-#include "describe/variants.h"
 #include "describe/vst_info.h"
 #include "driver/crash_guard.h"
 #include "driver/report.h"
@@ -26,7 +25,7 @@ void inspectClassInfo(VSTWrapper& wrapper) {
     pin = {};
     wrapper.getInputProperties(i, pin);
   }
-  // On purpose: a plug-in without outputs is asked for its first all the same; inputs have no such floor.
+  // On purpose: a plug-in without outputs is still asked about output 0, but not about input 0.
   for (VstInt32 i = 0; i < std::max(effect.numOutputs, 1); ++i) {
     pin = {};
     wrapper.getOutputProperties(i, pin);
@@ -61,7 +60,7 @@ void inspectParameterInfo(VSTWrapper& wrapper) {
   }
 }
 
-/// Saves the state, looks at the data and loads it back.
+/// Saves the state, reads the saved data's header and loads the data back.
 void saveAndLoad(VSTWrapper& wrapper, AutoBuffer<char>& buffer, bool asBank) {
   if (!wrapper.saveToFXBData(buffer, asBank)) return;
   VSTWrapper::getEffectIDFromPresetData(buffer.data());
@@ -78,7 +77,7 @@ void testSettingState(VSTWrapper& wrapper) {
   saveAndLoad(wrapper, buffer, true);
   dispatch(effect, effMainsChanged, 0, 1);
   wrapper.mainsOn = true;
-  // On purpose: the flag is one request ahead of the plug-in, here and below.
+  // On purpose: the flag changes before the request is made, here and below.
   wrapper.bypassed = true;
   dispatch(effect, effSetBypass, 0, 1);
   wrapper.bypassed = false;
@@ -87,22 +86,17 @@ void testSettingState(VSTWrapper& wrapper) {
   wrapper.mainsOn = false;
 }
 
-/// On purpose: named for latency, asks for the tail size.
+/// On purpose: the test is named after the latency and asks for the tail size.
 void inspectLatency(VSTWrapper& wrapper) { dispatch(*wrapper.effect, effGetTailSize); }
 
 void inspectStreamFormat(VSTWrapper& wrapper) {
   const bool isSynth = (wrapper.effect->flags & effFlagsIsSynth) != 0;
-  for (const VSTVariant& variant : KelVSTInfoCache::VSTInfo::BuildVariants(&wrapper, isSynth)) {
-    if (!variant.accepted) continue;
-    const OwnedSpeakerArrangement in = variant.getInArrangement();
-    const OwnedSpeakerArrangement out = variant.getOutArrangement();
-    wrapper.setSpeakerArrangement(in.get(), out.get());
-  }
+  offerVariants(wrapper, KelVSTInfoCache::VSTInfo::BuildVariants(&wrapper, isSynth));
 }
 
 struct Test {
-  const char* name;      ///< For the failure line.
-  const char* stepText;  ///< For the step line. On purpose: another text.
+  const char* name;      ///< In the failure line.
+  const char* stepText;  ///< In the step line. On purpose: differs from the name.
   void (*run)(VSTWrapper& wrapper);
 };
 
@@ -125,4 +119,13 @@ void runOneTest(int testNumber, VSTWrapper* wrapper) {
   printStep(test.stepText);
   if (wrapper == nullptr) crashOnPurpose();
   test.run(*wrapper);
+}
+
+void offerVariants(VSTWrapper& wrapper, const std::vector<VSTVariant>& variants) {
+  for (const VSTVariant& variant : variants) {
+    if (!variant.accepted) continue;
+    const OwnedSpeakerArrangement in = variant.getInArrangement();
+    const OwnedSpeakerArrangement out = variant.getOutArrangement();
+    wrapper.setSpeakerArrangement(in.get(), out.get());
+  }
 }

@@ -32,8 +32,9 @@ std::atomic<bool> isExiting{false};
 
 void onExitTimeout(int) { exitNow(); }
 
-/// Unblocks also those that the plug-in has blocked, and the one that is being handled. No others: a signal
-/// that nobody handles may be pending, and would kill the process before it can print "unexpected exit".
+/// Unblocks the signals listed above, including the one that is being handled and those that the plug-in has
+/// blocked. All other signals stay as they are: one without a handler may be pending, and would kill the
+/// process before it can print "unexpected exit".
 void unblockOurSignals() {
   sigset_t ours;
   sigemptyset(&ours);

@@ -10,7 +10,7 @@
 
 namespace {
 
-// On purpose: SIGKILL is asked for too, although the system refuses it. No result is looked at.
+// On purpose: SIGKILL is in the list although the system refuses a handler for it. No result is checked.
 constexpr int kGuardedSignals[] = {SIGINT, SIGABRT, SIGHUP, SIGKILL, SIGSEGV, SIGTERM, SIGBUS};
 
 /// Lets the handler run on the signal stack, and lets a second signal arrive while the first is handled.
@@ -46,8 +46,8 @@ CPPAutoReleasePool::~CPPAutoReleasePool() {
 }
 
 __attribute__((no_sanitize("undefined"))) void crashOnPurpose() {
-  // Both the pointer and what it points to are volatile: the optimiser removes any other store to address 0.
+  // The pointer and the integer are both volatile: the optimiser removes any other store to address 0.
   volatile int* volatile nowhere = nullptr;
-  *nowhere = 0;  // NOLINT(clang-analyzer-core.NullDereference): that is the point
+  *nowhere = 0;  // NOLINT(clang-analyzer-core.NullDereference): it is meant to crash
   std::abort();
 }

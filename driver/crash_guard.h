@@ -5,12 +5,12 @@
 struct AutoreleasePool;
 struct ExceptionDelegate;
 
-/// Ends the process through exit(gCrashCode), whichever signal it is.
+/// The handler of every guarded signal: ends the process through exit(gCrashCode).
 void signal_callback_handler(int);
 
-/// Holds the process's autorelease pool and the delegate of its exception handler, and arms the guard.
+/// Owns the process's autorelease pool and the delegate of its exception handler, and arms the guard.
 ///
-/// Made once, first of all; the guard stays armed until the end of main().
+/// main() makes one before it reads its arguments; the guard stays armed until main() returns.
 class CPPAutoReleasePool {
  public:
   /// From now on a crash ends the process with this status.

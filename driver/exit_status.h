@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: MIT
-// What the process ends with.
+// The exit statuses of the process.
 #pragma once
 
 enum ExitStatus : int {
-  kExitPassed = 0,            ///< The run went to its end.
+  kExitPassed = 0,            ///< The run was completed.
   kExitShell = 1,             ///< The same, and the plug-in is a shell.
-  kExitNoPath = 2,            ///< No bundle was named.
-  kExitFailed = 3,            ///< The run stopped at a failure, which has its line.
-  kExitRefusedUnmatched = 4,  ///< Refused, with the check's out-flag false. No row of the list does this.
-  kExitRefused = 5,           ///< The bundle is on the list of those that are refused.
+  kExitNoPath = 2,            ///< No path was given.
+  kExitFailed = 3,            ///< The run stopped at a failure and printed its line.
+  kExitRefusedUnmatched = 4,  ///< Refused, but `matched` was left false. Never happens.
+  kExitRefused = 5,           ///< The bundle is on the list of refused bundles.
   kExitCrashed = 7,           ///< The crash guard ended the process.
 };

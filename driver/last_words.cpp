@@ -56,14 +56,14 @@ class BlockedEndSignals {
   sigset_t before;
 };
 
-/// True for the one caller that has to print them.
+/// True for the first caller, who has to print "unexpected exit".
 bool claimLastWords() {
   LastWords expected = LastWords::kNotPrinted;
   return lastWords.compare_exchange_strong(expected, LastWords::kBeingPrinted);
 }
 
-/// Waits while another thread, or the code that this signal handler interrupted, is printing them. Limited by
-/// the clock and not by a number of sleeps: on a busy machine a sleep of one millisecond takes many.
+/// Waits while another thread, or the code that this signal handler interrupted, prints "unexpected exit".
+/// The clock limits the wait, not a number of sleeps: on a busy machine a sleep of 1 ms takes much longer.
 void waitForLastWords() {
   const timespec millisecond = {0, 1000000};
   const long long limit = nowInMilliseconds() + kWaitLimitInMilliseconds;
@@ -106,8 +106,9 @@ void waitIfReportIsClosed() {
 }
 
 void printUnexpectedExit() {
-  // Blocked signals keep a handler from running between the printing and the note that it is done, but only
-  // where nothing can block: not while waiting for stdout's lock, nor on a full pipe.
+  // With these signals blocked, no handler can run after the text is printed and before `lastWords` says so.
+  // They stay unblocked while waiting for stdout's lock and on a full pipe: there they must be able to end
+  // the process.
   flockfile(stdout);
   if (isOutputWritable()) {
     const BlockedEndSignals blocked;

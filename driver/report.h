@@ -2,9 +2,9 @@
 // The lines that a host reads: everything that this program prints on standard output, except for
 // "unexpected exit" (driver/last_words.h).
 //
-// Each line is flushed before the work that it announces begins, so the last line names the step in which a
-// process died. A process that the plug-in has forked prints none, and neither does any other thread once one
-// of them is ending the process.
+// Each line is flushed before the work that it announces begins, so the last line names the step in which the
+// process died. A process that the plug-in has forked prints no line. Once one thread is ending the process,
+// the other threads print no line.
 #pragma once
 
 /// Number of the last step line. Each step line increments it first; never reset.
@@ -15,8 +15,7 @@ extern const char* gCurTest;
 
 /// Call before the first line. Makes stdout unbuffered: exit() would otherwise flush a line a second time
 /// when a signal interrupts the first flush. Makes stdout byte-oriented: printf() prints nothing on a stream
-/// on which the plug-in has used wide characters first. From now on the calling process is the one that
-/// prints.
+/// on which the plug-in has used wide characters first. Calls startReporting().
 void openReport();
 
 /// "!too few arguments. syntax is command pathtovst childID(optional)"

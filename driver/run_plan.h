@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// What is done with a plug-in once it has been created.
+// The order of the steps that follow the creation of a plug-in.
 #pragma once
 
 #include <cstdint>
@@ -16,7 +16,7 @@
 void torturePlugin(const NiduCOM::i_ptr<VSTPluginLoader>& loader, const VST_loadID& loadID,
                    const VST_Class_Spec& classSpec, std::unique_ptr<VSTWrapper>& wrapper);
 
-/// The short plan of a shell, which only holds other plug-ins: one description.
+/// The plan of a shell, which only contains other plug-ins: one description. Catches nothing.
 /// On purpose: announces 51 steps and prints 1.
 void tortureShell(const VSTPluginLoader& loader, VSTWrapper& wrapper);
 
