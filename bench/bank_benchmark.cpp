@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
-// What saving and loading a bank costs for each parameter of each program, in process, on the plug-in that
-// answers nothing. `per_value` is that cost in seconds; a loop over the values alone stands beside it.
+// The time that saving and loading a bank takes for each parameter of each program, in process, on the null
+// plug-in. `per_value` is that time in seconds. For comparison, askAndWriteOnly() measures a loop over the
+// values.
 #include <cstdlib>
 #include <memory>
 #include <string>
@@ -50,7 +51,7 @@ void loadBank(benchmark::State& state) {
   countValues(state);
 }
 
-/// What no host can do without: each value asked for and written in the format's byte order.
+/// The work that no host can avoid: asks for each value and writes it in the format's byte order.
 void askAndWriteOnly(benchmark::State& state) {
   const std::unique_ptr<VSTWrapper> wrapper = makeInstance(state);
   AEffect* effect = wrapper->effect;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The wrapper's lock against the standard one while nobody else wants it: taken and given back, and once more
-// by the thread that holds it.
+// The wrapper's lock compared with the standard one, without contention: locked and unlocked once, and locked
+// again by the thread that holds it.
 #include <mutex>
 
 #include <benchmark/benchmark.h>
@@ -19,7 +19,7 @@ void lockAndUnlock(benchmark::State& state) {
   }
 }
 
-/// Times one further lock and unlock by the owner.
+/// Measures one further lock and unlock by the owner.
 template <class Mutex>
 void recurse(benchmark::State& state) {
   Mutex mutex;

@@ -1,16 +1,16 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: MIT
-"""Holds the cost of vsttorture against the bare C host of bench/bare_host, whole processes in pairs.
+"""Compares the cost of vsttorture with that of the bare C host in bench/bare_host, as whole processes in pairs.
 
     cmake --preset bench && cmake --build --preset bench
     bench/whole_process.py [--build build/bench] [--pairs FACTOR] [CASE ...]
 
-Cases: light, null, real, linear, instructions; without any, all of them. Needs Python's standard library, and
+Cases: light, null, real, linear, instructions; all of them when none is named. Needs Python's standard library, and
 the Debian packages time (peak memory) and valgrind (instructions); real plug-ins come from amsynth and
 zynaddsubfx-vst.
 
-A pair is a run of the program and then one of the bare host, which repeats the random tests that the program drew:
-both print the same lines, which is checked. Ratios are taken within a pair; the median of all pairs is printed,
+A pair is a run of the program and then a run of the bare host, which repeats the random tests that the program
+drew. Both must print the same lines. Ratios are taken within a pair; the median of all pairs is printed,
 with the quartiles. CPU time is user and system time, which other work on the machine disturbs less.
 """
 
@@ -75,7 +75,7 @@ class Bench:
                   f"{times[0] * 1e3:9.3f} ms against {times[1] * 1e3:9.3f} ms, {pairs} pairs", flush=True)
 
     def peak_memory(self, command, extra=None):
-        """In KiB. Not from wait4: that would count this interpreter, which the child is a copy of at first."""
+        """In KiB. Not from wait4(), which would count this interpreter: the child starts as a copy of it."""
         report = self.lines + ".memory"
         self.run(["/usr/bin/time", "-q", "-f", "%M", "-o", report] + command, self.replayed, extra)
         with open(report, encoding="utf-8") as text:
@@ -98,7 +98,7 @@ def light(bench):
 
 
 def null(bench):
-    """A plug-in that answers nothing, with 10 000 parameters and 1 000 programs."""
+    """The null plug-in, with 10 000 parameters and 1 000 programs."""
     bench.compare("null 10000 x 1000", bench.sample("null_plugin"), 15, LARGE)
 
 
@@ -110,7 +110,7 @@ def real(bench):
 
 
 def linear(bench):
-    """CPU time of one state test per parameter and program: the same at every size, where cost is linear.
+    """CPU time of one state test per parameter and program, which is the same at every size when the cost is linear.
 
     A run draws 2 to 52 state tests, which are nearly all of its cost here, so it is divided by their number."""
     for parameters, programs in ((1000, 250), (1000, 1000), (4000, 1000), (16000, 1000)):
@@ -138,11 +138,11 @@ def instructions_by_object(bench, command, extra):
 
 
 def instructions(bench):
-    """Where the instructions of a run are spent, on a small null plug-in, in the program and in the bare host."""
+    """Instructions of a run per shared object, on a small null plug-in, in the program and in the bare host."""
     extra = {"NULL_PLUGIN_PARAMETERS": "2000", "NULL_PLUGIN_PROGRAMS": "100"}
     plugin = bench.sample("null_plugin")
     bench.run([bench.tool, plugin], bench.lines, extra)
-    # Under valgrind the program draws anew, so its own lines are replayed.
+    # The program draws other random tests under valgrind, so the bare host repeats those.
     tool = instructions_by_object(bench, [bench.tool, plugin], extra)
     os.replace(bench.replayed, bench.lines)
     bare_host = instructions_by_object(bench, [bench.bare_host, bench.lines, plugin], extra)

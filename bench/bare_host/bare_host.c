@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
-/* A bare C host, with which the cost of vsttorture is compared: it holds the same conversation with a plug-in,
- * with the same buffers and the same lines of output, and does nothing else. No C++ runtime, no lock around
- * values, no guards, no description kept.
+/* A bare C host, with which the cost of vsttorture is compared: it makes the same requests of a plug-in, with
+ * the same buffers and the same lines of output, and does nothing else. It has no C++ runtime, no lock around
+ * values and no crash guard, and it keeps no description.
  *
  *   bare_host LINES PLUGIN [CHILD_ID]
  *
@@ -44,7 +44,7 @@ static int testNamed(const char* text) {
   return -1;
 }
 
-/* Ends the process unless `path` holds all fifty. */
+/* Ends the process unless `path` names all fifty tests. */
 static void readRandomTests(const char* path, int tests[kRandomTests]) {
   FILE* file = fopen(path, "r");
   int found = 0;

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: MIT
-/* What the bare host answers to a plug-in: the same as the program. */
+/* The bare host's answers to a plug-in, which are the same as the program's. */
 #pragma once
 
 #include "interface.h"
 
-/* The child that a shell is asked to become; 0 for none. */
+/* The child that a shell is asked to create; 0 for none. */
 extern int32_t hostCurrentChild;
 
 HostCallback hostCallback;

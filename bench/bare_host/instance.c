@@ -82,7 +82,7 @@ void effectName(AEffect* effect) {
   request(effect, effGetProductString, 0, 0, name, 0.0f);
 }
 
-/* One maker's sampler is asked for its name as well; no plug-in measured here is of that maker. */
+/* The program also asks one maker's sampler for its name; no plug-in measured here is of that maker. */
 void vendorName(AEffect* effect) {
   char name[kNameBuffer];
   askText(effect, effGetVendorString, 0, name, sizeof name);

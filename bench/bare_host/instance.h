@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: MIT
-/* One plug-in instance in the bare host: created, asked and closed with the program's requests and buffers, and
- * with nothing around them. */
+/* One plug-in instance in the bare host: created and asked with the program's requests and buffers. */
 #pragma once
 
 #include <string.h>
@@ -21,7 +20,7 @@ static inline intptr_t askText(AEffect* effect, int32_t opcode, int32_t index, c
   return request(effect, opcode, index, 0, text, 0.0f);
 }
 
-/* Through memory, as the value would be in the program: a wider register would keep more bits. */
+/* Stores the value in memory, as the program does: a register may keep more bits. */
 static inline float getParameter(AEffect* effect, int32_t index) {
   const volatile float value = effect->getParameter(effect, index);
   return value;
@@ -35,14 +34,14 @@ static inline int32_t currentProgram(AEffect* effect) { return (int32_t)ask(effe
 
 enum { kNameBuffer = 114, kParameterNameBuffer = 500, kTextBuffer = 256 };
 
-/* Loads the module and finds its entry; ends the process where there is none. */
+/* Loads the module and finds its entry point; ends the process when there is none. */
 EntryPoint* loadEntry(const char* path);
-/* Creates and opens an instance; `child` is what a shell is to become, 0 for none. */
+/* Creates and opens an instance. `child` is the child of a shell, 0 for none. */
 AEffect* createInstance(EntryPoint* entry, int32_t child);
 
 void selectProgram(AEffect* effect, int32_t program);
 void currentProgramName(AEffect* effect, char name[kTextBuffer]);
-/* The given program's name, which is not looked at where it is not the current one. */
+/* The given program's name. The caller does not use the name of a program that is not the current one. */
 void nameOfProgram(AEffect* effect, int32_t program, char name[kTextBuffer]);
 void renameProgram(AEffect* effect, int32_t program, const char* name);
 

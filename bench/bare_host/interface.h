@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-/* The part of the VST 2.x interface that the bare host uses, in C and apart from vst2/, so that a slip there
- * shows up as a difference between the two conversations. */
+/* The part of the VST 2.x interface that the bare host uses, in C. Independent of vst2/, so that an error
+ * there shows up as a difference between the requests of the two programs. */
 #pragma once
 
 #include <stdint.h>

@@ -139,7 +139,7 @@ static void loadBank(AEffect* effect, const char* bank) {
   readProgram(effect, bank + kBankContentAt + stride * (size_t)current);
 }
 
-/* Where programs cannot be named by index, each is selected once. */
+/* Selects each program once when the plug-in does not name programs by their index. */
 static void visitPrograms(AEffect* effect) {
   char name[kTextBuffer] = {0};
   if (effect->numPrograms < 1) return;

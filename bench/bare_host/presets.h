@@ -11,7 +11,7 @@ typedef struct {
   size_t size;
 } State;
 
-/* The state in memory of its own. */
+/* Returns the state in a block that the caller frees. */
 State saveState(AEffect* effect, int asBank);
-/* Gives it back to the plug-in that it was taken from. */
+/* Loads a state into the plug-in that it was saved from. */
 void loadState(AEffect* effect, const State* state, int isBank);

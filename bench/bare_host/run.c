@@ -117,7 +117,7 @@ void runTest(AEffect* effect, int number) {
     case 4:
       ask(effect, effGetTailSize);
       break;
-    default: /* Test 5 asks nothing: its variants are chosen from counts that the host has. */
+    default: /* Test 5 makes no request: the host selects its variants by the plug-in's channel counts. */
       break;
   }
 }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-/* What a run is made of: descriptions and numbered tests. */
+/* The parts of a run: descriptions and numbered tests. */
 #pragma once
 
 #include "interface.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-/* A plug-in that answers nothing, in constant time: every request is 0 and every value is 0, so that a run on
- * it costs what its host costs. NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS say how many it has. */
+/* The null plug-in: answers every request with 0 in constant time, so that a run on it costs what its host
+ * costs. The environment variables NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS set its counts. */
 #include <stdint.h>
 #include <stdlib.h>
 
