@@ -1,60 +1,60 @@
 // SPDX-License-Identifier: MIT
-// The six tests: their names, their texts, and every request that each of them makes, in order.
+// The six tests: their names, their step lines, and the plug-ins to which they make special requests. All
+// requests to an ordinary plug-in are in tests/end_to_end/golden/conversation_*.txt.
 #include <climits>
 #include <cstring>
 #include <limits>
+#include <new>
 #include <string>
+#include <tuple>
+#include <utility>
 #include <vector>
 
+#include "describe/vst_info.h"
 #include "driver/catalogue.h"
 #include "gmock/gmock.h"
 #include "tests/driver/torture_fixture.h"
+#include "tests/shared/scarce_memory.h"
 
 namespace {
 
 using namespace doubles;
 using testing::ElementsAre;
-using testing::ElementsAreArray;
 using testing::IsEmpty;
+using testing::Pair;
 
 struct CatalogueEntry {
   int number;
   const char* name;
   const char* stepLine;
+  bool makesRequests;
 };
-
-void PrintTo(const CatalogueEntry& entry, std::ostream* stream) { *stream << entry.stepLine; }
 
 class Catalogue : public InstanceFixture, public testing::WithParamInterface<CatalogueEntry> {};
 
-TEST_P(Catalogue, NamesTheTestAndAnnouncesIt) {
-  gStep = 40;
-  runOneTest(GetParam().number, open());
-  EXPECT_STREQ(gCurTest, GetParam().name);
-  EXPECT_EQ(gStep, 41);
-  EXPECT_EQ(output(), std::string("41, ") + GetParam().stepLine + "\n");
-}
-
-TEST_P(Catalogue, AnnouncesTheTestBeforeTheFirstRequest) {
+TEST_P(Catalogue, PrintsTheStepLineBeforeTheFirstRequest) {
+  first.setPrograms({{"Soft", {0.5F}}});
   VSTWrapper* const live = open();
-  first.answer(effGetVendorString, 1);
-  first.setParameters({0.5F});
-  first.onRequest = [this](const Request&) {
-    EXPECT_EQ(gStep, 1);
+  gStep = 40;
+  first.onRequest = [](const Request&) {
+    EXPECT_EQ(gStep, 41);
     EXPECT_STREQ(gCurTest, GetParam().name);
   };
   runOneTest(GetParam().number, live);
+  EXPECT_EQ(first.requests().empty(), !GetParam().makesRequests);
+  EXPECT_STREQ(gCurTest, GetParam().name);
+  EXPECT_EQ(output(), std::string("41, ") + GetParam().stepLine + "\n");
 }
 
 // The two texts of a test differ on purpose.
 INSTANTIATE_TEST_SUITE_P(Tests, Catalogue,
                          testing::ValuesIn(std::vector<CatalogueEntry>{
-                             {0, "inspect class info test", "inspect class info"},
-                             {1, "inspect preset info test", "inspect preset info"},
-                             {2, "inspect parameter info test", "inspect parameter info"},
-                             {3, "test setting state", "testing setting states"},
-                             {4, "inspect latency test", "inspect latency"},
-                             {5, "inspect io config", "inspect stream format"},
+                             {0, "inspect class info test", "inspect class info", true},
+                             {1, "inspect preset info test", "inspect preset info", true},
+                             {2, "inspect parameter info test", "inspect parameter info", true},
+                             {3, "test setting state", "testing setting states", true},
+                             {4, "inspect latency test", "inspect latency", true},
+                             {5, "inspect io config", "inspect stream format", false},
                          }),
                          [](const auto& tested) { return "Test" + std::to_string(tested.param.number); });
 
@@ -67,100 +67,59 @@ class RunOneTest : public InstanceFixture {
   }
 };
 
-TEST_F(RunOneTest, ANumberOutsideTheCatalogueDoesNothing) {
+TEST_F(RunOneTest, DoesNothingForANumberOutsideTheCatalogue) {
   VSTWrapper* const live = open();
-  gStep = 3;
-  gCurTest = "as it was";
-  for (const int number : {6, -1, 7, INT_MAX, INT_MIN}) {
-    runOneTest(number, live);
-    runOneTest(number, nullptr);
-  }
-  EXPECT_EQ(gStep, 3);
-  EXPECT_STREQ(gCurTest, "as it was");
+  gCurTest = "unchanged";
+  for (const int number : {6, -1, INT_MAX, INT_MIN}) runOneTest(number, live);
+  runOneTest(6, nullptr);
+  EXPECT_EQ(gStep, 0);
+  EXPECT_STREQ(gCurTest, "unchanged");
   EXPECT_EQ(output(), "");
   EXPECT_THAT(first.requests(), IsEmpty());
 }
 
 // ---- Test 0 ----
 
-const Requests kCapabilityQuestions = {canDo("sendVstMidiEvent"),   canDo("receiveVstMidiEvent"),
-                                       canDo("receiveVstTimeInfo"), canDo("offline"),
-                                       canDo("midiProgramNames"),   canDo("bypass")};
-
-const Requests kNameQuestions = {request(effGetEffectName), request(effGetVendorString),
-                                 request(effGetPlugCategory)};
-
-TEST_F(RunOneTest, ClassInfoAsksForNamesPinsAndCapabilities) {
-  first.setText(effGetEffectName, "Chorus");
-  first.setText(effGetVendorString, "Maker");
-  first.aeffect.numInputs = 2;
-  first.aeffect.numOutputs = 3;
-  EXPECT_THAT(
-      requestsOfTest(0),
-      ElementsAreArray(conversation({kNameQuestions,
-                                     {request(effGetInputProperties, 0), request(effGetInputProperties, 1),
-                                      request(effGetOutputProperties, 0), request(effGetOutputProperties, 1),
-                                      request(effGetOutputProperties, 2)},
-                                     kCapabilityQuestions})));
-}
-
-TEST_F(RunOneTest, ClassInfoAsksForTheFirstOutputOfAPluginWithoutOutputs) {
-  first.setText(effGetEffectName, "Chorus");
+TEST_F(RunOneTest, ClassInfoAsksAboutOutput0OfAPluginWithoutOutputs) {
   for (const VstInt32 none : {0, -4}) {
     first.aeffect.numInputs = none;
     first.aeffect.numOutputs = none;
-    EXPECT_THAT(requestsOfTest(0),
-                ElementsAreArray(conversation(
-                    {kNameQuestions, {request(effGetOutputProperties, 0)}, kCapabilityQuestions})));
+    requestsOfTest(0);
+    EXPECT_THAT(first.requestsOf({effGetInputProperties, effGetOutputProperties}),
+                ElementsAre(request(effGetOutputProperties, 0)));
   }
 }
 
-TEST_F(RunOneTest, ClassInfoClearsThePinRecordBeforeEveryQuestion) {
+TEST_F(RunOneTest, ClassInfoClearsThePinRecordBeforeEveryRequest) {
   VstPinProperties full;
   std::memset(&full, 'x', sizeof full);
   first.aeffect.numInputs = 2;
+  first.aeffect.numOutputs = 2;
   first.setInputProperties(0, full);
+  first.setOutputProperties(0, full);
   requestsOfTest(0);
   EXPECT_THAT(first.requestsOf({effGetInputProperties, effGetOutputProperties}),
               ElementsAre(request(effGetInputProperties, 0), request(effGetInputProperties, 1),
-                          request(effGetOutputProperties, 0)));
+                          request(effGetOutputProperties, 0), request(effGetOutputProperties, 1)));
 }
 
 // ---- Test 1 ----
 
-const Requests kCurrentName = {request(effGetProgramName), request(effGetProgram)};
-
-// One program of the walk that is current already: it is not selected, and named twice.
-const Requests kCurrentProgramOfTheWalk =
-    conversation({{request(effGetProgram)},  // select: it is the current one
-                  {request(effGetProgram)},
-                  kCurrentName,  // its name
-                  {request(effGetProgram)},
-                  kCurrentName});  // give it back: it has this name
-
-TEST_F(RunOneTest, PresetInfoVisitsEveryProgramAndStaysOnTheLast) {
-  first.setPrograms({{"Soft", {}}, {"Loud", {}}, {"Wild", {}}});
-  EXPECT_THAT(requestsOfTest(1), ElementsAreArray(conversation({{request(effGetProgram)},
-                                                                kCurrentName,
-                                                                kCurrentProgramOfTheWalk,
-                                                                {request(effGetProgram), setProgram(1)},
-                                                                {request(effGetProgram)},
-                                                                kCurrentName,
-                                                                {request(effGetProgram)},
-                                                                kCurrentName,
-                                                                {request(effGetProgram), setProgram(2)},
-                                                                {request(effGetProgram)},
-                                                                kCurrentName,
-                                                                {request(effGetProgram)},
-                                                                kCurrentName})));
-  EXPECT_EQ(first.currentProgram, 2);
+TEST_F(RunOneTest, PresetInfoOfAPluginWithoutProgramsAsksOnlyForTheCurrentOne) {
+  for (const VstInt32 none : {0, -2}) {
+    first.aeffect.numPrograms = none;
+    EXPECT_THAT(requestsOfTest(1),
+                ElementsAre(request(effGetProgram), request(effGetProgramName), request(effGetProgram)));
+  }
 }
 
-TEST_F(RunOneTest, PresetInfoOfAPluginWithoutProgramsAsksOnlyForTheCurrentOne) {
-  first.setPrograms({});
-  EXPECT_THAT(requestsOfTest(1), ElementsAreArray(conversation({{request(effGetProgram)}, kCurrentName})));
-  first.aeffect.numPrograms = -2;
-  EXPECT_THAT(requestsOfTest(1), ElementsAreArray(conversation({{request(effGetProgram)}, kCurrentName})));
+TEST_F(RunOneTest, PresetInfoReadsTheProgramCountBeforeTheFirstRequest) {
+  VSTWrapper* const live = open();
+  first.setPrograms({{"Soft", {}}, {"Loud", {}}, {"Wild", {}}});
+  first.aeffect.numPrograms = 2;
+  first.onRequest = [this](const Request&) { first.aeffect.numPrograms = 3; };
+  runOneTest(1, live);
+  EXPECT_THAT(first.requestsOf(effSetProgram), ElementsAre(setProgram(1)));
 }
 
 TEST_F(RunOneTest, PresetInfoGivesAProgramTheNameThatItReported) {
@@ -173,58 +132,104 @@ TEST_F(RunOneTest, PresetInfoGivesAProgramTheNameThatItReported) {
     }
   };
   runOneTest(1, live);
-  // Take 1 is the query before the walk, take 2 the name reported, take 3 the name at the renaming.
+  // The first answer is to the query before the programs, the third to the comparison before the renaming.
   EXPECT_THAT(first.requestsOf(effSetProgramName), ElementsAre(setProgramName("Take 2")));
 }
 
 // ---- Test 2 ----
 
-TEST_F(RunOneTest, ParameterInfoGoesThroughEveryParameter) {
-  first.setParameters({0.5F, 0.25F});
-  first.answerAt(effString2Parameter, 1, 1);
-  first.setTextAt(effGetParamDisplay, 1, "-6 dB");
-  EXPECT_THAT(
-      requestsOfTest(2),
-      ElementsAre(getParameterOf(0),  // its value
-                  getParameterOf(0),  // written back: it has this value
-                  request(effGetParamName, 0), request(effGetParamLabel, 0), request(effGetParamDisplay, 0),
-                  canParameterBeSetFromText(0),                                          // it cannot
-                  request(effCanBeAutomated, 0), request(effGetParameterProperties, 0),  //
-                  getParameterOf(1), getParameterOf(1), request(effGetParamName, 1),
-                  request(effGetParamLabel, 1), request(effGetParamDisplay, 1), canParameterBeSetFromText(1),
-                  setParameterFromText(1, "-6 dB"), request(effCanBeAutomated, 1),
-                  request(effGetParameterProperties, 1)));
-}
-
 TEST_F(RunOneTest, ParameterInfoWritesBackTheValueThatItRead) {
-  // A value that equals none, not even itself, is always sent.
+  // A value that is not equal to itself is always sent; others are not sent when the plug-in has them
+  // already.
   const float nan = std::numeric_limits<float>::quiet_NaN();
   first.setParameters({nan, 0.25F});
   requestsOfTest(2);
   EXPECT_THAT(first.parameterWrites(), ElementsAre(setParameterTo(0, nan)));
 }
 
-TEST_F(RunOneTest, ParameterInfoOfAPluginWithoutParametersAsksNothing) {
-  EXPECT_THAT(requestsOfTest(2), IsEmpty());
-  first.aeffect.numParams = -1;
-  EXPECT_THAT(requestsOfTest(2), IsEmpty());
-}
-
-// ---- Tests 4 and 5 ----
-
-TEST_F(RunOneTest, LatencyAsksForTheTailSize) {
-  EXPECT_THAT(requestsOfTest(4), ElementsAre(request(effGetTailSize)));
-}
-
-TEST_F(RunOneTest, StreamFormatMakesNoRequest) {
-  for (const VstInt32 flags : {0, 256}) {
-    first.aeffect.flags = flags;
-    for (const VstInt32 pins : {0, 1, 2, 8}) {
-      first.aeffect.numInputs = pins;
-      first.aeffect.numOutputs = pins;
-      EXPECT_THAT(requestsOfTest(5), IsEmpty()) << flags << ' ' << pins;
-    }
+TEST_F(RunOneTest, ParameterInfoOfAPluginWithoutParametersMakesNoRequest) {
+  for (const VstInt32 none : {0, -1}) {
+    first.aeffect.numParams = none;
+    EXPECT_THAT(requestsOfTest(2), IsEmpty());
   }
+}
+
+// ---- Test 3 ----
+
+// A request, and the wrapper's flags during it: opcode, value, mainsOn, bypassed.
+using FlagsAtRequest = std::tuple<VstInt32, VstIntPtr, bool, bool>;
+
+TEST_F(RunOneTest, SettingStateChangesTheFlagsBetweenTheseRequests) {
+  VSTWrapper* const live = open();
+  std::vector<FlagsAtRequest> seen;
+  first.onRequest = [&](const Request& received) {
+    if (received.opcode == effSetBlockSize || received.opcode == effMainsChanged ||
+        received.opcode == effSetBypass) {
+      seen.emplace_back(received.opcode, received.value, live->mainsOn, live->bypassed);
+    }
+  };
+  runOneTest(3, live);
+  EXPECT_THAT(seen, ElementsAre(FlagsAtRequest{11, 512, false, false},  //
+                                FlagsAtRequest{12, 1, false, false},
+                                FlagsAtRequest{44, 1, true, true},   // On purpose: bypassed already.
+                                FlagsAtRequest{44, 0, true, false},  // On purpose: no longer bypassed.
+                                FlagsAtRequest{12, 0, true, false}));
+  EXPECT_FALSE(live->mainsOn);
+  EXPECT_FALSE(live->bypassed);
+}
+
+// ---- Test 5 ----
+
+struct VariantsCase {
+  const char* name;
+  VstInt32 flags;  // 256 marks an instrument.
+  VstInt32 inputs;
+  VstInt32 outputs;
+  bool hasVariants;
+};
+
+class StreamFormat : public RunOneTest, public testing::WithParamInterface<VariantsCase> {};
+
+// A list with variants needs memory, so without memory the test fails exactly when it builds one.
+TEST_P(StreamFormat, BuildsTheVariantsAndOffersNone) {
+  first.aeffect.flags = GetParam().flags;
+  first.aeffect.numInputs = GetParam().inputs;
+  first.aeffect.numOutputs = GetParam().outputs;
+  EXPECT_THAT(requestsOfTest(5), IsEmpty());
+  bool wasMemoryMissing = false;
+  try {
+    const preset_tests::ScarceMemory none(0);
+    runOneTest(5, wrapper.get());
+  } catch (const std::bad_alloc&) {
+    wasMemoryMissing = true;
+  }
+  EXPECT_EQ(wasMemoryMissing, GetParam().hasVariants);
+}
+
+INSTANTIATE_TEST_SUITE_P(Plugins, StreamFormat,
+                         testing::ValuesIn(std::vector<VariantsCase>{
+                             {"StereoEffect", 0, 2, 2, true},
+                             {"MonoEffect", 0, 1, 1, false},
+                             {"EffectWithoutInputs", 0, 0, 2, false},
+                             {"Instrument", 256, 0, 2, true},
+                             {"InstrumentAmongOtherFlags", 0x7FFFFFFF, 0, 2, true},
+                             {"AllFlagsButTheInstrument", ~256, 0, 2, false},
+                         }),
+                         [](const auto& tested) { return tested.param.name; });
+
+TEST_F(InstanceFixture, OfferVariantsSetsTheArrangementsOfEachAcceptedVariantInListOrder) {
+  VSTWrapper* const live = open();
+  std::vector<std::pair<VstInt32, VstInt32>> offered;  // Arrangement types, in and out.
+  first.onRequest = [&](const Request& received) {
+    const auto* in = reinterpret_cast<const VstSpeakerArrangement*>(received.value);
+    const auto* out = static_cast<const VstSpeakerArrangement*>(received.pointee.address);
+    offered.emplace_back(in->type, out->type);
+  };
+  const std::vector<PrototypeVSTVariant>& rows = GetPrototypeVariants();
+  offerVariants(*live, {VSTVariant(rows[10]), VSTVariant(rows[2], {2, 0}, {2, 0}), VSTVariant(rows[28]),
+                        VSTVariant(rows[10])});
+  EXPECT_THAT(offered, ElementsAre(Pair(1, 10), Pair(-1, 22), Pair(1, 10)));
+  EXPECT_EQ(first.requestsOf(effGetSpeakerArrangement).size(), 3U);
 }
 
 }  // namespace

@@ -6,13 +6,13 @@
 
 std::clock_t scriptedClock = 0;
 std::vector<int> scriptedDraws;
-std::vector<unsigned> seedsSown;
+std::vector<unsigned> seeds;
 int drawsMade = 0;
 
 void resetRandom() {
   scriptedClock = 0;
   scriptedDraws.clear();
-  seedsSown.clear();
+  seeds.clear();
   drawsMade = 0;
 }
 
@@ -20,7 +20,7 @@ extern "C" {
 
 std::clock_t clock() noexcept { return scriptedClock; }
 
-void srand(unsigned seed) noexcept { seedsSown.push_back(seed); }
+void srand(unsigned seed) noexcept { seeds.push_back(seed); }
 
 int rand() noexcept {
   const auto draw = static_cast<std::size_t>(drawsMade++);

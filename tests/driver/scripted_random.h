@@ -1,20 +1,20 @@
 // SPDX-License-Identifier: MIT
-// The system's random generator and processor clock, as the test scripts them: this test program defines
-// srand, rand and clock itself.
+// A random generator and a processor clock that do what a test tells them: this test program defines srand(),
+// rand() and clock() itself.
 #pragma once
 
 #include <ctime>
 #include <vector>
 
-/// The processor time that clock() answers.
+/// The processor time that clock() returns.
 extern std::clock_t scriptedClock;
 
-/// What rand() answers, in order; 0 from then on.
+/// What rand() returns, in order; then 0.
 extern std::vector<int> scriptedDraws;
 
-/// The seeds that srand() got, and how often rand() was asked.
-extern std::vector<unsigned> seedsSown;
+/// The seeds passed to srand(), and how often rand() was called.
+extern std::vector<unsigned> seeds;
 extern int drawsMade;
 
-/// As at the start of the program: clock 0, no draws, nothing seen.
+/// Clock 0, no scripted draws, no seeds and no calls.
 void resetRandom();

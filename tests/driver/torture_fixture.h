@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: MIT
-// What the tests of the driver start from: plug-ins in this process, and standard output as text.
+// The fixtures of the driver's tests: plug-ins in this process, and standard output as text.
 #pragma once
 
 #include <cstdint>
-#include <initializer_list>
 #include <memory>
 #include <string>
 #include <vector>
@@ -16,13 +15,6 @@
 
 using doubles::Request;
 using Requests = std::vector<Request>;
-
-/// The requests of several parts of a conversation, one after the other.
-inline Requests conversation(std::initializer_list<Requests> parts) {
-  Requests whole;
-  for (const Requests& part : parts) whole.insert(whole.end(), part.begin(), part.end());
-  return whole;
-}
 
 class TortureFixture : public testing::Test {
  protected:
@@ -38,7 +30,7 @@ class TortureFixture : public testing::Test {
     VSTPluginLoader::fLoadedDLLs = decltype(VSTPluginLoader::fLoadedDLLs)();
   }
 
-  /// What was printed; to be called once.
+  /// What was printed. Can be called once.
   std::string output() {
     isOutputTaken = true;
     return testing::internal::GetCapturedStdout();
@@ -53,10 +45,10 @@ class TortureFixture : public testing::Test {
   bool isOutputTaken = false;
 };
 
-/// A live wrapper on the first of the instances.
+/// A live wrapper around `first`.
 class InstanceFixture : public TortureFixture {
  protected:
-  /// Closes the instance while the rest of the test still exists, and without what the test does to requests.
+  /// Closes the instance before the test's other objects are destroyed, without the test's onRequest.
   void TearDown() override {
     first.onRequest = nullptr;
     second.onRequest = nullptr;
@@ -64,7 +56,7 @@ class InstanceFixture : public TortureFixture {
     TortureFixture::TearDown();
   }
 
-  /// Creates the instance from `first` as it is now, and forgets the requests of the creation.
+  /// Creates the instance with the present settings of `first`, and forgets the requests of the creation.
   VSTWrapper* open() {
     module.reset(new VSTPluginLoader(VST_DLL_Info("/test.vst", "test")), NiduCOM::AddRef::kAdopt);
     plugin.willCreate(first);
