@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// What the tests of the description start from: a live wrapper on an instance in this process.
+// The fixture of the tests of describe/: a live wrapper around an instance in this process.
 #pragma once
 
 #include <cstdint>
@@ -10,15 +10,18 @@
 #include "host/vst_wrapper.h"
 #include "tests/shared/in_process_plugin.h"
 
+/// The bundle's identity, without a child.
+inline VST_Class_Spec bundleSpec() { return {VST_DLL_Info("/described.vst", "bundle"), VST_ChildSpec()}; }
+
 class DescribedPlugin : public testing::Test {
  protected:
-  /// Closes the instance while the rest of the test still exists, and without what the test does to requests.
+  /// Closes the instance before the test's other objects are destroyed, without the test's onRequest.
   void TearDown() override {
     effect.onRequest = nullptr;
     wrapper.reset();
   }
 
-  /// Creates the instance from `effect` as it is now, and forgets the requests of the creation.
+  /// Creates the instance with the present settings of `effect`, and forgets the requests of the creation.
   VSTWrapper* open() {
     module.reset(new VSTPluginLoader(VST_DLL_Info("/described.vst", "test")), NiduCOM::AddRef::kAdopt);
     plugin.willCreate(effect);

@@ -8,125 +8,90 @@
 #include "describe/vst_info.h"
 #include "gmock/gmock.h"
 #include "tests/describe/described_plugin.h"
+#include "tests/shared/thrown.h"
 
 namespace {
 
 using namespace doubles;
 using KelVSTInfoCache::VSTInfo;
-using testing::ElementsAre;
+using testing::ElementsAreArray;
 using testing::IsEmpty;
-using testing::Pair;
 using testing::SizeIs;
 
-VST_Class_Spec anySpec() { return {VST_DLL_Info("/described.vst", "bundle"), VST_ChildSpec(0)}; }
-
-std::vector<std::pair<std::int32_t, std::string>> childrenOf(const VSTInfo& info) {
-  std::vector<std::pair<std::int32_t, std::string>> children;
-  for (const VST_ChildSpec& child : info.childIDs) {
-    EXPECT_TRUE(child.hasChildID);
-    children.emplace_back(child.childID, child.childName);
-  }
-  return children;
-}
+using Children = std::vector<ShellChild>;
 
 class Shell : public DescribedPlugin {
  protected:
   Shell() { effect.answer(effGetPlugCategory, 10); }
 
-  // A record of no plug-in, whose list of children is empty.
-  VSTInfo empty{nullptr, anySpec()};
-
-  bool refreshWith(VSTInfo& info, std::vector<ShellChild> children) {
-    if (wrapper == nullptr) open();
-    effect.setShellChildren(std::move(children));
-    return info.refreshChildIDs(wrapper.get());
+  static void expectChildren(const VSTInfo& info, const Children& expected) {
+    std::vector<std::pair<std::int32_t, std::string>> actualPairs;
+    std::vector<std::pair<std::int32_t, std::string>> expectedPairs;
+    for (const VST_ChildSpec& child : info.childIDs) {
+      EXPECT_TRUE(child.hasChildID);
+      actualPairs.emplace_back(child.childID, child.childName);
+    }
+    for (const ShellChild& child : expected) expectedPairs.emplace_back(child.id, child.name);
+    EXPECT_THAT(actualPairs, ElementsAreArray(expectedPairs));
   }
+
+  /// A record without a plug-in, whose list of children is empty.
+  VSTInfo info{nullptr, bundleSpec()};
 };
 
 TEST_F(Shell, IsAskedForItsChildrenAndForNoParameter) {
   effect.setText(effGetEffectName, "Shell");
   effect.setParameters({0.5F, 0.25F});
   effect.setShellChildren({{7, "Seventh"}, {-2, "Minus second"}});
-  const VSTInfo info(open(), anySpec());
-  EXPECT_TRUE(info.isShell);
-  EXPECT_FALSE(info.isSynth);
-  EXPECT_THAT(info.params, IsEmpty());
-  EXPECT_THAT(childrenOf(info), ElementsAre(Pair(7, "Seventh"), Pair(-2, "Minus second")));
-  EXPECT_THAT(effect.requests(),
-              ElementsAre(request(effGetEffectName), request(effGetVendorString), request(effGetVstVersion),
-                          request(effGetPlugCategory), canDo("receiveVstMidiEvent"),
-                          canDo("sendVstMidiEvent"), request(effShellGetNextPlugin),
-                          request(effShellGetNextPlugin), request(effShellGetNextPlugin)));
+  const VSTInfo shell(open(), bundleSpec());
+  EXPECT_THAT(shell.params, IsEmpty());
+  expectChildren(shell, {{7, "Seventh"}, {-2, "Minus second"}});
+  EXPECT_THAT(
+      effect.requests(),
+      ElementsAreArray({request(effGetEffectName), request(effGetVendorString), request(effGetVstVersion),
+                        request(effGetPlugCategory), canDo("receiveVstMidiEvent"), canDo("sendVstMidiEvent"),
+                        request(effShellGetNextPlugin), request(effShellGetNextPlugin),
+                        request(effShellGetNextPlugin)}));
 }
 
-TEST_F(Shell, OnlyAShellIsAskedForChildren) {
-  effect.answer(effGetPlugCategory, 1);
-  effect.setShellChildren({{7, "Seventh"}});
-  const VSTInfo info(open(), anySpec());
-  EXPECT_FALSE(info.isShell);
-  EXPECT_THAT(info.childIDs, IsEmpty());
-  EXPECT_THAT(effect.requestsOf(effShellGetNextPlugin), IsEmpty());
+struct RefreshCase {
+  const char* name;
+  Children before;
+  Children after;
+  bool isChange;
+};
+
+class RefreshChildIDs : public Shell, public testing::WithParamInterface<RefreshCase> {};
+
+TEST_P(RefreshChildIDs, KeepsTheNewListAndTellsWhetherItIsAChange) {
+  open();
+  effect.setShellChildren(GetParam().before);
+  info.refreshChildIDs(wrapper.get());
+  expectChildren(info, GetParam().before);
+  effect.setShellChildren(GetParam().after);
+  EXPECT_EQ(info.refreshChildIDs(wrapper.get()), GetParam().isChange);
+  expectChildren(info, GetParam().after);
 }
 
-TEST_F(Shell, KeepsDuplicatesInThePluginsOrder) {
-  effect.setShellChildren({{9, "A"}, {3, "B"}, {9, "C"}, {3, "B"}});
-  const VSTInfo info(open(), anySpec());
-  EXPECT_THAT(childrenOf(info), ElementsAre(Pair(9, "A"), Pair(3, "B"), Pair(9, "C"), Pair(3, "B")));
-}
+INSTANTIATE_TEST_SUITE_P(
+    Lists, RefreshChildIDs,
+    testing::ValuesIn(std::vector<RefreshCase>{
+        {"FirstChildren", {}, {{9, "A"}, {3, "B"}}, true},
+        {"NoChildrenTwice", {}, {}, false},
+        {"TheSameChildren", {{9, "A"}, {3, "B"}}, {{9, "A"}, {3, "B"}}, false},
+        {"ADroppedChild", {{1, "A"}, {2, "B"}}, {{1, "A"}}, true},
+        {"ANewChild", {{1, "A"}}, {{1, "A"}, {2, "B"}}, true},
+        {"AReplacedChild", {{1, "A"}, {2, "B"}}, {{1, "A"}, {3, "B"}}, true},
+        {"AnotherOrder", {{1, "A"}, {2, "B"}}, {{2, "B"}, {1, "A"}}, false},
+        {"AnotherName", {{1, "A"}}, {{1, "Renamed"}}, false},
+        {"AChildWithoutANameAfterANamedOne", {}, {{1, "A"}, {2, ""}}, true},
+        // The old children count once each, the new ones as often as the plug-in names them.
+        {"TheSameDuplicates", {{1, "A"}, {1, "C"}}, {{1, "A"}, {1, "C"}}, true},
+        {"DuplicatesThatBecomeOneChild", {{1, "A"}, {1, "A"}}, {{1, "A"}}, false},
+    }),
+    [](const auto& tested) { return tested.param.name; });
 
-TEST_F(Shell, AChildWithoutANameDoesNotInheritThePreviousOne) {
-  EXPECT_TRUE(refreshWith(empty, {{1, "First"}, {2, ""}}));
-  EXPECT_THAT(childrenOf(empty), ElementsAre(Pair(1, "First"), Pair(2, "")));
-}
-
-TEST_F(Shell, FirstChildrenAreAChange) { EXPECT_TRUE(refreshWith(empty, {{1, "A"}, {2, "B"}})); }
-
-TEST_F(Shell, TheSameChildrenAreNoChange) {
-  refreshWith(empty, {{1, "A"}, {2, "B"}});
-  EXPECT_FALSE(refreshWith(empty, {{1, "A"}, {2, "B"}}));
-  EXPECT_THAT(childrenOf(empty), ElementsAre(Pair(1, "A"), Pair(2, "B")));
-}
-
-TEST_F(Shell, ADroppedChildIsAChange) {
-  refreshWith(empty, {{1, "A"}, {2, "B"}});
-  EXPECT_TRUE(refreshWith(empty, {{1, "A"}}));
-  EXPECT_THAT(childrenOf(empty), ElementsAre(Pair(1, "A")));
-}
-
-TEST_F(Shell, AReplacedChildIsAChange) {
-  refreshWith(empty, {{1, "A"}, {2, "B"}});
-  EXPECT_TRUE(refreshWith(empty, {{1, "A"}, {3, "B"}}));
-}
-
-TEST_F(Shell, AnotherOrderIsNoChange) {
-  refreshWith(empty, {{1, "A"}, {2, "B"}});
-  EXPECT_FALSE(refreshWith(empty, {{2, "B"}, {1, "A"}}));
-  EXPECT_THAT(childrenOf(empty), ElementsAre(Pair(2, "B"), Pair(1, "A")));
-}
-
-TEST_F(Shell, AnotherNameIsNoChange) {
-  refreshWith(empty, {{1, "A"}});
-  EXPECT_FALSE(refreshWith(empty, {{1, "Renamed"}}));
-  EXPECT_THAT(childrenOf(empty), ElementsAre(Pair(1, "Renamed")));
-}
-
-TEST_F(Shell, NoChildrenTwiceAreNoChange) {
-  EXPECT_FALSE(refreshWith(empty, {}));
-  EXPECT_THAT(effect.requestsOf(effShellGetNextPlugin), SizeIs(1));
-}
-
-// The former children count once each, the new ones as often as they are named.
-TEST_F(Shell, DuplicatesAreAChangeEveryTime) {
-  refreshWith(empty, {{1, "A"}, {1, "A"}});
-  EXPECT_TRUE(refreshWith(empty, {{1, "A"}, {1, "A"}}));
-}
-
-TEST_F(Shell, DuplicatesThatBecomeOneAreNoChange) {
-  refreshWith(empty, {{1, "A"}, {1, "A"}});
-  EXPECT_FALSE(refreshWith(empty, {{1, "A"}}));
-}
-
-// ---- Shells of many children, whose requests are not recorded ----
+// ---- Shells with so many children that the requests are not recorded ----
 
 std::int64_t childrenLeft = 0;
 
@@ -149,20 +114,16 @@ class LargeShell : public Shell {
   AEffectDispatcherProc recordingDispatcher;
 };
 
-TEST_F(LargeShell, MayHaveAHundredThousandChildren) {
-  childrenLeft = 100000;
-  EXPECT_TRUE(empty.refreshChildIDs(wrapper.get()));
-  EXPECT_THAT(empty.childIDs, SizeIs(100000));
+TEST_F(LargeShell, MayHave1048576Children) {
+  childrenLeft = 1048576;
+  EXPECT_TRUE(info.refreshChildIDs(wrapper.get()));
+  EXPECT_THAT(info.childIDs, SizeIs(1048576));
 }
 
-TEST_F(LargeShell, ThatNeverStopsIsMinusOne) {
-  childrenLeft = INT64_MAX;
-  try {
-    empty.refreshChildIDs(wrapper.get());
-    ADD_FAILURE() << "nothing was thrown";
-  } catch (int thrown) {
-    EXPECT_EQ(thrown, -1);
-  }
+TEST_F(LargeShell, ThrowsMinusOneWithOneChildMore) {
+  childrenLeft = 1048577;
+  EXPECT_EQ(thrownInt([&] { info.refreshChildIDs(wrapper.get()); }), -1);
+  EXPECT_EQ(childrenLeft, 0);
 }
 
 }  // namespace

@@ -1,13 +1,15 @@
 // SPDX-License-Identifier: MIT
-// The description of a plug-in: what is asked, what is kept, and the record that is made without a plug-in.
+// The description of a plug-in: the requests, the record, and the record that is made without a plug-in.
+#include <climits>
 #include <cstdint>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
 #include "describe/vst_info.h"
 #include "gmock/gmock.h"
 #include "tests/describe/described_plugin.h"
+#include "tests/shared/scarce_memory.h"
+#include "tests/shared/thrown.h"
 
 namespace {
 
@@ -17,10 +19,10 @@ using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::SizeIs;
 
-VST_Class_Spec bundleSpec() { return {VST_DLL_Info("/described.vst", "bundle"), VST_ChildSpec()}; }
+using Rows = std::vector<std::int32_t>;
 
-std::vector<std::int32_t> rowsOf(const VSTInfo& info) {
-  std::vector<std::int32_t> rows;
+Rows rowsOf(const VSTInfo& info) {
+  Rows rows;
   for (const VSTVariant& variant : info.variants) rows.push_back(variant.variantID);
   return rows;
 }
@@ -40,9 +42,9 @@ class VSTInfoTest : public DescribedPlugin {
   VSTInfo describe() { return VSTInfo(open(), bundleSpec()); }
 };
 
-TEST_F(VSTInfoTest, AsksAnEffectTheseQuestions) {
+TEST_F(VSTInfoTest, MakesTheseRequestsOfAnEffectAndKeepsTheAnswers) {
   effect.setParameters({0.5F, 0.25F});
-  describe();
+  const VSTInfo info = describe();
   EXPECT_THAT(
       effect.requests(),
       ElementsAre(request(effGetEffectName), request(effGetVendorString), request(effGetVstVersion),
@@ -51,57 +53,56 @@ TEST_F(VSTInfoTest, AsksAnEffectTheseQuestions) {
                   request(effCanBeAutomated, 0), request(effGetParameterProperties, 0),  //
                   getParameterOf(1), request(effGetParamName, 1), request(effGetParamLabel, 1),
                   request(effCanBeAutomated, 1), request(effGetParameterProperties, 1)));
-}
-
-TEST_F(VSTInfoTest, KeepsWhatAnEffectAnswers) {
-  effect.setParameters({0.5F, 0.25F});
-  const VSTInfo info = describe();
   EXPECT_EQ(info.effectName, "Chorus");
   EXPECT_EQ(info.vendorName, "Maker");
   EXPECT_EQ(info.uniqueID, 0x43686F72);
   EXPECT_EQ(info.dllTag, 0);
   EXPECT_EQ(info.vstVersion, 2300);
   EXPECT_EQ(info.statusFlags, 1U);
-  EXPECT_FALSE(info.isSynth);
   EXPECT_FALSE(info.receivesMidi);
   EXPECT_FALSE(info.sendsMidi);
-  EXPECT_FALSE(info.isShell);
   EXPECT_FALSE(info.hasEditor);
   EXPECT_FALSE(info.wrapperFlag);
   ASSERT_THAT(info.params, SizeIs(2));
   EXPECT_EQ(info.params[0].paramIndex, 0);
   EXPECT_EQ(info.params[1].paramIndex, 1);
   EXPECT_EQ(info.params[1].currentValue, 0.25);
-  EXPECT_THAT(info.childIDs, IsEmpty());
   EXPECT_THAT(rowsOf(info), ElementsAre(0, 1, 2));
 }
 
-TEST_F(VSTInfoTest, AsksAnInstrumentWithoutNamesForTheProductToo) {
-  RecordingEffect silent;
-  silent.answer(effGetPlugCategory, 2);
-  silent.aeffect.numOutputs = 2;
-  module.reset(new VSTPluginLoader(VST_DLL_Info("/described.vst", "test")), NiduCOM::AddRef::kAdopt);
-  plugin.willCreate(silent);
-  const std::unique_ptr<VSTWrapper> live(VSTWrapper::New(module, VST_ChildSpec(VST_loadID{}), nullptr));
-  silent.forget();
-  const VSTInfo info(live.get(), bundleSpec());
-  EXPECT_THAT(silent.requests(),
-              ElementsAre(request(effGetEffectName), request(effGetProductString),
-                          request(effGetVendorString), request(effGetVstVersion), request(effGetPlugCategory),
-                          canDo("receiveVstMidiEvent"), canDo("sendVstMidiEvent")));
-  EXPECT_EQ(info.effectName, "test");
-  EXPECT_EQ(info.vendorName, "unknown");
-  EXPECT_EQ(info.vstVersion, 0);
-  EXPECT_TRUE(info.isSynth);
-  EXPECT_THAT(info.params, IsEmpty());
-  EXPECT_THAT(rowsOf(info), ElementsAre(21, 22));
-}
+struct CategoryCase {
+  VstIntPtr category;
+  bool isSynth;
+  bool isShell;
+};
 
-TEST_F(VSTInfoTest, AnInstrumentIsOneByCategoryAndNotByFlag) {
-  effect.aeffect.flags = 256;
+class CategoryOf : public VSTInfoTest, public testing::WithParamInterface<CategoryCase> {};
+
+TEST_P(CategoryOf, DecidesWhatThePluginIsAndNotItsFlags) {
+  effect.answer(effGetPlugCategory, GetParam().category);
+  effect.aeffect.flags = GetParam().isSynth ? 0 : 256;
+  effect.setParameters({0.5F});
+  effect.setShellChildren({{7, "Seventh"}});
   const VSTInfo info = describe();
-  EXPECT_FALSE(info.isSynth);
-  EXPECT_THAT(rowsOf(info), ElementsAre(0, 1, 2));
+  EXPECT_EQ(info.isSynth, GetParam().isSynth);
+  EXPECT_EQ(info.isShell, GetParam().isShell);
+  EXPECT_EQ(rowsOf(info), GetParam().isSynth ? (Rows{21, 22}) : (Rows{0, 1, 2}));
+  EXPECT_THAT(info.params, SizeIs(GetParam().isShell ? 0 : 1));
+  EXPECT_THAT(info.childIDs, SizeIs(GetParam().isShell ? 1 : 0));
+}
+
+INSTANTIATE_TEST_SUITE_P(Categories, CategoryOf,
+                         testing::Values(CategoryCase{1, false, false}, CategoryCase{2, true, false},
+                                         CategoryCase{3, false, false}, CategoryCase{9, false, false},
+                                         CategoryCase{10, false, true}, CategoryCase{11, false, false}),
+                         [](const auto& tested) {
+                           return "Category" + std::to_string(tested.param.category);
+                         });
+
+TEST_F(VSTInfoTest, KeepsTheLow32BitsOfTheVersion) {
+  // In a 32-bit build the answer is 2400 from the start.
+  effect.answer(effGetVstVersion, static_cast<VstIntPtr>(0x500000960));
+  EXPECT_EQ(describe().vstVersion, 2400);
 }
 
 TEST_F(VSTInfoTest, CopiesTheBundlesTag) {
@@ -112,7 +113,7 @@ TEST_F(VSTInfoTest, CopiesTheBundlesTag) {
   EXPECT_EQ(module->refCount, references);
 }
 
-TEST_F(VSTInfoTest, SeesTheEditorInTheFlags) {
+TEST_F(VSTInfoTest, HasAnEditorWithBitZeroOfTheFlags) {
   effect.aeffect.flags = 0x7FFFFFFE;
   EXPECT_FALSE(describe().hasEditor);
   effect.aeffect.flags = 1;
@@ -120,34 +121,25 @@ TEST_F(VSTInfoTest, SeesTheEditorInTheFlags) {
 }
 
 TEST_F(VSTInfoTest, CopiesTheWrappersFlag) {
-  VSTWrapper* const live = open();
-  live->auxFlag = true;
-  EXPECT_TRUE(VSTInfo(live, bundleSpec()).wrapperFlag);
+  open()->auxFlag = true;
+  EXPECT_TRUE(VSTInfo(wrapper.get(), bundleSpec()).wrapperFlag);
 }
 
-TEST_F(VSTInfoTest, ReceivesMidiByItsOwnAnswer) {
-  effect.setCapability("receiveVstMidiEvent", 1);
-  const VSTInfo info = describe();
-  EXPECT_TRUE(info.receivesMidi);
-  EXPECT_FALSE(info.sendsMidi);
+TEST_F(VSTInfoTest, ReceivesOrSendsMidiWithAnyAnswerButZero) {
+  for (const VstIntPtr yes : {1, -1}) {  // On purpose: -1, the answer "no", counts as well.
+    effect.setCapability("receiveVstMidiEvent", yes);
+    effect.setCapability("sendVstMidiEvent", 0);
+    const VSTInfo receiver = describe();
+    EXPECT_TRUE(receiver.receivesMidi);
+    EXPECT_FALSE(receiver.sendsMidi);
+    effect.setCapability("receiveVstMidiEvent", 0);
+    effect.setCapability("sendVstMidiEvent", yes);
+    const VSTInfo sender = describe();
+    EXPECT_FALSE(sender.receivesMidi);
+    EXPECT_TRUE(sender.sendsMidi);
+  }
 }
 
-TEST_F(VSTInfoTest, SendsMidiByItsOwnAnswer) {
-  effect.setCapability("sendVstMidiEvent", 1);
-  const VSTInfo info = describe();
-  EXPECT_FALSE(info.receivesMidi);
-  EXPECT_TRUE(info.sendsMidi);
-}
-
-TEST_F(VSTInfoTest, CountsMinusOneAsAble) {
-  effect.setCapability("receiveVstMidiEvent", -1);
-  effect.setCapability("sendVstMidiEvent", -1);
-  const VSTInfo info = describe();
-  EXPECT_TRUE(info.receivesMidi);
-  EXPECT_TRUE(info.sendsMidi);
-}
-
-// The instance's own fields are read where they stand in the order of questions.
 TEST_F(VSTInfoTest, ReadsTheIdentifierBeforeTheVersionAndTheFlagsAfterTheCategory) {
   VSTWrapper* const live = open();
   effect.onRequest = [this](const Request& received) {
@@ -177,24 +169,58 @@ TEST_F(VSTInfoTest, RefreshingClearsOneBitOfTheStatus) {
   EXPECT_EQ(info.statusFlags, 0xFFEFFFFF);
 }
 
-TEST_F(VSTInfoTest, CopiesAreIndependent) {
-  effect.setParameters({0.5F});
-  const VSTInfo info = describe();
-  VSTInfo copy(info);
-  copy.effectName = "changed";
-  copy.params[0].paramName.text = "changed";
-  copy.variants.clear();
-  EXPECT_EQ(info.effectName, "Chorus");
-  EXPECT_EQ(info.params[0].paramName.text, "");
-  EXPECT_THAT(rowsOf(info), ElementsAre(0, 1, 2));
-  copy = info;
-  EXPECT_EQ(copy.effectName, "Chorus");
-  EXPECT_THAT(rowsOf(copy), ElementsAre(0, 1, 2));
+// ---- Parameter counts ----
+
+TEST_F(VSTInfoTest, ReadsTheParameterCountBeforeEachParameter) {
+  for (const VstInt32 changed : {1, 3}) {
+    effect.setParameters({0.0F, 0.0F});
+    effect.onRequest = [&](const Request& received) {
+      if (received.opcode == effGetParamName) effect.aeffect.numParams = changed;
+    };
+    EXPECT_THAT(describe().params, SizeIs(changed));
+  }
+}
+
+TEST_F(VSTInfoTest, HasNoParametersWhenTheCountIsNegative) {
+  for (const VstInt32 count : {-1, INT_MIN}) {
+    effect.aeffect.numParams = count;
+    EXPECT_THAT(describe().params, IsEmpty());
+  }
+}
+
+TEST_F(VSTInfoTest, ThrowsMinusOneBeforeTheFirstOfMoreParametersThanMemoryHolds) {
+  effect.aeffect.numParams = INT_MAX;
+  open();
+  const preset_tests::ScarceMemory oneGibibyte(std::size_t{1} << 30);
+  EXPECT_EQ(thrownInt([&] { VSTInfo(wrapper.get(), bundleSpec()); }), -1);
+  EXPECT_THAT(effect.parameterReads(), IsEmpty());
 }
 
 // ---- Invalid records ----
 
-void expectPlaceholders(const VSTInfo& info) {
+TEST(VSTInfoWithoutAPlugin, IsNamedAfterTheChildAndHasOneAcceptedVariant) {
+  VST_Class_Spec spec = bundleSpec();
+  spec.child = VST_ChildSpec(7);
+  spec.child.childName = "Seventh";
+  const VSTInfo info(nullptr, spec);
+  EXPECT_EQ(info.effectName, "Seventh");
+  EXPECT_EQ(info.vstVersion, 2400);
+  ASSERT_THAT(rowsOf(info), ElementsAre(0));
+  EXPECT_TRUE(info.variants[0].accepted);
+}
+
+TEST_F(VSTInfoTest, BecomingInvalidSetsEverythingButTheFormerVariants) {
+  effect.setParameters({0.5F});
+  effect.answer(effGetPlugCategory, 2);
+  effect.setCapability("receiveVstMidiEvent", 1);
+  effect.setCapability("sendVstMidiEvent", 1);
+  VSTInfo info = describe();
+  info.dllTag = 5;
+  info.isShell = true;
+  info.statusFlags = 0xFFFFFFFF;
+  info.childIDs.emplace_back(7);
+  info.setToInvalid(bundleSpec());
+  EXPECT_EQ(info.effectName, "bundle");
   EXPECT_EQ(info.vendorName, "unknown");
   EXPECT_EQ(info.uniqueID, 0);
   EXPECT_EQ(info.dllTag, 0);
@@ -208,42 +234,7 @@ void expectPlaceholders(const VSTInfo& info) {
   EXPECT_TRUE(info.wrapperFlag);
   EXPECT_THAT(info.params, IsEmpty());
   EXPECT_THAT(info.childIDs, IsEmpty());
-}
-
-TEST(VSTInfoWithoutAPlugin, HoldsPlaceholders) {
-  const VSTInfo info(nullptr, bundleSpec());
-  EXPECT_EQ(info.effectName, "bundle");
-  expectPlaceholders(info);
-  ASSERT_THAT(info.variants, SizeIs(1));
-  const VSTVariant& variant = info.variants[0];
-  EXPECT_EQ(variant.variantID, 0);
-  EXPECT_EQ(variant.numIns, 1);
-  EXPECT_EQ(variant.numOuts, 1);
-  EXPECT_TRUE(variant.accepted);
-}
-
-TEST(VSTInfoWithoutAPlugin, IsNamedAfterTheChildThatIsWanted) {
-  VST_Class_Spec spec = bundleSpec();
-  spec.child = VST_ChildSpec(7);
-  spec.child.childName = "Seventh";
-  EXPECT_EQ(VSTInfo(nullptr, spec).effectName, "Seventh");
-}
-
-TEST_F(VSTInfoTest, BecomingInvalidClearsAllButTheVariants) {
-  effect.setParameters({0.5F});
-  effect.answer(effGetPlugCategory, 2);
-  effect.setCapability("receiveVstMidiEvent", 1);
-  effect.setCapability("sendVstMidiEvent", 1);
-  VSTInfo info = describe();
-  info.dllTag = 5;
-  info.isShell = true;
-  info.statusFlags = 0xFFFFFFFF;
-  info.childIDs.emplace_back(7);
-  ASSERT_THAT(rowsOf(info), ElementsAre(21, 22));
-  info.setToInvalid(bundleSpec());
-  EXPECT_EQ(info.effectName, "bundle");
-  expectPlaceholders(info);
-  EXPECT_THAT(rowsOf(info), ElementsAre(21, 22, 0));
+  ASSERT_THAT(rowsOf(info), ElementsAre(21, 22, 0));
   EXPECT_FALSE(info.variants[1].accepted);
   EXPECT_TRUE(info.variants[2].accepted);
 }

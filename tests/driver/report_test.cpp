@@ -82,12 +82,13 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(PipedReport, CountsStepLinesOnly) {
   gStep = 0;
+  gCurTest = "gather info";
   printTotal(64);
   printStep("initialize");
   printFailure(5);
   printStep("inspect class info");
   EXPECT_EQ(gStep, 2);
-  EXPECT_EQ(received(), "total, 64\n1, initialize\n! failed 5\n2, inspect class info\n");
+  EXPECT_EQ(received(), "total, 64\n1, initialize\n!gather info failed 5\n2, inspect class info\n");
 }
 
 }  // namespace
