@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: MIT
-// Fuzz target: preset and bank data from nowhere, loaded into a plug-in whose numbers are from nowhere too.
+// Fuzz target: loads arbitrary preset and bank data into a plug-in with arbitrary flags and counts.
 //
-// Input: five bytes of plug-in (flags, programs, parameters, current program and bits: 1 names its programs
-// by index, 2 does not select programs), then the data. The counts are signed bytes. The memory goes on for
-// 512 bytes behind the data, since sizes, names and values are read without a look at where the data ends;
-// whatever reads further is a find.
+// The input begins with five bytes for the plug-in: its flags, its numbers of programs and parameters and its
+// current program as signed bytes, and a byte of bits (1: it names programs by their index, 2: it does not
+// select programs). The data follows. The host reads sizes, names and values without checking where the data
+// ends, so 512 further bytes follow the data; a read behind them is an error.
 //
-// A bank may claim two thousand million programs, all in the same place, so the plug-in throws after some
-// thousand requests. Whatever state is reached: what is saved then as a program can be loaded again.
+// A bank may claim 2^31 - 1 programs, all in the same place, so the plug-in throws after 3000 requests. In
+// whatever state the plug-in is then, the host must be able to load the program that it saves.
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
@@ -23,12 +23,12 @@
 namespace {
 
 constexpr std::size_t kPluginBytes = 5;
-constexpr std::size_t kSlack = 512;
+constexpr std::size_t kReadableBytesBehindData = 512;
 constexpr int kMostRequests = 3000;
 
-struct GivesUp {};
+struct TooManyRequests {};
 
-void shape(doubles::RecordingEffect& effect, const std::uint8_t* bytes) {
+void setUp(doubles::RecordingEffect& effect, const std::uint8_t* bytes) {
   effect.aeffect.flags = bytes[0];
   effect.aeffect.numPrograms = static_cast<std::int8_t>(bytes[1]);
   effect.aeffect.numParams = static_cast<std::int8_t>(bytes[2]);
@@ -58,17 +58,17 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* input, std::size_t siz
   const std::unique_ptr<VSTWrapper> wrapper(VSTWrapper::New(loader, VST_ChildSpec(), nullptr));
   if (wrapper == nullptr) std::abort();
 
-  shape(effect, input);
+  setUp(effect, input);
   const std::size_t dataSize = size - kPluginBytes;
-  const auto data = std::make_unique<char[]>(dataSize + kSlack);
+  const auto data = std::make_unique<char[]>(dataSize + kReadableBytesBehindData);
   if (dataSize > 0) std::memcpy(data.get(), input + kPluginBytes, dataSize);
   int requests = 0;
   effect.onRequest = [&requests](const doubles::Request&) {
-    if (++requests > kMostRequests) throw GivesUp();
+    if (++requests > kMostRequests) throw TooManyRequests();
   };
   try {
     loadAndSave(*wrapper, data.get(), static_cast<int>(dataSize));
-  } catch (const GivesUp&) {  // Thrown out of a request, as a plug-in may.
+  } catch (const TooManyRequests&) {  // Thrown from a request, as plug-ins do.
   }
   effect.onRequest = nullptr;
   return 0;

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: MIT
-// Fuzz target: the identity records, read from a stream that makes its values of the input.
+// Fuzz target: reads the identity records from a stream that takes its values from the input.
 //
-// A text is a length byte, doubled, and as many bytes of the input, cut to the length that the record allows.
-// An operation's first byte decides what becomes of it: 0xFE fails it, 0xFF throws out of it. At the end of
-// the input every operation fails. A record that was read can be written and read again, and is the same.
+// The first byte of an operation decides its outcome: 0xFE makes it fail, 0xFF makes it throw, with any other
+// byte it succeeds. A text is a byte n and 2 * n + 1 bytes, or as many as the record allows. At the end of
+// the input every operation fails. A record that was read is written and read once more, and must stay the
+// same.
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
@@ -20,7 +21,7 @@ namespace {
 constexpr std::uint8_t kFails = 0xFE;
 constexpr std::uint8_t kThrows = 0xFF;
 
-struct StreamIsGone {};
+struct StreamThrew {};
 
 void require(bool condition) {
   if (!condition) std::abort();
@@ -63,18 +64,18 @@ class FuzzStream : public INiduStream {
   }
 
   bool begins(AutoNiduException* error) {
-    const std::uint8_t fate = left == 0 ? kFails : byte();
-    if (fate == kThrows) throw StreamIsGone();
-    if (fate == kFails) error->record.errorCode = 1 + static_cast<std::int32_t>(left);
-    return fate != kFails;
+    const std::uint8_t outcome = left == 0 ? kFails : byte();
+    if (outcome == kThrows) throw StreamThrew();
+    if (outcome == kFails) error->record.errorCode = 1 + static_cast<std::int32_t>(left);
+    return outcome != kFails;
   }
 
   const std::uint8_t* at;
   std::size_t left;
 };
 
-/// Keeps what is written and gives it back in the same order.
-class FaithfulStream : public INiduStream {
+/// Returns the values that were written, in the same order.
+class MemoryStream : public INiduStream {
  public:
   void writeString(AutoNiduException*, const char* text) override { texts.emplace_back(text); }
   void writeBool(AutoNiduException*, bool value) override { numbers.push_back(value ? 1 : 0); }
@@ -132,10 +133,10 @@ void readWriteAndReadAgain(const Record& blank, const std::uint8_t* input, std::
   } catch (const NiduException& failure) {
     require(failure.errorCode != 0);
     return;
-  } catch (const StreamIsGone&) {
+  } catch (const StreamThrew&) {
     return;
   }
-  FaithfulStream memory;
+  MemoryStream memory;
   record.putTo(&memory);
   Record again = blank;
   readFrom(memory, again);

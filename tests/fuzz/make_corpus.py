@@ -1,10 +1,10 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: MIT
-"""Writes the first inputs of the fuzz targets into corpus/, one small file per case.
+"""Writes the inputs that the fuzz targets start with into corpus/, one small file per case.
 
     tests/fuzz/make_corpus.py
 
-Inputs that a fuzzer found are added by hand and are not touched.
+Leaves inputs alone that were added by hand because a fuzzer found them.
 """
 import pathlib
 import struct
@@ -77,7 +77,7 @@ LOAD_PRESET = {
 
 
 def text(value):
-    """Texts have an odd length: the length byte is half of it."""
+    """The text's length must be odd: the length byte is half of it."""
     assert len(value) % 2 == 1
     return b"\0" + bytes([len(value) // 2]) + value
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// Gives the files of the folders named on the command line to a fuzz target, once each: how builds without a
-// fuzzer keep trying what fuzzers found.
+// Runs a fuzz target once on each file of the folders named on the command line. Builds without a fuzzer use
+// it to test the inputs that fuzzers have found.
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
