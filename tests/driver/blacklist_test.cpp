@@ -16,7 +16,7 @@ struct PathCase {
 
 class IsBlackListedTest : public testing::TestWithParam<PathCase> {};
 
-TEST_P(IsBlackListedTest, AnswersTwiceWhateverTheInteger) {
+TEST_P(IsBlackListedTest, SaysWhetherTheBundleIsRefusedWhateverTheInteger) {
   for (const int ignored : {0, 1, -1}) {
     bool matched = !GetParam().isRefused;
     EXPECT_EQ(IsBlackListed(GetParam().path, ignored, matched), GetParam().isRefused);
