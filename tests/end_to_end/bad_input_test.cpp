@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Paths that name no plug-in: one failure line, one line of reason on standard error, never a crash.
+// Paths that name no plug-in: one failure line, one line with the reason on standard error, never a crash.
 #include <csignal>
 #include <cstring>
 #include <fstream>
@@ -12,7 +12,7 @@
 #include <unistd.h>
 
 #include "tests/shared/program_run.h"
-#include "tests/shared/protocol_lines.h"
+#include "tests/shared/protocol.h"
 #include "tests/shared/sanitizer.h"
 #include "tests/shared/temporary_directory.h"
 
@@ -24,25 +24,51 @@ using testing::StartsWith;
 
 namespace {
 
-std::string textOf(const std::string& path) {
-  std::ifstream file(path, std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), {}};
+namespace fs = std::filesystem;
+
+/// Makes the bad input in a folder and returns the path to try.
+using Maker = std::function<std::string(const fs::path&)>;
+
+Maker path(const std::string& text) {
+  return [=](const fs::path&) { return text; };
 }
 
-void writeFile(const std::filesystem::path& path, const std::string& text) {
-  std::ofstream(path, std::ios::binary) << text;
+Maker inFolder(const std::string& relative) {
+  return [=](const fs::path& folder) { return (folder / relative).string(); };
+}
+
+Maker file(const std::string& content, const std::string& relative = "file.so") {
+  return [=](const fs::path& folder) {
+    fs::create_directories((folder / relative).parent_path());
+    std::ofstream(folder / relative, std::ios::binary) << content;
+    return (folder / relative).string();
+  };
+}
+
+Maker linkTo(const std::string& target) {
+  return [=](const fs::path& folder) {
+    fs::create_symlink(target, folder / "link.so");
+    return (folder / "link.so").string();
+  };
+}
+
+std::string wellBehavedEffect() {
+  std::ifstream stream(samplePlugin("well_behaved_effect"), std::ios::binary);
+  return {std::istreambuf_iterator<char>(stream), {}};
 }
 
 /// The sample as if it were made for the other of the two x86 architectures: class and machine of its header.
-std::string forTheOtherArchitecture(std::string library) {
+std::string forTheOtherArchitecture() {
+  std::string library = wellBehavedEffect();
   const bool is64Bit = library[4] == 2;
   library[4] = is64Bit ? 1 : 2;
   library[18] = is64Bit ? 3 : 62;
   return library;
 }
 
-/// The same as if it were made for a machine of 64 bits in big-endian order.
-std::string forS390x(std::string library) {
+/// The same for a 64-bit machine with big-endian byte order.
+std::string forS390x() {
+  std::string library = wellBehavedEffect();
   library[4] = 2;
   library[5] = 2;
   library[18] = 0;
@@ -56,90 +82,73 @@ constexpr const char* kBothArchitectures = "is for i386, this program is for x86
 constexpr const char* kBothArchitectures = "is for x86_64, this program is for i386";
 #endif
 
+std::string otherArchitecture(const fs::path& folder) { return file(forTheOtherArchitecture())(folder); }
+
+std::string otherArchitectureBehindLink(const fs::path& folder) {
+  fs::create_directory(folder / "Odd.vst");
+  fs::create_symlink(otherArchitecture(folder), folder / "Odd.vst/Odd.so");
+  return (folder / "Odd.vst").string();
+}
+
+std::string otherArchitectureInFolder(const fs::path& folder) {
+  file(forS390x(), "Odd.vst/Contents/Linux/Odd.so")(folder);
+  return (folder / "Odd.vst").string();
+}
+
+std::string folderWithoutExecutable(const fs::path& folder) {
+  fs::create_directories(folder / "Empty.vst/Contents/MacOS");
+  return (folder / "Empty.vst").string();
+}
+
+std::string fifo(const fs::path& folder) {
+  EXPECT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
+  return (folder / "fifo").string();
+}
+
+std::string longPathOfShortNames() {
+  std::string text;
+  while (text.size() < 5000) text += "/folder_of_a_name";
+  return text;
+}
+
 struct BadInput {
   std::string name;
   std::string reason;  ///< Part of the line on standard error.
-  /// Makes the thing in a folder and returns the path to try.
-  std::function<std::string(const std::filesystem::path&)> make;
+  Maker make;
 };
 
-std::string madeOf(const std::filesystem::path& folder, const std::string& content) {
-  writeFile(folder / "file.so", content);
-  return (folder / "file.so").string();
-}
-
 const BadInput kBadInputs[] = {
-    {"MissingFile", "/none.so: No such file",
-     [](const auto& folder) { return (folder / "none.so").string(); }},
-    {"MissingFolder", "No such file", [](const auto& folder) { return (folder / "a/b/none.so").string(); }},
-    {"MissingRelativeFile", "none.so", [](const auto&) { return std::string("none.so"); }},
+    {"MissingFile", "/none.so: No such file", inFolder("none.so")},
+    {"MissingFolder", "No such file", inFolder("a/b/none.so")},
+    {"MissingRelativeFile", "none.so", path("none.so")},
+    {"LinkToItself", "symbolic links", linkTo("link.so")},
+    {"LinkToNothing", "No such file", linkTo("nothing")},
+    {"EmptyPath", "empty", path("")},
+    {"LongPath", "too long", path('/' + std::string(4999, 'x'))},
+    {"LongPathOfShortNames", "too long", path(longPathOfShortNames())},
+    {"InvalidUtf8", "\\xff\\xfe", path("/x/\xff\xfe.so")},
+    {"LineEndInPath", "a b", inFolder("a\nb")},
     {"FileAsFolder", "Not a directory",
-     [](const auto& folder) { return madeOf(folder, "text") + "/inner.so"; }},
-    {"TextFile", "file too short", [](const auto& folder) { return madeOf(folder, "some text\n"); }},
-    {"LongTextFile", "invalid ELF header",
-     [](const auto& folder) { return madeOf(folder, std::string(100000, 'x')); }},
-    {"EmptyFile", "file too short", [](const auto& folder) { return madeOf(folder, ""); }},
-    {"FolderWithoutExecutable", "has no executable",
-     [](const auto& folder) {
-       std::filesystem::create_directories(folder / "Empty.vst/Contents/MacOS");
-       return (folder / "Empty.vst").string();
-     }},
-    {"OtherArchitecture", kBothArchitectures,
-     [](const auto& folder) {
-       return madeOf(folder, forTheOtherArchitecture(textOf(samplePlugin("well_behaved_effect"))));
-     }},
-    {"OtherArchitectureInFolder", "is for s390x, this program is for ",
-     [](const auto& folder) {
-       std::filesystem::create_directories(folder / "Odd.vst/Contents/Linux");
-       writeFile(folder / "Odd.vst/Contents/Linux/Odd.so",
-                 forS390x(textOf(samplePlugin("well_behaved_effect"))));
-       return (folder / "Odd.vst").string();
-     }},
-    {"OtherArchitectureBehindLink", kBothArchitectures,
-     [](const auto& folder) {
-       const std::string file =
-           madeOf(folder, forTheOtherArchitecture(textOf(samplePlugin("well_behaved_effect"))));
-       std::filesystem::create_directory(folder / "Odd.vst");
-       std::filesystem::create_symlink(file, folder / "Odd.vst/Odd.so");
-       return (folder / "Odd.vst").string();
-     }},
+     [](const fs::path& folder) { return file("text")(folder) + "/inner.so"; }},
+    {"FolderWithoutExecutable", "has no executable", folderWithoutExecutable},
+    {"Fifo", "neither a file nor a directory", fifo},
+    {"Device", "neither a file nor a directory", path("/dev/null")},
+    {"EmptyFile", "file too short", file("")},
+    {"TextFile", "file too short", file("some text\n")},
+    {"LongTextFile", "invalid ELF header", file(std::string(100000, 'x'))},
     {"ModuleForMacOS", "is a module for macOS, not a shared object for Linux",
-     [](const auto& folder) { return madeOf(folder, "\xCF\xFA\xED\xFE" + std::string(1000, '\1')); }},
+     file("\xCF\xFA\xED\xFE" + std::string(1000, '\1'))},
     {"ModuleForWindows", "is a module for Windows, not a shared object for Linux",
-     [](const auto& folder) { return madeOf(folder, "MZ" + std::string(1000, '\1')); }},
+     file("MZ" + std::string(1000, '\1'))},
     {"StaticLibrary", "is a static library, not a shared object for Linux",
-     [](const auto& folder) { return madeOf(folder, "!<arch>\n" + std::string(1000, '\1')); }},
-    {"Script", "is a script, not a shared object for Linux",
-     [](const auto& folder) { return madeOf(folder, "#!/bin/sh\necho total, 64\n"); }},
-    {"Program", "executable", [](const auto&) { return std::string(VSTTORTURE_PROGRAM); }},
-    {"UndefinedSymbol", "numberThatNobodyDefines",
-     [](const auto&) { return samplePlugin("undefined_symbol"); }},
-    {"InvalidUtf8", "\\xff\\xfe", [](const auto&) { return std::string("/x/\xff\xfe.so"); }},
-    {"EmptyPath", "empty", [](const auto&) { return std::string(); }},
-    {"LongPath", "too long", [](const auto&) { return '/' + std::string(4999, 'x'); }},
-    {"LongPathOfShortNames", "too long",
-     [](const auto&) {
-       std::string path;
-       while (path.size() < 5000) path += "/folder_of_a_name";
-       return path;
-     }},
-    {"LineEndInPath", "a b", [](const auto& folder) { return (folder / "a\nb").string(); }},
-    {"Fifo", "neither a file nor a directory",
-     [](const auto& folder) {
-       EXPECT_EQ(mkfifo((folder / "fifo").c_str(), 0600), 0);
-       return (folder / "fifo").string();
-     }},
-    {"Device", "neither a file nor a directory", [](const auto&) { return std::string("/dev/null"); }},
-    {"LinkToItself", "symbolic links",
-     [](const auto& folder) {
-       std::filesystem::create_symlink("loop", folder / "loop");
-       return (folder / "loop").string();
-     }},
-    {"LinkToNothing", "No such file",
-     [](const auto& folder) {
-       std::filesystem::create_symlink("nothing", folder / "link.so");
-       return (folder / "link.so").string();
-     }},
+     file("!<arch>\n" + std::string(1000, '\1'))},
+    {"Script", "is a script, not a shared object for Linux", file("#!/bin/sh\necho total, 64\n")},
+    {"Program", "executable", path(VSTTORTURE_PROGRAM)},
+    {"UndefinedSymbol", "numberThatNobodyDefines", path(samplePlugin("undefined_symbol"))},
+    {"OtherArchitecture", kBothArchitectures, otherArchitecture},
+    {"OtherArchitectureBehindLink", kBothArchitectures, otherArchitectureBehindLink},
+    {"OtherArchitectureInFolder", "is for s390x, this program is for ",
+     otherArchitectureInFolder},
 };
 
 void expectOneFailureAndOneReason(const ProgramRun& run, const std::string& reason) {
@@ -160,12 +169,12 @@ TEST_P(BadInputs, GiveOneFailureLineAndOneReason) {
 INSTANTIATE_TEST_SUITE_P(Paths, BadInputs, testing::ValuesIn(kBadInputs),
                          [](const auto& instance) { return instance.param.name; });
 
-/// The superuser may enter every folder, unless the capabilities for that are taken away.
+// The superuser can enter every folder, so the program then runs without the capabilities for that.
 TEST(FolderWithoutPermission, GivesOneFailureLineAndOneReason) {
   const TemporaryDirectory folder;
-  const std::filesystem::path closed = folder.path() / "Closed.vst";
-  std::filesystem::create_directory(closed);
-  std::filesystem::copy_file(samplePlugin("well_behaved_effect"), closed / "Closed.so");
+  const fs::path closed = folder.path() / "Closed.vst";
+  fs::create_directory(closed);
+  fs::copy_file(samplePlugin("well_behaved_effect"), closed / "Closed.so");
   ASSERT_EQ(chmod(closed.c_str(), 0), 0);
   ProgramRun run;
   if (geteuid() == 0) {
@@ -180,7 +189,7 @@ TEST(FolderWithoutPermission, GivesOneFailureLineAndOneReason) {
   expectOneFailureAndOneReason(run, "Closed.vst");
 }
 
-/// How far the loader reads into the file.
+/// The size in bytes of the part of the file that the loader maps.
 std::size_t sizeOfLoadedPart(const std::string& library) {
   ElfW(Ehdr) header;
   std::memcpy(&header, library.data(), sizeof header);
@@ -193,10 +202,10 @@ std::size_t sizeOfLoadedPart(const std::string& library) {
   return size;
 }
 
-/// The end of a run, whatever the plug-in is, as a host may count on it. The loader itself gives up on some
-/// damaged files: 127, with its reason on standard error. The address sanitizer ends what it finds with 1.
-/// After the run's end nobody handles SIGILL and its like any more.
-void expectAKnownEnd(const ProgramRun& run) {
+/// Every end that a run with a damaged plug-in can have. The system's loader ends the process itself on some
+/// damaged files, with status 127 and its reason on standard error; the address sanitizer does so with status 1.
+/// SIGILL and SIGFPE end a process that crashes after the run.
+void expectOneOfTheKnownEnds(const ProgramRun& run) {
   const std::vector<std::string> printed = lines(run.standardOutput);
   if (run.end == "exit status 0") {
     EXPECT_EQ(printed.size(), 66u);
@@ -217,8 +226,8 @@ void expectAKnownEnd(const ProgramRun& run) {
   }
 }
 
-/// A host that loses patience: a damaged plug-in may also hang.
-ProgramRun runWithPatience(const std::string& path) {
+/// Sends SIGTERM after a second: a damaged plug-in may also hang.
+ProgramRun runForASecond(const std::string& path) {
   ProgramCall call;
   call.arguments = {path};
   call.interruption.signals = {SIGTERM};
@@ -226,14 +235,14 @@ ProgramRun runWithPatience(const std::string& path) {
   return runVstTorture(call);
 }
 
-TEST(TruncatedPlugin, FailsToLoadOrEndsInTheGuard) {
+TEST(TruncatedPlugin, FailsToLoadOrCrashes) {
   const TemporaryDirectory folder;
-  const std::string whole = textOf(samplePlugin("well_behaved_effect"));
+  const std::string whole = wellBehavedEffect();
   const std::size_t loaded = sizeOfLoadedPart(whole);
   for (const std::size_t length :
        {std::size_t{1}, std::size_t{4}, std::size_t{20}, std::size_t{51}, std::size_t{52}, std::size_t{64},
         std::size_t{100}, std::size_t{500}, loaded / 8, loaded / 4, loaded / 3, loaded / 2, loaded * 3 / 4}) {
-    const ProgramRun run = runWithPatience(madeOf(folder.path(), whole.substr(0, length)));
+    const ProgramRun run = runForASecond(file(whole.substr(0, length))(folder.path()));
     SCOPED_TRACE(length);
     if (run.end == "exit status 3") {
       expectOneFailureAndOneReason(run, "file.so");
@@ -241,20 +250,20 @@ TEST(TruncatedPlugin, FailsToLoadOrEndsInTheGuard) {
       EXPECT_EQ(run.standardOutput, "unexpected exit");
       EXPECT_EQ(run.end, "exit status 7");
     }
-    EXPECT_EQ(run.secondsSinceInterruption, 0) << "it hung";
+    EXPECT_EQ(run.secondsSinceInterruption, 0) << "the run hung";
   }
 }
 
-TEST(DamagedPlugin, ComesToAKnownEnd) {
+TEST(DamagedPlugin, EndsInOneOfTheKnownWays) {
   const TemporaryDirectory folder;
-  const std::string whole = textOf(samplePlugin("well_behaved_effect"));
+  const std::string whole = wellBehavedEffect();
   const std::size_t loaded = sizeOfLoadedPart(whole);
   for (const char garbage : {'\xFF', '\x00', 'G'}) {
     for (const std::size_t part : {1u, 2u, 3u, 4u, 5u, 6u, 7u}) {
       SCOPED_TRACE(part);
       std::string damaged = whole;
       damaged.replace(loaded * part / 8, 64, 64, garbage);
-      expectAKnownEnd(runWithPatience(madeOf(folder.path(), damaged)));
+      expectOneOfTheKnownEnds(runForASecond(file(damaged)(folder.path())));
     }
   }
 }

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: MIT
-// Golden files: the exact lines that a run is expected to give, kept in tests/end_to_end/golden/.
+// Golden files: the exact lines that a run is expected to print, kept in tests/end_to_end/golden/.
 //
-// The random pass of a run, steps 16 to 65, stands there as one line, kRandomPass. It stands for fifty step
-// lines, numbered on, each with the text of one of the five tests that may be drawn.
+// The random pass of a run, steps 16 to 65, is one line there, kRandomPass. It stands for fifty step lines with
+// consecutive numbers, each with one of the five texts that can be drawn.
 //
-// UPDATE_GOLDEN=1 in the environment of the tests writes the files anew.
+// UPDATE_GOLDEN=1 in the environment of the tests rewrites the files.
 #pragma once
 
 #include <string>
@@ -12,18 +12,20 @@
 
 #include <gtest/gtest.h>
 
+#include "tests/shared/program_run.h"
+
 constexpr const char* kRandomPass = "16 to 65, tests drawn at random";
 
-/// Whether the line announces a drawn test under this number.
-bool isDrawnStep(const std::string& line, int number);
+/// The lines of standard output and, as the last one, how the run ended.
+std::vector<std::string> linesAndEnd(const ProgramRun& run);
 
-/// The lines of a golden file for `actual`: the random pass, where there is a right one, as one line.
-std::vector<std::string> foldRandomPass(const std::vector<std::string>& actual);
+/// `actual` with its random pass as one line. Unchanged when a step of the pass is missing or wrong.
+std::vector<std::string> foldRandomPass(std::vector<std::string> actual);
 
-/// What differs first between the lines of a golden file and those of a run; empty when nothing does.
-std::string firstDifference(const std::vector<std::string>& golden, const std::vector<std::string>& actual);
+/// The first line in which the two differ, in words; empty when they are equal.
+std::string firstDifference(const std::vector<std::string>& expected, const std::vector<std::string>& actual);
 
-/// Compares with golden/NAME.txt, or writes it.
+/// Compares `actual`, its random pass folded, with golden/NAME.txt, or writes that file.
 testing::AssertionResult matchesGolden(const std::string& name, const std::vector<std::string>& actual);
 
 /// The lines of golden/NAME.txt; none when there is no such file.

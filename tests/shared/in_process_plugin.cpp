@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Entry points without an argument that tells them apart: one function for each plug-in that can exist.
+// An entry point has no argument that says which plug-in it belongs to, so each plug-in has a function of its own.
 #include "tests/shared/in_process_plugin.h"
 
 #include <algorithm>
@@ -17,14 +17,14 @@ struct EntryPoints {
   template <std::size_t kSlot>
   static AEffect* enter(audioMasterCallback host) {
     if (plugins[kSlot] != nullptr) return plugins[kSlot]->entered(host);
-    ADD_FAILURE() << "entry point called of a plug-in that is gone";
+    ADD_FAILURE() << "entry point called of a plug-in that was destroyed";
     return nullptr;
   }
 
   static std::size_t freeSlot() {
     const auto found = std::find(std::begin(plugins), std::end(plugins), nullptr);
     if (found != std::end(plugins)) return static_cast<std::size_t>(found - std::begin(plugins));
-    std::fputs("too many plug-ins at a time\n", stderr);
+    std::fputs("more than four plug-ins at a time\n", stderr);
     std::abort();
   }
 };

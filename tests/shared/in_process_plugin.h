@@ -6,12 +6,12 @@
 //   InProcessPlugin plugin(core_foundation, "/b.vst");
 //   RecordingEffect effect;
 //   plugin.willCreate(effect);
-//   plugin.willRefuse();                       // ... and the second creation answers null
+//   plugin.willRefuse();                       // The second call of the entry point returns null.
 //   ... the host loads "/b.vst" and creates an instance ...
 //   EXPECT_THAT(plugin.entryCalls(), SizeIs(1));
 //
-// Ownership: the test owns plug-in and instances, which must live as long as the host can reach them. At most
-//            four plug-ins exist at a time; the fifth ends the process.
+// Ownership: the test owns plug-in and instances; they must outlive the host's use of them. At most four plug-ins
+//            exist at a time; a fifth aborts the process.
 #pragma once
 
 #include <cstddef>
@@ -36,24 +36,24 @@ class InProcessPlugin {
   InProcessPlugin(const InProcessPlugin&) = delete;
   InProcessPlugin& operator=(const InProcessPlugin&) = delete;
 
-  // ---- What the entry point will do, one line for each call of it, in order ----
+  // ---- What the entry point will do: each of these prepares one call, in order ----
 
-  /// Answers this instance. The same one may be created again later.
+  /// Returns this instance. It can be prepared more than once.
   void willCreate(RecordingEffect& effect);
-  /// Answers null.
+  /// Returns null.
   void willRefuse();
-  /// Throws an int, 42, out of the entry point.
+  /// Throws the int 42.
   void willThrow();
-  /// Runs in every call of the entry point before it answers; may ask the host, or throw something else.
+  /// Runs first in every call of the entry point; may call the host, or throw.
   std::function<void(audioMasterCallback host)> onEntry;
 
   // ---- What the host did ----
 
-  /// The host callback of each call of the entry point, in order. A call beyond what was prepared answers
-  /// null and fails the test.
+  /// The host callback of each call of the entry point, in order. A call that was not prepared returns null and
+  /// fails the test.
   const std::vector<audioMasterCallback>& entryCalls() const { return hosts; }
 
-  /// How many instances were handed out less how often these were closed since.
+  /// The number of instances returned minus the number of times they were closed after that.
   int instancesAlive() const;
 
   /// The entry point's address, as the bundle exports it.
@@ -61,7 +61,7 @@ class InProcessPlugin {
 
  private:
   struct Creation {
-    RecordingEffect* effect;  // Null when the entry point gives none.
+    RecordingEffect* effect;  // Null: the entry point returns null or throws.
     bool throws;
   };
   struct HandedOut {
@@ -72,7 +72,7 @@ class InProcessPlugin {
 
   AEffect* entered(audioMasterCallback host);
 
-  const std::size_t slot;  // Which of the entry points is this plug-in's.
+  const std::size_t slot;  // Index of this plug-in's entry point.
   std::deque<Creation> creations;
   std::vector<audioMasterCallback> hosts;
   std::map<const RecordingEffect*, HandedOut> handedOut;

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Runs a program as a host application does: fork, exec, two pipes, and a thread that waits for the end.
+// Runs a program as a host application does: fork, exec, two pipes, and a thread that waits for its end.
 #include "tests/shared/program_run.h"
 
 #include <algorithm>
@@ -31,7 +31,7 @@ constexpr std::chrono::milliseconds kLate{500};
   throw std::system_error(errno, std::generic_category(), what);
 }
 
-/// One end of a pipe, or nothing.
+/// Owns one end of a pipe, or nothing.
 class Descriptor {
  public:
   Descriptor() = default;
@@ -50,7 +50,7 @@ class Descriptor {
   int number = -1;
 };
 
-/// Both ends are closed by exec.
+/// Both ends are closed on exec.
 struct Pipe {
   Pipe() {
     std::array<int, 2> ends{};
@@ -63,7 +63,7 @@ struct Pipe {
   Descriptor writing;
 };
 
-/// Takes at most one buffer of what is there to read. Positive: there may be more; 0: the end of the file.
+/// Appends at most one buffer of what can be read now. Returns what read() does.
 ssize_t readSome(int descriptor, std::string& text) {
   std::array<char, 65536> buffer;
   const ssize_t count = read(descriptor, buffer.data(), buffer.size());
@@ -76,7 +76,7 @@ void setBlocking(int descriptor, bool blocks) {
   fcntl(descriptor, F_SETFL, blocks ? flags & ~O_NONBLOCK : flags | O_NONBLOCK);
 }
 
-/// Writes until the pipe takes no more. Returns the number of bytes.
+/// Writes until the pipe is full. Returns the number of bytes written.
 std::size_t fill(int pipeEnd) {
   setBlocking(pipeEnd, false);
   std::size_t count = 0;
@@ -92,7 +92,7 @@ Clock::duration seconds(double number) {
   return std::chrono::duration_cast<Clock::duration>(std::chrono::duration<double>(number));
 }
 
-/// The list of pointers, null at its end, that exec takes. It points into `texts`.
+/// The null-terminated list that exec takes. It points into `texts`.
 std::vector<char*> pointersTo(std::vector<std::string>& texts) {
   std::vector<char*> pointers;
   for (std::string& text : texts) pointers.push_back(text.data());
@@ -103,8 +103,8 @@ std::vector<char*> pointersTo(std::vector<std::string>& texts) {
 std::vector<std::string> environmentOf(const ProgramCall& call, const std::string& home) {
   std::map<std::string, std::string> all = {{"HOME", home}, {"LC_ALL", "C"}, {"PATH", "/usr/bin:/bin"}};
 #ifdef __SANITIZE_THREAD__
-  // A crash ends the process through exit() inside the signal handler, which is more than the sanitizer
-  // wants; and it must not wait for reports there.
+  // A crash ends the process through exit() inside the signal handler: the sanitizer must neither report that
+  // nor sleep there.
   all["TSAN_OPTIONS"] = "report_signal_unsafe=0:atexit_sleep_ms=0";
 #endif
   for (const char* name : {"ASAN_OPTIONS", "LSAN_OPTIONS", "TSAN_OPTIONS", "UBSAN_OPTIONS"}) {
@@ -116,7 +116,7 @@ std::vector<std::string> environmentOf(const ProgramCall& call, const std::strin
   return entries;
 }
 
-/// A program that has been started and not yet reaped.
+/// A program that was started and whose exit status was not yet taken.
 class Child {
  public:
   Child(const std::string& program, const ProgramCall& itsCall, const std::string& home)
@@ -154,8 +154,8 @@ class Child {
     });
   }
 
-  /// Reads until the program has ended, and interrupts it in between. False when the time is over before
-  /// that.
+  /// Reads until the program has ended, and sends the interruption's signals. False when the time limit comes
+  /// first.
   bool follow(ProgramRun& run) {
     const Clock::time_point limit = start + seconds(call.timeLimitInSeconds);
     std::array<pollfd, 3> sources = {{{ended.reading.get(), POLLIN, 0}, {-1, POLLIN, 0}, {-1, POLLIN, 0}}};
@@ -180,7 +180,7 @@ class Child {
     return interruptedAt ? std::chrono::duration<double>(Clock::now() - *interruptedAt).count() : 0;
   }
 
-  /// Kills what is left of the process group, reaps the program and returns its wait status.
+  /// Kills the rest of the process group, waits for the program and returns its wait status.
   int endAndReap() {
     kill(-pid, SIGKILL);
     waiter.join();
@@ -190,7 +190,7 @@ class Child {
     return status;
   }
 
-  /// Takes what the dead have left in the pipes.
+  /// Reads what is still in the pipes.
   void readRest(ProgramRun& run) {
     while (readSome(output.reading.get(), run.standardOutput) > 0) {
     }
@@ -200,7 +200,7 @@ class Child {
   }
 
  private:
-  /// In the child: only what is safe after a fork.
+  /// Runs in the child: calls only what is safe between fork and exec.
   [[noreturn]] void become(const std::string& program, const std::string& folder,
                            const std::vector<char*>& arguments, const std::vector<char*>& environment,
                            int failure) const {
@@ -211,7 +211,7 @@ class Child {
     if (setpgid(0, 0) == 0 && setrlimit(RLIMIT_CORE, &noCore) == 0 && dup2(nothing, STDIN_FILENO) >= 0 &&
         dup2(output.writing.get(), STDOUT_FILENO) >= 0 && dup2(error.writing.get(), STDERR_FILENO) >= 0 &&
         chdir(folder.c_str()) == 0 && sigprocmask(SIG_SETMASK, &none, nullptr) == 0) {
-      // Whatever the test's own parent left open stays here. The failure pipe must last until exec.
+      // Descriptors that the test program itself inherited are closed on exec, like the failure pipe.
       for (int other = STDERR_FILENO + 1; other < 1024; ++other) fcntl(other, F_SETFD, FD_CLOEXEC);
       if (call.reader == Reader::kWasNone) close(STDOUT_FILENO);
       execve(program.c_str(), arguments.data(), environment.data());
@@ -250,7 +250,7 @@ class Child {
     interruptedAt = now;
   }
 
-  /// Until then only what the program does is of interest.
+  /// When follow() has something to do even if the program prints nothing.
   Clock::time_point nextEvent(Clock::time_point limit, Clock::time_point now) const {
     Clock::time_point next = limit;
     if (textSeenAt && !interruptedAt && !call.interruption.signals.empty()) {
@@ -268,7 +268,7 @@ class Child {
   pid_t pid;
   Pipe output;
   Pipe error;
-  Pipe ended;  ///< Its writing end is closed by the waiting thread when the program has ended.
+  Pipe ended;  ///< `waiter` closes its writing end when the program has ended.
   std::thread waiter;
 };
 
@@ -303,6 +303,13 @@ ProgramRun runVstTorture(const std::vector<std::string>& arguments) {
 
 std::string samplePlugin(const std::string& name) {
   return std::string(VSTTORTURE_SAMPLE_PLUGINS) + '/' + name + ".so";
+}
+
+ProgramCall faultyPlugin(const std::string& kind, const std::string& place) {
+  ProgramCall call;
+  call.arguments = {samplePlugin("faulty")};
+  call.environment = {{"FAULT_KIND", kind}, {"FAULT_PLACE", place}};
+  return call;
 }
 
 std::vector<std::string> lines(const std::string& text) {

@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: MIT
-// Runs a program as a host application does, and tells everything that a host can see of it.
+// Runs a program as a host application does, and returns everything that a host can see of it.
 //
 //   const ProgramRun run = runVstTorture({samplePlugin("shell")});
 //   EXPECT_THAT(lines(run.standardOutput), ElementsAre("total, 51", "1, test gathering info"));
 //   EXPECT_EQ(run.end, "exit status 1");
 //
-// The child has a process group of its own; at its end whatever is left of the group is killed, so nothing
-// outlives the call. It reads /dev/null, dumps no core, and sees a fixed environment: LC_ALL=C, a PATH of the
-// system's folders, HOME a folder that lives as long as the run, and the options of the sanitizers.
+// The program has a process group of its own; when it has ended, the rest of the group is killed. Standard input
+// is /dev/null, and no core is dumped. The environment is fixed: LC_ALL=C, PATH=/usr/bin:/bin, HOME a new folder
+// that is removed after the run, and the options of the sanitizers.
 #pragma once
 
 #include <map>
@@ -18,23 +18,23 @@
 enum class Reader {
   kReads,       ///< Reads it from the start to the end.
   kReadsLate,   ///< Begins to read after half a second, or when the program has ended.
-  kStops,       ///< Reads until the text of the interruption has come, and no more.
-  kNeverReads,  ///< Does not even read what was in the pipe before: it is full from the start.
+  kStops,       ///< Reads until the text of the interruption has come, and no further.
+  kNeverReads,  ///< Never reads, and the pipe is full from the start.
   kIsGone,      ///< Has closed its end of the pipe.
-  kWasNone,     ///< Gives the program no standard output at all.
+  kWasNone,     ///< The program starts with standard output closed.
 };
 
 /// Signals that the host sends to the program, in this order.
 struct Interruption {
   std::vector<int> signals = {};
-  std::string afterText = {};  ///< Not before the program has printed this,
-  double afterSeconds = 0;     ///< nor before this much more time has passed.
-  double secondsBetween = 0;   ///< The host does nothing else meanwhile.
+  std::string afterText = {};  ///< The host waits until the program has printed this,
+  double afterSeconds = 0;     ///< and then for this time.
+  double secondsBetween = 0;   ///< Between two signals. Nothing is read meanwhile.
 };
 
 struct ProgramCall {
   std::vector<std::string> arguments = {};
-  std::map<std::string, std::string> environment = {};  ///< Added to the fixed one, or instead of it.
+  std::map<std::string, std::string> environment = {};  ///< Added to the fixed one; replaces equal names.
   std::string workingDirectory = {};                    ///< Empty: the same folder as HOME.
   double timeLimitInSeconds = 60;
   Reader reader = Reader::kReads;
@@ -44,13 +44,14 @@ struct ProgramCall {
 struct ProgramRun {
   std::string standardOutput;
   std::string standardError;
-  std::string end;  ///< "exit status N", "signal N" or "timed out", which ends in a kill.
+  std::string
+      end;  ///< "exit status N", "signal N", or "timed out" for a program that was killed at the limit.
   double elapsedSeconds;
   double secondsSinceInterruption;  ///< 0 when there was none.
 };
 
-/// Runs `program`, a path, to its end: neither the program nor the time limit leaves anything running. What a
-/// grandchild writes after the program has ended is not waited for.
+/// Runs `program`, a path, until it ends or is killed at the time limit. Processes that it started are killed
+/// when it has ended; their output after that is not read.
 /// Throws std::system_error when the program cannot be started.
 ProgramRun runProgram(const std::string& program, const ProgramCall& call);
 
@@ -61,5 +62,8 @@ ProgramRun runVstTorture(const std::vector<std::string>& arguments);
 /// The absolute path of a sample plug-in, by the name of its folder.
 std::string samplePlugin(const std::string& name);
 
-/// The lines of a text, without their ends. What follows the last end is a line too, unless it is empty.
+/// The call that runs the faulty sample with a fault of this kind at this place (see plugins/faulty/).
+ProgramCall faultyPlugin(const std::string& kind, const std::string& place);
+
+/// The lines of a text, without their line ends. Text after the last line end is a line too.
 std::vector<std::string> lines(const std::string& text);

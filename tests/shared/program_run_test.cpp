@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: MIT
-// The harness itself, tried on shell scripts that end in every way.
+// runProgram() reports and ends shell scripts as a host would. What it gets wrong, every end-to-end test gets wrong.
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <system_error>
 
 #include <gmock/gmock.h>
@@ -11,12 +12,11 @@
 #include <unistd.h>
 
 #include "tests/shared/program_run.h"
-#include "tests/shared/temporary_directory.h"
 
 using testing::ElementsAre;
 using testing::Ge;
-using testing::IsEmpty;
 using testing::Lt;
+using testing::StartsWith;
 
 namespace {
 
@@ -25,8 +25,27 @@ ProgramRun runScript(const std::string& script, ProgramCall call = {}) {
   return runProgram("/bin/sh", call);
 }
 
-/// Whether the process whose number a script wrote down is gone, or dead and not yet reaped by whoever
-/// inherited it. A moment is allowed: a kill is not waited for.
+ProgramCall endAfter(double seconds) {
+  ProgramCall call;
+  call.timeLimitInSeconds = seconds;
+  return call;
+}
+
+ProgramCall readBy(Reader reader, double timeLimitInSeconds = 60) {
+  ProgramCall call = endAfter(timeLimitInSeconds);
+  call.reader = reader;
+  return call;
+}
+
+ProgramCall interruptedBy(const std::vector<int>& signals, const std::string& afterText) {
+  ProgramCall call;
+  call.interruption.signals = signals;
+  call.interruption.afterText = afterText;
+  return call;
+}
+
+/// Whether the process whose number a script printed ends within five seconds: a kill takes a moment. A process
+/// whose parent has not taken its status counts as ended.
 bool isGone(const std::string& processId) {
   const std::string path = "/proc/" + std::to_string(std::stoi(processId)) + "/stat";
   for (int i = 0; i < 500; ++i) {
@@ -37,28 +56,16 @@ bool isGone(const std::string& processId) {
   return false;
 }
 
-std::size_t openDescriptors() {
-  std::size_t count = 0;
-  for ([[maybe_unused]] const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) ++count;
-  return count;
+std::ptrdiff_t openDescriptors() {
+  return std::distance(std::filesystem::directory_iterator("/proc/self/fd"), {});
 }
 
-TEST(RunProgram, TellsTheExitStatus) {
-  const ProgramRun run = runScript("exit 3");
-  EXPECT_EQ(run.end, "exit status 3");
-  EXPECT_EQ(run.standardOutput, "");
-  EXPECT_EQ(run.standardError, "");
-}
-
-TEST(RunProgram, TellsTheSignalThatKilled) {
-  EXPECT_EQ(runScript("kill -9 $$").end, "signal 9");
-  EXPECT_EQ(runScript("kill -SEGV $$").end, "signal 11");
-}
-
-TEST(RunProgram, ReadsBothStreamsSeparately) {
-  const ProgramRun run = runScript("echo out; echo err >&2; printf last");
+TEST(RunProgram, ReturnsBothStreamsAndTheExitStatus) {
+  const ProgramRun run = runScript("echo out; echo err >&2; printf last; exit 3");
   EXPECT_EQ(run.standardOutput, "out\nlast");
   EXPECT_EQ(run.standardError, "err\n");
+  EXPECT_EQ(run.end, "exit status 3");
+  EXPECT_EQ(runScript("kill -SEGV $$").end, "signal 11");
 }
 
 TEST(RunProgram, ReadsAMegabyteFromBothStreamsAtOnce) {
@@ -69,30 +76,11 @@ TEST(RunProgram, ReadsAMegabyteFromBothStreamsAtOnce) {
   EXPECT_EQ(run.end, "exit status 4");
 }
 
-TEST(RunProgram, KillsAProgramThatHangs) {
-  ProgramCall call;
-  call.timeLimitInSeconds = 0.3;
-  const ProgramRun run = runScript("echo $$; while :; do sleep 30; done", call);
-  EXPECT_EQ(run.end, "timed out");
-  EXPECT_THAT(run.elapsedSeconds, Ge(0.3));
-  EXPECT_THAT(run.elapsedSeconds, Lt(10));
-  EXPECT_TRUE(isGone(run.standardOutput));
-}
-
-TEST(RunProgram, KillsAProgramThatNeverStopsWriting) {
-  ProgramCall call;
-  call.timeLimitInSeconds = 0.2;
-  const ProgramRun run = runScript("while :; do echo again; done", call);
-  EXPECT_EQ(run.end, "timed out");
-  EXPECT_THAT(run.elapsedSeconds, Lt(10));
-}
-
-TEST(RunProgram, KillsWhatAKilledProgramLeaves) {
-  ProgramCall call;
-  call.timeLimitInSeconds = 0.3;
-  const ProgramRun run = runScript("sleep 30 & echo $!; wait", call);
+TEST(RunProgram, KillsAtTheLimitWithEverythingThatTheProgramStarted) {
+  const ProgramRun run = runScript("sleep 30 & echo $!; while :; do sleep 30; done", endAfter(0.3));
   EXPECT_EQ(run.end, "timed out");
   EXPECT_TRUE(isGone(run.standardOutput));
+  EXPECT_EQ(runScript("while :; do echo again; done", endAfter(0.2)).end, "timed out");
 }
 
 TEST(RunProgram, DoesNotWaitForAGrandchildThatKeepsTheStreamsOpen) {
@@ -106,51 +94,31 @@ TEST(RunProgram, WaitsForAProgramThatClosesItsStreams) {
   EXPECT_EQ(runScript("exec >&- 2>&-; sleep 0.2; exit 6").end, "exit status 6");
 }
 
-TEST(RunProgram, GivesNothingToRead) { EXPECT_EQ(runScript("cat; echo end").standardOutput, "end\n"); }
-
-TEST(RunProgram, DumpsNoCore) { EXPECT_EQ(runScript("ulimit -c").standardOutput, "0\n"); }
-
-TEST(RunProgram, MakesTheProgramTheLeaderOfItsGroup) {
-  const ProgramRun run = runScript("echo $$; ps -o pgid= -p $$ | tr -d ' '");
-  ASSERT_EQ(lines(run.standardOutput).size(), 2u);
-  EXPECT_EQ(lines(run.standardOutput)[0], lines(run.standardOutput)[1]);
-}
-
-TEST(RunProgram, PassesThreeDescriptorsAndNoMore) {
-  EXPECT_EQ(runScript("ls /proc/$$/fd; :").standardOutput, "0\n1\n2\n");
-}
-
-TEST(RunProgram, FixesTheEnvironment) {
+TEST(RunProgram, GivesTheProgramTheSameStartEverywhere) {
   setenv("VSTTORTURE_TEST_VARIABLE", "1", 1);
   setenv("LC_ALL", "de_DE.UTF-8", 1);
   ProgramCall call;
   call.environment = {{"EXTRA", "a value"}};
   const ProgramRun run = runScript(
-      "echo $LC_ALL; echo \"$EXTRA\"; echo \"[$VSTTORTURE_TEST_VARIABLE]\"; test -d $HOME && echo home",
+      "cat; ulimit -c; ps -o pgid= -p $$ | grep -q $$ && echo leads its group; ls /proc/$$/fd;"
+      " echo $LC_ALL; echo \"$EXTRA\"; echo \"[$VSTTORTURE_TEST_VARIABLE]\"; test $HOME = $(pwd) && touch "
+      "file && pwd",
       call);
-  EXPECT_THAT(lines(run.standardOutput), ElementsAre("C", "a value", "[]", "home"));
   unsetenv("VSTTORTURE_TEST_VARIABLE");
   unsetenv("LC_ALL");
-}
-
-TEST(RunProgram, PrefersTheCallersEnvironment) {
-  ProgramCall call;
-  call.environment = {{"LC_ALL", "ja_JP"}};
-  EXPECT_EQ(runScript("echo $LC_ALL", call).standardOutput, "ja_JP\n");
-}
-
-TEST(RunProgram, GivesAHomeThatGoesWithTheRun) {
-  const ProgramRun run = runScript("touch $HOME/file; echo $HOME; pwd");
-  ASSERT_EQ(lines(run.standardOutput).size(), 2u);
-  const std::string home = lines(run.standardOutput)[0];
-  EXPECT_EQ(lines(run.standardOutput)[1], home);
+  std::vector<std::string> printed = lines(run.standardOutput);
+  const std::string home = printed.back();
+  printed.pop_back();
+  EXPECT_THAT(printed, ElementsAre("0", "leads its group", "0", "1", "2", "C", "a value", "[]"));
+  EXPECT_THAT(home, StartsWith("/"));
   EXPECT_FALSE(std::filesystem::exists(home));
 }
 
-TEST(RunProgram, StartsInTheFolderAskedFor) {
+TEST(RunProgram, LetsTheCallReplaceEnvironmentAndFolder) {
   ProgramCall call;
+  call.environment = {{"LC_ALL", "ja_JP"}};
   call.workingDirectory = "/usr/bin";
-  EXPECT_EQ(runScript("pwd", call).standardOutput, "/usr/bin\n");
+  EXPECT_EQ(runScript("echo $LC_ALL; pwd", call).standardOutput, "ja_JP\n/usr/bin\n");
 }
 
 TEST(RunProgram, ThrowsWhenTheProgramCannotBeStarted) {
@@ -161,10 +129,8 @@ TEST(RunProgram, ThrowsWhenTheProgramCannotBeStarted) {
 }
 
 TEST(RunProgram, LeavesNoDescriptorAndNoChildBehind) {
-  const std::size_t before = openDescriptors();
-  ProgramCall call;
-  call.timeLimitInSeconds = 0.1;
-  runScript("sleep 30", call);
+  const std::ptrdiff_t before = openDescriptors();
+  runScript("sleep 30", endAfter(0.1));
   runScript("exit 1");
   EXPECT_THROW(runProgram("/no/such/program", {}), std::system_error);
   EXPECT_EQ(openDescriptors(), before);
@@ -172,23 +138,64 @@ TEST(RunProgram, LeavesNoDescriptorAndNoChildBehind) {
   EXPECT_EQ(errno, ECHILD);
 }
 
-TEST(Lines, AreTheTextBetweenLineEnds) {
-  EXPECT_THAT(lines(""), IsEmpty());
-  EXPECT_THAT(lines("one\ntwo\n"), ElementsAre("one", "two"));
-  EXPECT_THAT(lines("one\n\nunexpected exit"), ElementsAre("one", "", "unexpected exit"));
+TEST(Interruption, SendsItsSignalsAfterTheText) {
+  ProgramCall call = interruptedBy({SIGUSR1, SIGTERM}, "ready");
+  call.interruption.secondsBetween = 0.2;
+  const ProgramRun run = runScript(
+      "trap 'echo one' USR1; trap 'echo two; exit 4' TERM; sleep 0.1; echo ready;"
+      " while :; do sleep 0.01; done",
+      call);
+  EXPECT_EQ(run.standardOutput, "ready\none\ntwo\n");
+  EXPECT_EQ(run.end, "exit status 4");
+  EXPECT_THAT(run.secondsSinceInterruption, Lt(run.elapsedSeconds));
 }
 
-TEST(TemporaryDirectoryTest, GoesWithEverythingInIt) {
-  std::filesystem::path path;
-  {
-    const TemporaryDirectory folder;
-    path = folder.path();
-    EXPECT_TRUE(path.is_absolute());
-    std::filesystem::create_directories(path / "inner/most");
-    std::ofstream(path / "inner/file") << "text";
-    EXPECT_NE(TemporaryDirectory().path(), path);
-  }
-  EXPECT_FALSE(std::filesystem::exists(path));
+TEST(Interruption, WaitsForTheTime) {
+  ProgramCall call = interruptedBy({SIGKILL}, "");
+  call.interruption.afterSeconds = 0.2;
+  const ProgramRun run = runScript("exec sleep 30", call);
+  EXPECT_EQ(run.end, "signal 9");
+  EXPECT_THAT(run.elapsedSeconds, Ge(0.2));
+}
+
+TEST(Interruption, DoesNotComeWithoutItsText) {
+  const ProgramRun run = runScript("echo text; sleep 0.1; exit 3", interruptedBy({SIGKILL}, "never"));
+  EXPECT_EQ(run.end, "exit status 3");
+  EXPECT_EQ(run.secondsSinceInterruption, 0);
+}
+
+TEST(ReaderOfTheOutput, LosesNothingWhenItReadsLate) {
+  const ProgramRun quick = runScript("echo text; exit 2", readBy(Reader::kReadsLate));
+  EXPECT_EQ(quick.standardOutput, "text\n");
+  const ProgramRun run = runScript("head -c 1048576 /dev/zero; echo end", readBy(Reader::kReadsLate));
+  EXPECT_EQ(run.standardOutput, std::string(1048576, '\0') + "end\n");
+  EXPECT_THAT(run.elapsedSeconds, Ge(0.5));
+}
+
+TEST(ReaderOfTheOutput, BlocksTheFirstByteWhenItNeverReads) {
+  const ProgramRun run = runScript("echo text; echo more >&2", readBy(Reader::kNeverReads, 0.3));
+  EXPECT_EQ(run.end, "timed out");
+  EXPECT_EQ(run.standardOutput + run.standardError, "");
+}
+
+TEST(ReaderOfTheOutput, BlocksAProgramThatPrintsOnWhenItStops) {
+  ProgramCall call = readBy(Reader::kStops, 0.5);
+  call.interruption.afterText = "stop";
+  const ProgramRun run = runScript("echo first; echo stop; exec cat /dev/zero", call);
+  EXPECT_EQ(run.end, "timed out");
+  EXPECT_THAT(run.standardOutput, StartsWith("first\nstop\n"));
+  EXPECT_THAT(run.standardOutput.size(), Lt(300000u));
+}
+
+TEST(ReaderOfTheOutput, CanBeGoneOrMissing) {
+  EXPECT_EQ(runScript("exec cat /dev/zero", readBy(Reader::kIsGone)).end, "signal 13");
+  EXPECT_EQ(runScript("test -e /proc/self/fd/1 && exit 1; exit 7", readBy(Reader::kWasNone)).end,
+            "exit status 7");
+}
+
+TEST(Lines, AreTheTextBetweenLineEnds) {
+  EXPECT_THAT(lines("one\n\nunexpected exit"), ElementsAre("one", "", "unexpected exit"));
+  EXPECT_THAT(lines("one\n"), ElementsAre("one"));
 }
 
 }  // namespace

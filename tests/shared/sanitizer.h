@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: MIT
-// What goes otherwise in a build with a sanitizer: faults that it takes from the program, leaks that it
-// counts.
+// What is different in a build with a sanitizer: cases that do not apply, the leak check, longer times.
 #pragma once
 
 #include <map>
@@ -17,7 +16,10 @@ constexpr bool kWithThreadSanitizer = true;
 constexpr bool kWithThreadSanitizer = false;
 #endif
 
-/// Added to the environment of a run without the leak check at its end, in a build that has one.
+/// The longest that a run may take from its start, or from a signal, to its end.
+constexpr double kEndLimitInSeconds = kWithAddressSanitizer || kWithThreadSanitizer ? 15 : 2;
+
+/// Environment variables that switch off the leak check at the end of a run.
 inline const std::map<std::string, std::string> kNoLeakCheck = {{"LSAN_OPTIONS", "detect_leaks=0"}};
 
 /// Why a case does not apply in a build with a sanitizer; empty where it does.
@@ -25,7 +27,7 @@ struct NotWith {
   std::string address = {};
   std::string thread = {};
 
-  /// The reason not to run the case in this build; empty to run it.
+  /// The reason to skip the case in this build; empty to run it.
   std::string reason() const {
     if (kWithAddressSanitizer) return address;
     return kWithThreadSanitizer ? thread : "";

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A folder of its own for one test, gone with everything in it when the test ends.
+// A new, empty folder, removed with its content when the object goes out of scope.
 #pragma once
 
 #include <cstdlib>
@@ -9,7 +9,7 @@
 
 class TemporaryDirectory {
  public:
-  /// Throws std::system_error when no folder can be made.
+  /// Throws std::system_error when the folder cannot be made.
   TemporaryDirectory() {
     std::string name = (std::filesystem::temp_directory_path() / "vsttorture-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr) throw std::system_error(errno, std::generic_category(), name);
@@ -22,7 +22,7 @@ class TemporaryDirectory {
     std::filesystem::remove_all(folder, ignored);
   }
 
-  /// Absolute, without a slash at its end.
+  /// Absolute, without a slash at the end.
   const std::filesystem::path& path() const { return folder; }
 
  private:
