@@ -203,8 +203,8 @@ std::size_t sizeOfLoadedPart(const std::string& library) {
 }
 
 /// Every end that a run with a damaged plug-in can have. The system's loader ends the process itself on some
-/// damaged files, with status 127 and its reason on standard error; the address sanitizer does so with status 1.
-/// SIGILL and SIGFPE end a process that crashes after the run.
+/// damaged files, with status 127 and its reason on standard error; the address sanitizer does so with status
+/// 1. SIGILL and SIGFPE end a process that crashes after the run.
 void expectOneOfTheKnownEnds(const ProgramRun& run) {
   const std::vector<std::string> printed = lines(run.standardOutput);
   if (run.end == "exit status 0") {

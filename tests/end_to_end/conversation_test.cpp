@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: MIT
 // Every request that a run makes of a plug-in, and between which lines of the program.
 //
-// The recording sample writes each request to the program's standard output, so it stands behind the line of the
-// step that made it. The golden files hold the conversation of the steps in fixed order; a step that makes the
-// same requests as an earlier one is one line there. The requests of a drawn test must be those of the same test
-// in the fixed order. Two tests depend on the current program, and the fixed order runs them on the last program
-// only: until "inspect preset info" is drawn, which selects the last program, their requests are compared with a
-// golden file for the first program.
+// The recording sample writes each request to the program's standard output, so it stands behind the line of
+// the step that made it. The golden files hold the conversation of the steps in fixed order; a step that
+// makes the same requests as an earlier one is one line there. The requests of a drawn test must be those of
+// the same test in the fixed order. Two tests depend on the current program, and the fixed order runs them on
+// the last program only: until "inspect preset info" is drawn, which selects the last program, their requests
+// are compared with a golden file for the first program.
 #include <algorithm>
 #include <map>
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// What the fault matrix leaves open about crashes: that a run ends soon, that the crash itself writes nothing to
-// standard error, and that a plug-in's text stands before "unexpected exit".
+// What the fault matrix leaves open about crashes: that a run ends soon, that the crash itself writes nothing
+// to standard error, and that a plug-in's text stands before "unexpected exit".
 #include <gmock/gmock.h>
 
 #include "tests/shared/program_run.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// On 32-bit x86 a plug-in answers a value in a register that is wider than a float. The program rounds what it
-// reads to a 32-bit float, so the value that it writes back equals the current one and is not sent.
+// On 32-bit x86 a plug-in answers a value in a register that is wider than a float. The program rounds what
+// it reads to a 32-bit float, so the value that it writes back equals the current one and is not sent.
 #include <gmock/gmock.h>
 
 #include "tests/shared/program_run.h"

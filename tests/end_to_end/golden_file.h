@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
 // Golden files: the exact lines that a run is expected to print, kept in tests/end_to_end/golden/.
 //
-// The random pass of a run, steps 16 to 65, is one line there, kRandomPass. It stands for fifty step lines with
-// consecutive numbers, each with one of the five texts that can be drawn.
+// The random pass of a run, steps 16 to 65, is one line there, kRandomPass. It stands for fifty step lines
+// with consecutive numbers, each with one of the five texts that can be drawn.
 //
 // UPDATE_GOLDEN=1 in the environment of the tests rewrites the files.
 #pragma once

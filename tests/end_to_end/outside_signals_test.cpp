@@ -12,7 +12,8 @@ using testing::Lt;
 
 namespace {
 
-/// Hangs in step 6. The signals are sent as soon as the step line has been read, which may be before it hangs.
+/// Hangs in step 6. The signals are sent as soon as the step line has been read, which may be before it
+/// hangs.
 ProgramCall hanging(const std::string& kind, const std::vector<int>& signals) {
   ProgramCall call = faultyPlugin(kind, "dispatch:52");
   call.interruption.signals = signals;

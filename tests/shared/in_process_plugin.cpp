@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// An entry point has no argument that says which plug-in it belongs to, so each plug-in has a function of its own.
+// An entry point has no argument that says which plug-in it belongs to, so each plug-in has a function of its
+// own.
 #include "tests/shared/in_process_plugin.h"
 
 #include <algorithm>

@@ -10,8 +10,8 @@
 //   ... the host loads "/b.vst" and creates an instance ...
 //   EXPECT_THAT(plugin.entryCalls(), SizeIs(1));
 //
-// Ownership: the test owns plug-in and instances; they must outlive the host's use of them. At most four plug-ins
-//            exist at a time; a fifth aborts the process.
+// Ownership: the test owns plug-in and instances; they must outlive the host's use of them. At most four
+//            plug-ins exist at a time; a fifth aborts the process.
 #pragma once
 
 #include <cstddef>
@@ -49,8 +49,8 @@ class InProcessPlugin {
 
   // ---- What the host did ----
 
-  /// The host callback of each call of the entry point, in order. A call that was not prepared returns null and
-  /// fails the test.
+  /// The host callback of each call of the entry point, in order. A call that was not prepared returns null
+  /// and fails the test.
   const std::vector<audioMasterCallback>& entryCalls() const { return hosts; }
 
   /// The number of instances returned minus the number of times they were closed after that.

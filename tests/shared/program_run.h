@@ -5,9 +5,9 @@
 //   EXPECT_THAT(lines(run.standardOutput), ElementsAre("total, 51", "1, test gathering info"));
 //   EXPECT_EQ(run.end, "exit status 1");
 //
-// The program has a process group of its own; when it has ended, the rest of the group is killed. Standard input
-// is /dev/null, and no core is dumped. The environment is fixed: LC_ALL=C, PATH=/usr/bin:/bin, HOME a new folder
-// that is removed after the run, and the options of the sanitizers.
+// The program has a process group of its own; when it has ended, the rest of the group is killed. Standard
+// input is /dev/null, and no core is dumped. The environment is fixed: LC_ALL=C, PATH=/usr/bin:/bin, HOME a
+// new folder that is removed after the run, and the options of the sanitizers.
 #pragma once
 
 #include <map>

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// runProgram() reports and ends shell scripts as a host would. What it gets wrong, every end-to-end test gets wrong.
+// runProgram() reports and ends shell scripts as a host would. What it gets wrong, every end-to-end test gets
+// wrong.
 #include <cerrno>
 #include <csignal>
 #include <filesystem>
@@ -44,8 +45,8 @@ ProgramCall interruptedBy(const std::vector<int>& signals, const std::string& af
   return call;
 }
 
-/// Whether the process whose number a script printed ends within five seconds: a kill takes a moment. A process
-/// whose parent has not taken its status counts as ended.
+/// Whether the process whose number a script printed ends within five seconds: a kill takes a moment. A
+/// process whose parent has not taken its status counts as ended.
 bool isGone(const std::string& processId) {
   const std::string path = "/proc/" + std::to_string(std::stoi(processId)) + "/stat";
   for (int i = 0; i < 500; ++i) {

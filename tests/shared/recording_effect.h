@@ -1,20 +1,20 @@
 // SPDX-License-Identifier: MIT
-// An in-process plug-in instance for tests of the host: it records every request, and answers as it was told.
+// A plug-in instance inside the test program: records every request, and answers as the test told it to.
 //
 //   RecordingEffect effect;
 //   effect.aeffect.numInputs = 2;
 //   effect.setPrograms({{"Soft", {0.1f, 0.2f}}, {"Loud", {0.8f, 0.9f}}});
 //   effect.setText(effGetVendorString, "Play");
-//   ... the host works on &effect.aeffect ...
+//   ... code under test makes requests of &effect.aeffect ...
 //   EXPECT_THAT(effect.requestsOf(effConnectInput), ElementsAre(connectInput(1), connectInput(0)));
 //
-// A request goes this way: it is recorded; onRequest runs (what it throws reaches the host); the texts,
-// records, programs and chunks below do their part; the answer is a scripted number if there is one, else
-// theirs, else 0.
+// For each request, in this order: it is recorded; onRequest runs, and what it throws reaches the host; the
+// text, record, program or chunk for it takes effect. The answer is the scripted number if there is one,
+// otherwise the one that belongs to the effect, otherwise 0.
 //
-// Ownership: the test owns the instance, also after effClose: later requests are still recorded, so that it
-//            can see them. The processing functions are null; no host in this program may call them.
-// Threads:   recording is safe from several threads, the rest from one.
+// Ownership: the test owns the instance, also after effClose (1); later requests are still recorded. The
+//            processing functions are null: the program never calls them.
+// Threads:   requests may come from several threads; everything else is for one thread.
 #pragma once
 
 #include <deque>
@@ -41,7 +41,7 @@ struct Program {
   std::vector<float> parameters;
 };
 
-/// A plug-in that a shell offers.
+/// One of the plug-ins that a shell lists.
 struct ShellChild {
   VstInt32 id;
   std::string name;
@@ -60,75 +60,76 @@ class RecordingEffect {
 
   /// Everything asked since the start or the last forget(), in order.
   std::vector<Request> requests() const;
-  /// Of these only the dispatcher calls with one of these opcodes.
+  /// Only the dispatcher calls with one of these opcodes.
   std::vector<Request> requestsOf(VstEffectOpcode opcode) const { return requestsOf({opcode}); }
   std::vector<Request> requestsOf(std::initializer_list<VstEffectOpcode> opcodes) const;
-  /// Of these only the calls of getParameter, or of setParameter.
+  /// Only the calls of getParameter, or of setParameter.
   std::vector<Request> parameterReads() const;
   std::vector<Request> parameterWrites() const;
-  /// Forgets the requests so far, and nothing else.
+  /// Clears the list of requests. Everything else stays.
   void forget();
-  /// How often effClose (1) came in; forget() does not change it.
+  /// The number of effClose (1) requests; forget() does not reset it.
   int timesClosed() const { return closings; }
   bool closed() const { return closings > 0; }
 
-  /// Runs in the middle of every request, before the answer is made: may throw, script answers, change
-  /// aeffect, make further requests, or write through request.pointee.address.
+  /// Runs in every request after recording and before the answer is chosen. It may throw, script answers,
+  /// change aeffect, make further requests, or write to request.pointee.address.
   std::function<void(const Request&)> onRequest;
 
   // ---- Scripted answers ----
 
-  /// The number to answer to an opcode, with any index or with one index. It replaces nothing but the number.
+  /// The number to answer to an opcode, for any index or for one. Texts and records are still written.
   void answer(VstEffectOpcode opcode, VstIntPtr number);
   void answerAt(VstEffectOpcode opcode, VstInt32 index, VstIntPtr number);
-  /// The numbers to answer to the next requests with this opcode; they go before the ones above.
+  /// The numbers to answer to the next requests with this opcode; they take precedence over the ones above.
   void answerNext(VstEffectOpcode opcode, std::initializer_list<VstIntPtr> numbers);
 
-  /// The text to write for an opcode, with any index or with one index; answered with 1.
+  /// The text to write for an opcode, for any index or for one; the answer is 1.
   void setText(VstEffectOpcode opcode, const std::string& text);
   void setTextAt(VstEffectOpcode opcode, VstInt32 index, const std::string& text);
-  /// Instead of a text: `size` bytes `fill` and no zero byte, whatever the size of the host's buffer.
+  /// Writes `size` bytes `fill` without a zero byte, whatever the size of the host's buffer.
   void setUnterminatedText(VstEffectOpcode opcode, std::size_t size, char fill = 'x');
 
-  /// The answer to effCanDo (51) for one capability; the others get 0.
+  /// The answer to effCanDo (51) for one capability; 0 for all others.
   void setCapability(const std::string& capability, VstIntPtr number);
 
-  /// The records to write for opcodes 56, 33 and 34; answered with 1. They are written also where a scripted
-  /// number says 0, as some plug-ins do.
+  /// The records to write for opcodes 56, 33 and 34; the answer is 1. They are written even if the scripted
+  /// answer is 0, as some plug-ins do.
   void setParameterProperties(VstInt32 parameter, const VstParameterProperties& properties);
   void setInputProperties(VstInt32 pin, const VstPinProperties& properties);
   void setOutputProperties(VstInt32 pin, const VstPinProperties& properties);
 
-  /// What effShellGetNextPlugin (70) answers, one child a call, then 0 without a text, then all over again.
+  /// What effShellGetNextPlugin (70) answers: one child per call, then 0 without a text, then the first
+  /// again.
   void setShellChildren(std::vector<ShellChild> offered);
 
-  /// Requests with this opcode are recorded and have no effect: no text, no change of program.
+  /// Requests with this opcode are recorded and answered, but change and write nothing.
   void ignore(VstEffectOpcode opcode);
 
   // ---- Programs, parameters, chunks ----
 
-  /// Replaces all programs, selects program 0, and sets aeffect.numPrograms and numParams to fit.
-  /// effSetProgram (2) selects if 0 <= value < numPrograms, effGetProgram (3) answers the selected one,
-  /// effSetProgramName (4) renames it, effGetProgramName (5) writes its name; a plug-in without programs
-  /// still has one set of parameters and one name.
+  /// Replaces all programs, selects program 0, and sets aeffect.numPrograms and numParams. effSetProgram (2)
+  /// selects if 0 <= value < numPrograms, effGetProgram (3) answers the selected one, effSetProgramName (4)
+  /// renames it, effGetProgramName (5) writes its name. Without programs there are still one set of
+  /// parameters and one name.
   void setPrograms(std::vector<Program> replacement);
-  /// Replaces the values of the selected program, and sets aeffect.numParams to fit.
+  /// Replaces the values of the selected program, and sets aeffect.numParams.
   void setParameters(std::vector<float> values);
-  /// A program as it stands.
+  /// The current state of a program; empty for a number that was never set.
   Program program(VstInt32 index) const;
   VstInt32 currentProgram = 0;
-  /// Whether effGetProgramNameIndexed (29) writes names, for 0 <= index < numPrograms. Otherwise it answers
-  /// 0.
+  /// Whether effGetProgramNameIndexed (29) writes names, for 0 <= index < numPrograms. It answers 0
+  /// otherwise.
   bool namesProgramsByIndex = false;
 
-  /// State for effGetChunk (23) and effSetChunk (24): index 0 is the bank, any other the program. Without
-  /// effFlagsProgramChunks both requests answer 0 and do nothing. The memory that effGetChunk lends is valid
-  /// until the next one or effClose.
+  /// State for effGetChunk (23) and effSetChunk (24): index 0 is the bank, any other index the program.
+  /// Without effFlagsProgramChunks both requests answer 0 and do nothing. The memory behind an effGetChunk
+  /// answer is valid until the next effGetChunk or effClose.
   std::string bankChunk;
   std::string programChunk;
 
  private:
-  // Values by opcode and index; an entry for one index goes before the one for any index.
+  // Values by opcode and index; an entry for one index takes precedence over the entry for any index.
   template <typename Value>
   using ByIndex = std::map<std::pair<VstInt32, std::optional<VstInt32>>, Value>;
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// How requests are read, expected and compared.
+// How requests are made from a call, made as expectations, and compared.
 #include "tests/shared/request.h"
 
 #include <algorithm>

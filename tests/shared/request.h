@@ -1,8 +1,7 @@
 // SPDX-License-Identifier: MIT
-// One request that a host made of a plug-in instance, kept as a value: compared with ==, printed by
-// GoogleTest.
+// One request that a host made of a plug-in instance, as a value: compared with ==, printed by GoogleTest.
 //
-// RecordingEffect makes them; tests write down the ones that they expect:
+// RecordingEffect makes them; tests name the ones that they expect:
 //   EXPECT_THAT(effect.requests(), ElementsAre(connectInput(1), connectInput(0), canDo("offline")));
 // A failing expectation prints them as effConnectInput(index 1, value 1), effCanDo("offline").
 #pragma once
@@ -20,16 +19,16 @@ namespace doubles {
 struct Pointee {
   enum class Kind {
     kNull,     ///< The pointer was null.
-    kText,     ///< A text that goes to the plug-in (opcodes 4, 27, 51), without its terminator.
-    kBytes,    ///< Data that goes to the plug-in (opcode 24), as many bytes as the request's value says.
-    kRoom,     ///< Room for the plug-in to fill: a text buffer, a record, the address of a chunk pointer.
-    kAddress,  ///< Anything else; only the address itself is known.
+    kText,     ///< A text for the plug-in to read (opcodes 4, 27, 51), without its zero byte.
+    kBytes,    ///< Data for the plug-in to read (opcode 24); the request's value is the size.
+    kRoom,     ///< Memory for the plug-in to fill: a text buffer, a record, a pointer to a chunk.
+    kAddress,  ///< Anything else; only the address is known.
   };
   Kind kind = Kind::kNull;
   std::string content;        ///< kText, kBytes.
-  std::size_t roomSize = 0;   ///< kRoom: the whole size in bytes, known from the opcode.
+  std::size_t roomSize = 0;   ///< kRoom: the size in bytes, known from the opcode.
   std::size_t zeroBytes = 0;  ///< kRoom: how many of these bytes were zero.
-  /// The pointer itself, for code that runs while the request is under way. Compared only for kAddress.
+  /// The pointer itself, valid during the request. Compared only for kAddress.
   void* address = nullptr;
 
   bool operator==(const Pointee& other) const;
@@ -45,24 +44,24 @@ struct Request {
   Pointee pointee;
   float opt = 0.0f;  ///< For setParameter: the value.
 
-  /// Bit by bit for opt: -0 differs from 0, and a NaN equals itself.
+  /// Compares opt bit by bit: -0 differs from 0, and a NaN equals itself.
   bool operator==(const Request& other) const;
   bool operator!=(const Request& other) const { return !(*this == other); }
 
-  /// This request, but in a room that holds only `zeroBytes` zero bytes: the host did not clear it.
+  /// This request with a room of which only `zeroBytes` bytes are zero: the host did not clear it.
   Request withZeroBytes(std::size_t zeroBytes) const;
 };
 
 void PrintTo(const Request& request, std::ostream* stream);
 
-/// What a dispatcher call asks, read from its arguments. Reads the whole room behind `ptr` when the opcode
-/// has one: 256 bytes for opcodes 5, 6, 7, 29; 500 for 8; 114 for 45, 47, 48, 70; 128 for 33, 34; 152 for 56;
-/// a pointer for 23.
+/// The request that a dispatcher call makes. Reads the whole room that `ptr` points to if the opcode has one:
+/// 256 bytes for opcodes 5, 6, 7, 29; 500 for 8; 114 for 45, 47, 48, 70; 128 for 33, 34; 152 for 56; the size
+/// of a pointer for 23.
 Request receivedRequest(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
 
 // ---- Expected requests ----
 
-/// Any request without text or data. Opcodes with a room are expected to bring it cleared, all bytes zero.
+/// Any request without text or data. If the opcode has a room, all its bytes are expected to be zero.
 Request request(VstEffectOpcode opcode, VstInt32 index = 0, VstIntPtr value = 0, float opt = 0.0f);
 
 Request setProgram(VstIntPtr program);                  ///< effSetProgram (2)
@@ -79,7 +78,7 @@ Request canParameterBeSetFromText(VstInt32 parameter);  ///< effString2Parameter
 Request setParameterFromText(VstInt32 parameter, const std::string& text);  ///< effString2Parameter (27)
 Request getChunk(VstInt32 index);                            ///< effGetChunk (23): 0 bank, 1 program
 Request setChunk(VstInt32 index, const std::string& bytes);  ///< effSetChunk (24): 0 bank, 1 program
-/// effGetSpeakerArrangement (69): one arrangement's address in value, the other's behind the pointer.
+/// effGetSpeakerArrangement (69): `input` is the request's value, `output` its pointer.
 Request speakerArrangement(const void* input, const void* output);
 Request getParameterOf(VstInt32 parameter);               ///< The instance's getParameter function.
 Request setParameterTo(VstInt32 parameter, float value);  ///< The instance's setParameter function.

@@ -4,13 +4,40 @@
 #include <cstdlib>
 #include <cstring>
 #include <ostream>
+#include <sstream>
 #include <string>
 
-#include "tests/shared/effect_opcode_names.h"
 #include "tests/shared/request.h"
 
 namespace doubles {
 namespace {
+
+/// The names of opcodes 0 to 79, in this order.
+constexpr const char* kOpcodeNames =
+    "effOpen effClose effSetProgram effGetProgram effSetProgramName effGetProgramName effGetParamLabel "
+    "effGetParamDisplay effGetParamName effGetVu effSetSampleRate effSetBlockSize effMainsChanged "
+    "effEditGetRect effEditOpen effEditClose effEditDraw effEditMouse effEditKey effEditIdle effEditTop "
+    "effEditSleep effIdentify effGetChunk effSetChunk effProcessEvents effCanBeAutomated "
+    "effString2Parameter effGetNumProgramCategories effGetProgramNameIndexed effCopyProgram "
+    "effConnectInput effConnectOutput effGetInputProperties effGetOutputProperties effGetPlugCategory "
+    "effGetCurrentPosition effGetDestinationBuffer effOfflineNotify effOfflinePrepare effOfflineRun "
+    "effProcessVarIo effSetSpeakerArrangement effSetBlockSizeAndSampleRate effSetBypass effGetEffectName "
+    "effGetErrorText effGetVendorString effGetProductString effGetVendorVersion effVendorSpecific "
+    "effCanDo effGetTailSize effIdle effGetIcon effSetViewPosition effGetParameterProperties "
+    "effKeysRequired effGetVstVersion effEditKeyDown effEditKeyUp effSetEditKnobMode "
+    "effGetMidiProgramName effGetCurrentMidiProgram effGetMidiProgramCategory effHasMidiProgramsChanged "
+    "effGetMidiKeyName effBeginSetProgram effEndSetProgram effGetSpeakerArrangement effShellGetNextPlugin "
+    "effStartProcess effStopProcess effSetTotalSampleToProcess effSetPanLaw effBeginLoadBank "
+    "effBeginLoadProgram effSetProcessPrecision effGetNumMidiInputChannels effGetNumMidiOutputChannels ";
+
+/// "opcode N" for a number without a name.
+std::string opcodeName(VstInt32 opcode) {
+  std::istringstream names(kOpcodeNames);
+  std::string name;
+  for (VstInt32 i = 0; i <= opcode && names >> name; ++i) {
+  }
+  return opcode >= 0 && names ? name : "opcode " + std::to_string(opcode);
+}
 
 bool sameBits(float a, float b) { return std::memcmp(&a, &b, sizeof a) == 0; }
 
@@ -20,7 +47,7 @@ std::string readable(const void* address) {
   return digits;
 }
 
-// The shortest of the usual forms that reads back as the same number.
+// The shorter of two forms that reads back as the same number.
 std::string readable(float number) {
   char digits[32];
   std::snprintf(digits, sizeof digits, "%g", static_cast<double>(number));
@@ -56,7 +83,7 @@ std::string readable(const Pointee& pointee) {
   return "";
 }
 
-// The value of a request about arrangements is the address of one.
+// The value of a request about speaker arrangements is the address of one.
 std::string readableValue(const Request& request) {
   const bool isAddress = request.pointee.kind == Pointee::Kind::kAddress;
   return isAddress ? readable(reinterpret_cast<const void*>(request.value)) : std::to_string(request.value);
@@ -82,7 +109,7 @@ void PrintTo(const Request& request, std::ostream* stream) {
   if (request.value != 0) add("value " + readableValue(request));
   add(readable(request.pointee));
   if (!sameBits(request.opt, 0.0f)) add("opt " + readable(request.opt));
-  *stream << effectOpcodeName(request.opcode) << "(" << arguments << ")";
+  *stream << opcodeName(request.opcode) << "(" << arguments << ")";
 }
 
 }  // namespace doubles
