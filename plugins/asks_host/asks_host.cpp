@@ -1,13 +1,12 @@
 // SPDX-License-Identifier: MIT
-// An effect that asks its host everything a host can be asked, three times: in its entry point, when opened,
-// when closed. Used by end_to_end_tests, which read the answers from the file named in ASKS_HOST_LOG, one a
-// line:
+// An effect that makes every request of its host three times: in its entry point, when opened, when closed.
+// Used by end_to_end_tests. It writes the answers to the file named in ASKS_HOST_LOG, one per line:
 //
 //   PLACE OPCODE answers NUMBER[, writes COUNT bytes "TEXT"]
 //   PLACE canDo "CAPABILITY" answers NUMBER
 //   PLACE service "NAME" answers 0 | a function that answers NUMBER
 //
-// PLACE is entry, open or close. COUNT reaches to the last byte of the buffer that the host changed.
+// PLACE is entry, open or close. COUNT is the number of bytes up to the last one that the host changed.
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -38,14 +37,15 @@ constexpr const char* kCapabilities[] = {
     "sendVstMidiEventFlagIsRealtime",
 };
 
-/// The text itself, in other letters, with a blank behind, without its last letter, and with one letter more.
+/// The text itself, with a capital first letter, with a blank at the end, without its last letter, and with
+/// one letter more.
 std::vector<std::string> variantsOf(const std::string& text) {
   std::string otherCase = text;
   otherCase[0] = static_cast<char>(otherCase[0] - 'a' + 'A');
   return {text, otherCase, text + ' ', text.substr(0, text.size() - 1), text + 's'};
 }
 
-/// One round of questions, in one place.
+/// Makes all requests in one place.
 class Questions {
  public:
   Questions(audioMasterCallback itsHost, AEffect* itsEffect, const char* itsPlace)
@@ -72,7 +72,7 @@ class Questions {
     void operator()(std::FILE* file) const { std::fclose(file); }
   };
 
-  /// Makes a request with a buffer in which every byte that the host writes is seen.
+  /// Makes a request with a buffer of 0xAA, so that every byte that the host writes can be seen.
   void askRequest(VstInt32 opcode) {
     constexpr char kUntouched = '\xAA';
     char buffer[128];
@@ -96,7 +96,7 @@ class Questions {
                  static_cast<long long>(answer));
   }
 
-  /// Index, value and option are odd: the host must not mind them.
+  /// Index, value and opt are arbitrary: the host must ignore them.
   void askService(std::string name) {
     const VstIntPtr answer = host(effect, kVendorService, 3, -5, name.data(), 0.25f);
     std::fprintf(log.get(), "%s service \"%s\" answers ", place, name.c_str());

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The state of a sample in chunks, all 32-bit floats in the machine's own byte order: a program's chunk is
-// its values; a bank's is the number of the current program, then the values of all programs.
+// The state of a sample as a chunk of 32-bit floats in the machine's byte order. The chunk of a program is
+// its parameter values; that of a bank is the number of the current program, then the values of all programs.
 #include <cstring>
 
 #include "plugins/base/sample_plugin.h"

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A working answer to every request that a host makes while it tries a plug-in out.
+// A correct answer to every request that the program makes.
 #include <cstdio>
 #include <cstdlib>
 
@@ -48,7 +48,7 @@ VstIntPtr SamplePlugin::dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr valu
       return canDo(static_cast<const char*>(ptr));
     case effGetVstVersion:
       return 2400;
-    default:  // Nothing to do, or not known: the interface does not tell the two apart.
+    default:  // 0 means "nothing to do" as well as "not supported".
       return 0;
   }
 }
@@ -98,7 +98,7 @@ VstIntPtr SamplePlugin::answerParameterRequest(VstInt32 opcode, VstInt32 index, 
   }
 }
 
-/// A null text asks whether texts are understood at all.
+/// With a null text the host asks whether this request is supported.
 VstIntPtr SamplePlugin::setFromText(VstInt32 index, const char* text) {
   if (text == nullptr) return 1;
   char* end = nullptr;

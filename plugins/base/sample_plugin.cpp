@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The record that the host holds, and the C functions behind it.
+// The record that the host gets, and its C functions.
 #include "plugins/base/sample_plugin.h"
 
 #include <algorithm>
@@ -7,7 +7,7 @@
 
 namespace sample_plugins {
 
-/// What the host calls. The sample is found through the record's own word.
+/// What the host calls. The record's `object` field points to the sample.
 struct CFunctions {
   static SamplePlugin& plugin(AEffect* effect) { return *static_cast<SamplePlugin*>(effect->object); }
 

@@ -1,15 +1,16 @@
 // SPDX-License-Identifier: MIT
-// What all sample plug-ins share: the interface's record, its C functions, and a working answer to every
-// request that a host makes while it tries a plug-in out.
+// The base of the sample plug-ins: the interface's record, its C functions, and a correct answer to every
+// request that the program makes.
 //
-// A sample derives from SamplePlugin, describes itself in a Description, overrides what makes it special, and
+// A sample derives from SamplePlugin, passes it a Description, overrides what it does differently, and
 // exports its entry point:
 //
-//   SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) { return instantiate<Quiet>(host);
+//   SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback host) {
+//     return instantiate<Quiet>(host);
 //   }
 //
-// Ownership: an instance owns itself from instantiate() until the host sends effClose (1).
-// Threads:   the host's; nothing is locked.
+// Ownership: an instance lives until the host sends effClose (1), and deletes itself then.
+// Threads:   not thread-safe.
 #pragma once
 
 #include <string>
@@ -20,12 +21,12 @@
 #include "vst2/host_opcodes.h"
 #include "vst2/properties.h"
 
-/// Written before an entry point, makes it a C function that the host can find by its name.
+/// Makes an entry point a C function that the module exports.
 #define SAMPLE_PLUGIN_EXPORT extern "C" __attribute__((visibility("default")))
 
 namespace sample_plugins {
 
-/// Longest texts of the interface, in bytes with the terminating zero.
+/// The interface's text sizes in bytes, with the terminating zero.
 constexpr std::size_t kParameterTextSize = 8;
 constexpr std::size_t kProgramNameSize = 24;
 constexpr std::size_t kEffectNameSize = 32;
@@ -48,7 +49,7 @@ struct Program {
   std::vector<float> values;  ///< One for each parameter.
 };
 
-/// What a sample says about itself.
+/// What a sample tells the host about itself.
 struct Description {
   std::string name;
   VstInt32 uniqueID;
@@ -72,15 +73,15 @@ class SamplePlugin {
  protected:
   /// Every request arrives here. effClose (1) is answered like the others; the instance is deleted after it.
   virtual VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
-  /// Called by the host alone: requests that read or set a value do not pass here.
+  /// Called by the host only: dispatcher requests that read or set a value do not call these two.
   virtual float getParameter(VstInt32 index);
   virtual void setParameter(VstInt32 index, float value);
-  /// Copies inputs to outputs; an output without an input is silent.
+  /// Copies each input to the output of the same number; further outputs are silent.
   virtual void process(float** inputs, float** outputs, VstInt32 frames);
-  /// 1 yes, -1 no, 0 do not know. (effCanDo, 51)
+  /// The answer to effCanDo (51): 1 yes, -1 no, 0 unknown.
   virtual VstIntPtr canDo(const std::string& capability);
 
-  /// What the sample calls to make a request of its host.
+  /// Call this to make a request of the host.
   const audioMasterCallback hostCallback;
 
  private:
@@ -99,12 +100,12 @@ class SamplePlugin {
 
   AEffect record;
   Description description;
-  std::vector<Program> programs;  ///< At least one, so that the parameters have a place for their values.
+  std::vector<Program> programs;  ///< Never empty: the parameter values are kept here.
   VstInt32 current = 0;
-  std::vector<float> chunk;  ///< The last one saved; the host reads it in place.
+  std::vector<float> chunk;  ///< The last one saved. The host gets a pointer to it.
 };
 
-/// Makes an instance of `Plugin`, or nothing for a host that does not even tell its version.
+/// Makes an instance of `Plugin`. Null when the host answers 0 to audioMasterVersion (1).
 template <typename Plugin>
 AEffect* instantiate(audioMasterCallback host) {
   if (host(nullptr, audioMasterVersion, 0, 0, nullptr, 0.0f) == 0) return nullptr;

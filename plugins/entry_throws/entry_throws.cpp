@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
 // A plug-in whose entry point throws a std::runtime_error.
-// Used by end_to_end_tests: the program drops it and is left without an instance.
+// Used by the fault matrix: there is no instance, so the program ends with status 7.
 #include <stdexcept>
 
 #include "plugins/base/sample_plugin.h"

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
-// An effect whose parameters read as 1/3 in all the digits of the register that a quotient is made in: on
-// 32-bit x86 that is 64 bits and no float at all. Used by end_to_end_tests, which read the file named in
-// EXCESS_PRECISION_LOG, "getParameter INDEX" or "setParameter INDEX" a line.
+// An effect that answers 1/3 for its parameters, with the precision of the register that holds the quotient:
+// on 32-bit x86 that is more than a float has. Used by end_to_end_tests. It writes "getParameter INDEX" or
+// "setParameter INDEX" for each call to the file named in EXCESS_PRECISION_LOG.
 #include <cstdio>
 #include <cstdlib>
 
@@ -19,7 +19,7 @@ void writeDown(const char* event, VstInt32 index) {
   std::fflush(log);
 }
 
-/// Put into the record itself: no code of ours stands between the quotient and the host.
+/// The host calls this directly: code in between could round the quotient.
 float getThird(AEffect*, VstInt32 index) {
   writeDown("getParameter", index);
   const volatile float one = 1.0f;

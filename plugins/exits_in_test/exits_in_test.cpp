@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
 // An effect that ends the process with status 42 when it is asked for its tail size.
-// Used by end_to_end_tests: the lines up to "inspect latency" stand, "unexpected exit" and the status follow.
+// Used by the fault matrix: "unexpected exit" follows the line "6, inspect latency", and the status is 42.
 #include <cstdlib>
 
 #include "plugins/base/sample_plugin.h"

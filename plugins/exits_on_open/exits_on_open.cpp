@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
 // An effect that ends the process with status 0 when it is opened.
-// Used by end_to_end_tests: "unexpected exit" tells this end from a pass.
+// Used by the fault matrix: "unexpected exit" is the only output, which tells this run from a pass.
 #include <cstdlib>
 
 #include "plugins/base/sample_plugin.h"

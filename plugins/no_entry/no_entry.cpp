@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// A module that loads and shows no entry point: its one function stays hidden.
-// Used by end_to_end_tests: there is no instance, so the program ends itself as if it had crashed.
+// A module that loads but exports no entry point: its one function is hidden.
+// Used by the fault matrix: there is no instance, so the program ends with status 7.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"
 
 extern "C" AEffect* makeInstance(audioMasterCallback host) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// A plug-in whose entry point refuses every host.
-// Used by end_to_end_tests: there is no instance, so the program ends itself as if it had crashed.
+// A plug-in whose entry point returns null.
+// Used by the fault matrix: there is no instance, so the program ends with status 7.
 #include "plugins/base/sample_plugin.h"
 
 SAMPLE_PLUGIN_EXPORT AEffect* VSTPluginMain(audioMasterCallback) { return nullptr; }

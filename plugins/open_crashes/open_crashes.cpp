@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: MIT
 // An effect that stores to address zero when it is opened.
-// Used by end_to_end_tests: status 7 after "unexpected exit", before any other line.
+// Used by the fault matrix: "unexpected exit" is the only output, and the status is 7.
 #include "plugins/base/sample_plugin.h"
 
 using namespace sample_plugins;
 
 namespace {
 
-// Both are volatile, the pointer and what it points to: a store to a known zero would be optimised away.
+// The pointer and its target are both volatile: otherwise the compiler may remove the store.
 volatile int* volatile nowhere = nullptr;
 
 class OpenCrashes : public SamplePlugin {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// What the host passed by pointer, as text that is the same in every run.
+// What a pointer from the host points to, as text that is the same in every run.
 #include "plugins/records_requests/pointer_content.h"
 
 #include <algorithm>
@@ -24,7 +24,7 @@ std::string hex(const void* data, std::size_t size) {
   return text;
 }
 
-/// Whether the host cleared its memory; what it holds otherwise.
+/// "zero" if all bytes are zero, otherwise the bytes.
 std::string zeroOrHex(const void* data, std::size_t size) {
   const auto* bytes = static_cast<const unsigned char*>(data);
   return std::all_of(bytes, bytes + size, [](unsigned byte) { return byte == 0; }) ? "zero" : hex(data, size);

@@ -1,14 +1,15 @@
 // SPDX-License-Identifier: MIT
-// An effect that writes down everything its host does with it: 2 inputs, 3 outputs, 3 programs, 3 parameters
-// (the last one stepped). Used by end_to_end_tests, which read the file named in RECORDS_REQUESTS_LOG, one
-// event a line:
+// An effect that records what its host does with it: 2 inputs, 3 outputs, 3 programs, 3 parameters (the last
+// one stepped). Used by end_to_end_tests and bench_tests. It writes to the file named in
+// RECORDS_REQUESTS_LOG, one line for each event:
 //
 //   INSTANCE entry
-//   INSTANCE dispatch OPCODE index INDEX value VALUE ptr CONTENT opt NUMBER     (CONTENT: see
-//   describePointer) INSTANCE getParameter INDEX answers NUMBER INSTANCE setParameter INDEX value NUMBER
+//   INSTANCE dispatch OPCODE index INDEX value VALUE ptr CONTENT opt NUMBER
+//   INSTANCE getParameter INDEX answers NUMBER
+//   INSTANCE setParameter INDEX value NUMBER
 //
-// Instances count from 1. RECORDS_REQUESTS_CHUNKS=1 makes it save its state in chunks,
-// RECORDS_REQUESTS_UNNAMED_PROGRAMS=1 leaves it without a name for a program that is not the current one.
+// INSTANCE counts from 1. CONTENT is that of describePointer(). With RECORDS_REQUESTS_CHUNKS=1 the state is
+// saved in chunks; with RECORDS_REQUESTS_UNNAMED_PROGRAMS=1 effGetProgramNameIndexed (29) is answered with 0.
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -35,7 +36,7 @@ Description describe() {
   return description;
 }
 
-/// The log, opened once; null when none is asked for.
+/// The log, opened once; null when no file is named.
 std::FILE* log() {
   static std::FILE* const file = [] {
     const char* path = std::getenv("RECORDS_REQUESTS_LOG");

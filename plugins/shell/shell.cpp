@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
-// A shell with three children: while the host names one as the current child, the entry point makes that
-// child. Used by end_to_end_tests for the short run of a shell and for runs of a child, known or not.
+// A shell with three children. The entry point makes the child that the host names as the current one, or the
+// shell itself. Used by end_to_end_tests for runs of the shell, of a child, and of a child that it does not
+// have.
 #include "plugins/base/sample_plugin.h"
 
 using namespace sample_plugins;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// An effect that calls a function which nobody defines.
-// Used by end_to_end_tests: the module must fail to load, and not crash later at the call.
+// An effect that calls a function which is defined nowhere.
+// Used by end_to_end_tests: loading the module must fail; the program must not crash later at the call.
 #include "plugins/base/sample_plugin.h"
 
 using namespace sample_plugins;

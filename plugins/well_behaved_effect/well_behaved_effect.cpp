@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The effect that does everything right: a volume control.
+// The effect without faults: a volume control.
 #include "plugins/well_behaved_effect/well_behaved_effect.h"
 
 namespace sample_plugins {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The effect that does everything right; other samples are this one with something wrong.
+// The effect without faults. Other samples derive from it and add one.
 #pragma once
 
 #include "plugins/base/sample_plugin.h"

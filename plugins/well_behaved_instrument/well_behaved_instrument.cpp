@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// An instrument without inputs that takes MIDI, saves its state in chunks, and does everything right.
-// Used by end_to_end_tests for a run that passes with chunks, and for the synth flag of a description.
+// An instrument that takes MIDI, has no inputs and saves its state in chunks, without faults.
+// Used by end_to_end_tests for a run of an instrument that passes.
 #include "plugins/base/sample_plugin.h"
 
 using namespace sample_plugins;

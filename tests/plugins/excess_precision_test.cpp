@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The sample with the wide answers gives them: without that, the test of the host proves nothing.
+// The sample's answers are more precise than a float where the processor allows it. Otherwise the test of the
+// host, which must round them, would prove nothing.
 #include <cstring>
 
 #include <gtest/gtest.h>
@@ -10,26 +11,18 @@ using namespace sample_plugins_test;
 
 namespace {
 
-TEST(ExcessPrecisionSample, ReadsAsOneThirdInAFloat) {
+TEST(ExcessPrecisionSample, AnswersOneThirdWithThePrecisionOfTheRegister) {
   AEffect* effect = LoadedPlugin("excess_precision").callEntry();
   const volatile float rounded = effect->getParameter(effect, 0);
   EXPECT_EQ(rounded, 0.333333343f);
-  EXPECT_EQ(effect->numParams, 2);
-  dispatch(*effect, effClose);
-}
-
 #if defined(__i386__)
-TEST(ExcessPrecisionSample, AnswersWithMoreDigitsThanAFloatHas) {
-  AEffect* effect = LoadedPlugin("excess_precision").callEntry();
-  // The same function, declared with the type that the register of its answer has.
+  // The same function, declared with the type of the register that holds its answer.
   long double (*wide)(AEffect*, VstInt32) = nullptr;
   static_assert(sizeof wide == sizeof effect->getParameter);
   std::memcpy(&wide, &effect->getParameter, sizeof wide);
-  const long double answer = wide(effect, 0);
-  EXPECT_NE(answer, static_cast<long double>(0.333333343f));
-  EXPECT_EQ(answer, 1.0L / 3.0L);
+  EXPECT_EQ(wide(effect, 0), 1.0L / 3.0L);
+#endif
   dispatch(*effect, effClose);
 }
-#endif
 
 }  // namespace

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// One sample plug-in, loaded and driven by hand: the smallest host there is.
+// One sample plug-in, loaded into the test program.
 #pragma once
 
 #include <array>
@@ -8,31 +8,28 @@
 
 #include <dlfcn.h>
 
+#include "tests/shared/program_run.h"
 #include "vst2/dispatch.h"
 #include "vst2/host_opcodes.h"
 
 namespace sample_plugins_test {
 
-/// What audioMasterCurrentId (2) answers.
-inline VstInt32 wantedChild = 0;
-
 inline VstIntPtr answerPlugin(AEffect*, VstInt32 opcode, VstInt32, VstIntPtr, void*, float) {
-  if (opcode == audioMasterVersion) return 2400;
-  return opcode == audioMasterCurrentId ? wantedChild : 0;
+  return opcode == audioMasterVersion ? 2400 : 0;
 }
 
-/// Loads the module when made, and leaves it loaded.
+/// Loads the module in its constructor. It stays loaded.
 class LoadedPlugin {
  public:
   /// Throws std::runtime_error with the reason when `name` cannot be loaded.
   explicit LoadedPlugin(const std::string& name)
-      : module(dlopen((std::string(SAMPLE_PLUGINS) + "/" + name + ".so").c_str(), RTLD_NOW | RTLD_LOCAL)) {
+      : module(dlopen(samplePlugin(name).c_str(), RTLD_NOW | RTLD_LOCAL)) {
     if (module == nullptr) throw std::runtime_error(dlerror());
   }
 
-  /// Calls the entry point of this name, which must be there. Null when the plug-in refuses.
-  AEffect* callEntry(const char* name = "VSTPluginMain") const {
-    const auto entry = reinterpret_cast<PluginEntryProc>(dlsym(module, name));
+  /// Calls the entry point, which must exist. Null when the plug-in returns no instance.
+  AEffect* callEntry() const {
+    const auto entry = reinterpret_cast<PluginEntryProc>(dlsym(module, "VSTPluginMain"));
     if (entry == nullptr) throw std::logic_error(dlerror());
     return entry(answerPlugin);
   }

@@ -1,14 +1,15 @@
 // SPDX-License-Identifier: MIT
-// The smallest host that is a program: loads one module, drives one instance, says how far it got.
+// A small host program without any guard against faults: loads one module, uses one instance, and prints a
+// line after each step.
 //
-//   tiny_host MODULE [ENTRY [CHILD]]     ENTRY is VSTPluginMain when not given, CHILD what
-//   audioMasterCurrentId (2)
-//                                        answers
+//   tiny_host MODULE [ENTRY [CHILD]]
 //
-// Prints a line after each step; "caught ..." and status 9 when the plug-in throws. All signals are the
-// system's own, except with TINY_HOST_ON_CRASH: a SIGSEGV or SIGABRT then prints "crashed", uses what it
-// names (malloc, stdout or exit), prints "not locked" and ends with status 8. With TINY_HOST_SECONDS, SIGALRM
-// ends it after that time.
+// ENTRY is the entry point, VSTPluginMain by default. CHILD is the answer to audioMasterCurrentId (2).
+//
+// When the plug-in throws, it prints "caught ..." and ends with status 9. Signals have their default action,
+// except with TINY_HOST_ON_CRASH=malloc, stdout or exit: on SIGSEGV and SIGABRT it then prints "crashed",
+// uses the named thing, and ends with status 8, after "not locked" unless it uses exit. With
+// TINY_HOST_SECONDS, SIGALRM ends it after that time.
 #include <array>
 #include <cmath>
 #include <csignal>
@@ -54,7 +55,7 @@ VstIntPtr answerPlugin(AEffect*, VstInt32 opcode, VstInt32, VstIntPtr, void* ptr
   }
 }
 
-/// Written at once and past the stream, which a plug-in may have locked.
+/// Bypasses stdout, which a plug-in may have locked.
 void say(const std::string& text) {
   const std::string line = text + '\n';
   if (write(STDOUT_FILENO, line.data(), line.size()) < 0) _exit(7);
