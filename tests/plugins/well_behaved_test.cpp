@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The well-behaved samples answer as a correct plug-in does. Their names, texts and records are also what the
-// golden conversations of end_to_end_tests are made of.
+// The well-behaved samples answer as a correct plug-in does, where the golden conversations of
+// end_to_end_tests do not show it.
 #include <cstring>
 #include <vector>
 
@@ -24,10 +24,6 @@ class WellBehavedEffect : public testing::Test {
 
 TEST_F(WellBehavedEffect, DescribesItself) {
   EXPECT_EQ(effect.magic, 0x56737450);
-  EXPECT_EQ(effect.numInputs, 2);
-  EXPECT_EQ(effect.numOutputs, 2);
-  EXPECT_EQ(effect.numParams, 3);
-  EXPECT_EQ(effect.numPrograms, 4);
   EXPECT_EQ(effect.flags, 16);
   EXPECT_EQ(effect.uniqueID, 0x57624566);
   EXPECT_EQ(dispatch(effect, effGetPlugCategory), 1);
@@ -40,12 +36,9 @@ TEST_F(WellBehavedEffect, DescribesItself) {
 TEST_F(WellBehavedEffect, DescribesAndParsesItsParameters) {
   EXPECT_EQ(textOf(effect, effGetParamName, 0), "Volume");
   EXPECT_EQ(textOf(effect, effGetParamLabel, 1), "%");
-  EXPECT_EQ(textOf(effect, effGetParamDisplay, 1), "0.250");
-  EXPECT_NE(dispatch(effect, effString2Parameter, 1, 0, nullptr), 0);
   EXPECT_NE(dispatch(effect, effString2Parameter, 1, 0, textArgument("0.75")), 0);
   EXPECT_EQ(dispatch(effect, effString2Parameter, 1, 0, textArgument("loud")), 0);
-  EXPECT_EQ(get(1), 0.75f);
-  EXPECT_EQ(dispatch(effect, effCanBeAutomated, 2), 1);
+  EXPECT_EQ(textOf(effect, effGetParamDisplay, 1), "0.750");
   VstParameterProperties properties{};
   ASSERT_EQ(dispatch(effect, effGetParameterProperties, 2, 0, &properties), 1);
   EXPECT_STREQ(properties.label, "Shape");
@@ -59,7 +52,6 @@ TEST_F(WellBehavedEffect, KeepsAValueAndANameForEachProgram) {
   effect.setParameter(&effect, 0, 0.125f);
   dispatch(effect, effSetProgram, 0, 3);
   dispatch(effect, effSetProgram, 0, 4);  // There is no such program.
-  EXPECT_EQ(dispatch(effect, effGetProgram), 3);
   EXPECT_EQ(get(0), 0.5f);
   EXPECT_EQ(textOf(effect, effGetProgramName), "Loud");
   dispatch(effect, effSetProgramName, 0, 0, textArgument("A name of more than 23 bytes"));

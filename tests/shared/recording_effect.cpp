@@ -1,17 +1,16 @@
 // SPDX-License-Identifier: MIT
-// How the recording instance records and answers.
+// How the recording instance records and answers, and keeps its programs and chunks.
 #include "tests/shared/recording_effect.h"
 
 #include <algorithm>
 #include <cstring>
 #include <iterator>
+#include <utility>
 
 namespace doubles {
 namespace {
 
 RecordingEffect& ownerOf(AEffect* effect) { return *static_cast<RecordingEffect*>(effect->object); }
-
-std::string withTerminator(const std::string& text) { return text + '\0'; }
 
 VstIntPtr write(const std::string& bytes, void* ptr) {
   if (ptr == nullptr) return 0;
@@ -106,10 +105,10 @@ VstIntPtr RecordingEffect::performOnPrograms(VstInt32 opcode, VstInt32 index, Vs
       if (ptr != nullptr) programs[currentProgram].name = static_cast<const char*>(ptr);
       return 0;
     case effGetProgramName:
-      return write(withTerminator(program(currentProgram).name), ptr);
+      return write(program(currentProgram).name + '\0', ptr);
     case effGetProgramNameIndexed:
       if (!namesProgramsByIndex || index < 0 || index >= aeffect.numPrograms) return 0;
-      return write(withTerminator(program(index).name), ptr);
+      return write(program(index).name + '\0', ptr);
     default:
       return 0;
   }
@@ -121,7 +120,7 @@ VstIntPtr RecordingEffect::nextShellChild(void* ptr) {
     return 0;
   }
   const ShellChild& child = children[nextChild++];
-  write(withTerminator(child.name), ptr);
+  write(child.name + '\0', ptr);
   return child.id;
 }
 
@@ -186,6 +185,40 @@ std::vector<Request> RecordingEffect::requestsOf(Request::Kind kind) const {
 void RecordingEffect::forget() {
   const std::lock_guard<std::mutex> guard(recording);
   recorded.clear();
+}
+
+// ---- What the test sets ----
+
+void RecordingEffect::answerNext(VstEffectOpcode opcode, std::initializer_list<VstIntPtr> numbers) {
+  std::deque<VstIntPtr>& queue = nextAnswers[opcode];
+  queue.insert(queue.end(), numbers);
+}
+
+void RecordingEffect::setShellChildren(std::vector<ShellChild> offered) {
+  children = std::move(offered);
+  nextChild = 0;
+}
+
+void RecordingEffect::setPrograms(std::vector<Program> replacement) {
+  programs.clear();
+  std::size_t mostParameters = 0;
+  for (std::size_t i = 0; i < replacement.size(); ++i) {
+    mostParameters = std::max(mostParameters, replacement[i].parameters.size());
+    programs[static_cast<VstInt32>(i)] = std::move(replacement[i]);
+  }
+  currentProgram = 0;
+  aeffect.numPrograms = static_cast<VstInt32>(replacement.size());
+  aeffect.numParams = static_cast<VstInt32>(mostParameters);
+}
+
+void RecordingEffect::setParameters(std::vector<float> values) {
+  aeffect.numParams = static_cast<VstInt32>(values.size());
+  programs[currentProgram].parameters = std::move(values);
+}
+
+Program RecordingEffect::program(VstInt32 index) const {
+  const auto found = programs.find(index);
+  return found == programs.end() ? Program{} : found->second;
 }
 
 }  // namespace doubles

@@ -79,32 +79,46 @@ class RecordingEffect {
   // ---- Scripted answers ----
 
   /// The number to answer to an opcode, for any index or for one. Texts and records are still written.
-  void answer(VstEffectOpcode opcode, VstIntPtr number);
-  void answerAt(VstEffectOpcode opcode, VstInt32 index, VstIntPtr number);
+  void answer(VstEffectOpcode opcode, VstIntPtr number) { answers[{opcode, std::nullopt}] = number; }
+  void answerAt(VstEffectOpcode opcode, VstInt32 index, VstIntPtr number) {
+    answers[{opcode, index}] = number;
+  }
   /// The numbers to answer to the next requests with this opcode; they take precedence over the ones above.
   void answerNext(VstEffectOpcode opcode, std::initializer_list<VstIntPtr> numbers);
 
   /// The text to write for an opcode, for any index or for one; the answer is 1.
-  void setText(VstEffectOpcode opcode, const std::string& text);
-  void setTextAt(VstEffectOpcode opcode, VstInt32 index, const std::string& text);
+  void setText(VstEffectOpcode opcode, const std::string& text) {
+    written[{opcode, std::nullopt}] = text + '\0';
+  }
+  void setTextAt(VstEffectOpcode opcode, VstInt32 index, const std::string& text) {
+    written[{opcode, index}] = text + '\0';
+  }
   /// Writes `size` bytes `fill` without a zero byte, whatever the size of the host's buffer.
-  void setUnterminatedText(VstEffectOpcode opcode, std::size_t size, char fill = 'x');
+  void setUnterminatedText(VstEffectOpcode opcode, std::size_t size, char fill = 'x') {
+    written[{opcode, std::nullopt}] = std::string(size, fill);
+  }
 
   /// The answer to effCanDo (51) for one capability; 0 for all others.
-  void setCapability(const std::string& capability, VstIntPtr number);
+  void setCapability(const std::string& capability, VstIntPtr number) { capabilities[capability] = number; }
 
   /// The records to write for opcodes 56, 33 and 34; the answer is 1. They are written even if the scripted
   /// answer is 0, as some plug-ins do.
-  void setParameterProperties(VstInt32 parameter, const VstParameterProperties& properties);
-  void setInputProperties(VstInt32 pin, const VstPinProperties& properties);
-  void setOutputProperties(VstInt32 pin, const VstPinProperties& properties);
+  void setParameterProperties(VstInt32 parameter, const VstParameterProperties& properties) {
+    written[{effGetParameterProperties, parameter}] = bytesOf(properties);
+  }
+  void setInputProperties(VstInt32 pin, const VstPinProperties& properties) {
+    written[{effGetInputProperties, pin}] = bytesOf(properties);
+  }
+  void setOutputProperties(VstInt32 pin, const VstPinProperties& properties) {
+    written[{effGetOutputProperties, pin}] = bytesOf(properties);
+  }
 
   /// What effShellGetNextPlugin (70) answers: one child per call, then 0 without a text, then the first
   /// again.
   void setShellChildren(std::vector<ShellChild> offered);
 
   /// Requests with this opcode are recorded and answered, but change and write nothing.
-  void ignore(VstEffectOpcode opcode);
+  void ignore(VstEffectOpcode opcode) { ignored.insert(opcode); }
 
   // ---- Programs, parameters, chunks ----
 
@@ -132,6 +146,11 @@ class RecordingEffect {
   // Values by opcode and index; an entry for one index takes precedence over the entry for any index.
   template <typename Value>
   using ByIndex = std::map<std::pair<VstInt32, std::optional<VstInt32>>, Value>;
+
+  template <typename Record>
+  static std::string bytesOf(const Record& record) {
+    return {reinterpret_cast<const char*>(&record), sizeof record};
+  }
 
   VstIntPtr dispatched(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt);
   float parameterRead(VstInt32 index);

@@ -40,34 +40,10 @@ bool bringsText(VstInt32 opcode) {
   return opcode == effSetProgramName || opcode == effString2Parameter || opcode == effCanDo;
 }
 
-Pointee text(const std::string& content) {
-  Pointee pointee;
-  pointee.kind = Pointee::Kind::kText;
-  pointee.content = content;
-  return pointee;
-}
-
-Pointee bytes(const std::string& content) {
-  Pointee pointee;
-  pointee.kind = Pointee::Kind::kBytes;
-  pointee.content = content;
-  return pointee;
-}
-
-Pointee room(std::size_t size, std::size_t zeroBytes) {
-  Pointee pointee;
-  pointee.kind = Pointee::Kind::kRoom;
-  pointee.roomSize = size;
-  pointee.zeroBytes = zeroBytes;
-  return pointee;
-}
-
-Pointee address(const void* ptr) {
-  Pointee pointee;
-  pointee.kind = Pointee::Kind::kAddress;
-  pointee.address = const_cast<void*>(ptr);
-  return pointee;
-}
+Pointee text(const std::string& content) { return {Pointee::Kind::kText, content}; }
+Pointee bytes(const std::string& content) { return {Pointee::Kind::kBytes, content}; }
+Pointee room(std::size_t size, std::size_t zeroBytes) { return {Pointee::Kind::kRoom, "", size, zeroBytes}; }
+Pointee address(const void* ptr) { return {Pointee::Kind::kAddress, "", 0, 0, const_cast<void*>(ptr)}; }
 
 Pointee readPointee(VstInt32 opcode, VstIntPtr value, void* ptr) {
   if (ptr == nullptr) return {};
@@ -83,12 +59,7 @@ Pointee readPointee(VstInt32 opcode, VstIntPtr value, void* ptr) {
 bool sameBits(float a, float b) { return std::memcmp(&a, &b, sizeof a) == 0; }
 
 Request withPointee(VstEffectOpcode opcode, VstInt32 index, VstIntPtr value, Pointee pointee) {
-  Request expected;
-  expected.opcode = opcode;
-  expected.index = index;
-  expected.value = value;
-  expected.pointee = std::move(pointee);
-  return expected;
+  return {Request::Kind::kDispatch, opcode, index, value, std::move(pointee)};
 }
 
 }  // namespace
@@ -110,21 +81,14 @@ Request Request::withZeroBytes(std::size_t zeroBytes) const {
 }
 
 Request receivedRequest(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) {
-  Request received;
-  received.opcode = opcode;
-  received.index = index;
-  received.value = value;
-  received.pointee = readPointee(opcode, value, ptr);
-  received.pointee.address = ptr;
-  received.opt = opt;
-  return received;
+  Pointee pointee = readPointee(opcode, value, ptr);
+  pointee.address = ptr;
+  return {Request::Kind::kDispatch, opcode, index, value, std::move(pointee), opt};
 }
 
 Request request(VstEffectOpcode opcode, VstInt32 index, VstIntPtr value, float opt) {
   const std::size_t size = roomSizeOf(opcode);
-  Request expected = withPointee(opcode, index, value, size == 0 ? Pointee{} : room(size, size));
-  expected.opt = opt;
-  return expected;
+  return {Request::Kind::kDispatch, opcode, index, value, size == 0 ? Pointee{} : room(size, size), opt};
 }
 
 Request setProgram(VstIntPtr program) { return request(effSetProgram, 0, program); }
@@ -150,19 +114,9 @@ Request speakerArrangement(const void* input, const void* output) {
                      output == nullptr ? Pointee{} : address(output));
 }
 
-Request getParameterOf(VstInt32 parameter) {
-  Request expected;
-  expected.kind = Request::Kind::kGetParameter;
-  expected.index = parameter;
-  return expected;
-}
-
+Request getParameterOf(VstInt32 parameter) { return {Request::Kind::kGetParameter, 0, parameter}; }
 Request setParameterTo(VstInt32 parameter, float value) {
-  Request expected;
-  expected.kind = Request::Kind::kSetParameter;
-  expected.index = parameter;
-  expected.opt = value;
-  return expected;
+  return {Request::Kind::kSetParameter, 0, parameter, 0, {}, value};
 }
 
 }  // namespace doubles

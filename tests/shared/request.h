@@ -41,7 +41,7 @@ struct Request {
   VstInt32 opcode = 0;  ///< VstEffectOpcode; 0 for the parameter functions.
   VstInt32 index = 0;
   VstIntPtr value = 0;
-  Pointee pointee;
+  Pointee pointee = {};
   float opt = 0.0f;  ///< For setParameter: the value.
 
   /// Compares opt bit by bit: -0 differs from 0, and a NaN equals itself.
