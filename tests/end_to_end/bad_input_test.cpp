@@ -84,7 +84,7 @@ constexpr const char* kBothArchitectures = "is for x86_64, this program is for i
 
 std::string otherArchitecture(const fs::path& folder) { return file(forTheOtherArchitecture())(folder); }
 
-std::string otherArchitectureBehindLink(const fs::path& folder) {
+std::string otherArchitectureThroughLink(const fs::path& folder) {
   fs::create_directory(folder / "Odd.vst");
   fs::create_symlink(otherArchitecture(folder), folder / "Odd.vst/Odd.so");
   return (folder / "Odd.vst").string();
@@ -146,9 +146,8 @@ const BadInput kBadInputs[] = {
     {"Program", "executable", path(VSTTORTURE_PROGRAM)},
     {"UndefinedSymbol", "numberThatNobodyDefines", path(samplePlugin("undefined_symbol"))},
     {"OtherArchitecture", kBothArchitectures, otherArchitecture},
-    {"OtherArchitectureBehindLink", kBothArchitectures, otherArchitectureBehindLink},
-    {"OtherArchitectureInFolder", "is for s390x, this program is for ",
-     otherArchitectureInFolder},
+    {"OtherArchitectureThroughLink", kBothArchitectures, otherArchitectureThroughLink},
+    {"OtherArchitectureInFolder", "is for s390x, this program is for ", otherArchitectureInFolder},
 };
 
 void expectOneFailureAndOneReason(const ProgramRun& run, const std::string& reason) {

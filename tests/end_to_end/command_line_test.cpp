@@ -20,7 +20,7 @@ TEST(CommandLine, WithoutArgumentsShowsTheUsage) {
   EXPECT_EQ(run.end, "exit status 2");
 }
 
-TEST(CommandLine, IgnoresEverythingBehindTheSecondArgument) {
+TEST(CommandLine, IgnoresEverythingAfterTheSecondArgument) {
   const ProgramRun run = runVstTorture({samplePlugin("shell"), "1234", "", "--help", "/x"});
   EXPECT_TRUE(matchesGolden("passing_run", linesAndEnd(run)));
 }
@@ -60,7 +60,7 @@ INSTANTIATE_TEST_SUITE_P(
     Texts, ChildArgument,
     testing::Values(ChildNumber{"Decimal", "1001", "child"}, ChildNumber{"Negative", "-7", "child"},
                     ChildNumber{"PlusSign", "+1001", "child"}, ChildNumber{"BlanksBefore", "  1001", "child"},
-                    ChildNumber{"TextBehind", "1234x", "child"},
+                    ChildNumber{"TextAfterIt", "1234x", "child"},
                     ChildNumber{"LeadingZeros", "0001001", "child"}, ChildNumber{"Zero", "0", "shell"},
                     ChildNumber{"Hexadecimal", "0x3e9", "shell"},
                     ChildNumber{"NoNumber", "First child", "shell"}, ChildNumber{"Empty", "", "shell"},

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
 // Every request that a run makes of a plug-in, and between which lines of the program.
 //
-// The recording sample writes each request to the program's standard output, so it stands behind the line of
+// The recording sample writes each request to the program's standard output, so it follows the line of
 // the step that made it. The golden files hold the conversation of the steps in fixed order; a step that
 // makes the same requests as an earlier one is one line there. The requests of a drawn test must be those of
 // the same test in the fixed order. Two tests depend on the current program, and the fixed order runs them on
@@ -38,12 +38,13 @@ struct Step {
 };
 
 struct Conversation {
-  Lines golden;  ///< As golden files have it.
+  Lines golden;  ///< In the form of the golden file.
   std::vector<Step> ordered;
   std::vector<Step> drawn;
 };
 
-/// What a golden file holds instead of requests that are those of an earlier step; empty when there is none.
+/// The line that replaces the requests of `step` in a golden file when an earlier step makes the same; empty
+/// when none does.
 std::string earlierStep(const std::vector<Step>& steps, const Step& step, char instance) {
   for (const Step& earlier : steps) {
     if (!step.requests.empty() && earlier.requests == step.requests) {
@@ -66,7 +67,7 @@ Conversation conversationOf(const ProgramRun& run) {
     }
     const char instance = number < 14 ? '1' : '2';
     Step step{number, section.line.text, {}};
-    Lines close;  // The last one, made behind the last step.
+    Lines close;  // Made after the last step, and no part of it.
     for (const std::string& line : section.pluginLines) {
       EXPECT_EQ(line.substr(0, 2), std::string(1, instance) + ' ') << number << ": " << line;
       if (line.find(" dispatch 1 index") == 1) {
@@ -175,9 +176,9 @@ struct Fault {
 };
 
 /// Runs with the faulty sample, which writes its requests to the program's standard output.
-class ConversationAfterAFault : public testing::TestWithParam<Fault> {};
+class RequestsAfterAFault : public testing::TestWithParam<Fault> {};
 
-TEST_P(ConversationAfterAFault, EndsWith) {
+TEST_P(RequestsAfterAFault, AreTheExpectedOnes) {
   ProgramCall call = faultyPlugin(GetParam().kind, GetParam().place);
   call.environment["FAULT_LOG"] = "/dev/stdout";
   // On purpose: an instance that could not be opened is not closed.
@@ -188,7 +189,7 @@ TEST_P(ConversationAfterAFault, EndsWith) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Faults, ConversationAfterAFault,
+    Faults, RequestsAfterAFault,
     testing::Values(Fault{"TheCloseAndThenTheFailureLine",
                           "throw_int",
                           "dispatch:52",

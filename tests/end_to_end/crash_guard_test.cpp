@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// What the fault matrix leaves open about crashes: that a run ends soon, that the crash itself writes nothing
-// to standard error, and that a plug-in's text stands before "unexpected exit".
+// What the fault matrix does not check about crashes: the time that a run takes to end, what is written to
+// standard error, and that text without a line end is printed before "unexpected exit".
 #include <gmock/gmock.h>
 
 #include "tests/shared/program_run.h"

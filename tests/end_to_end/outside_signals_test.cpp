@@ -30,9 +30,9 @@ struct Ending {
   std::string kind = "hang";
 };
 
-class SignalFromOutside : public testing::TestWithParam<Ending> {};
+class SignalFromTheHost : public testing::TestWithParam<Ending> {};
 
-TEST_P(SignalFromOutside, EndsARunThatHangs) {
+TEST_P(SignalFromTheHost, EndsARunThatHangs) {
   const std::string reason = GetParam().signals.size() > 1 ? kNotWithNestedHandlers.reason() : "";
   if (!reason.empty()) GTEST_SKIP() << reason;
   const ProgramRun run = runVstTorture(hanging(GetParam().kind, GetParam().signals));
@@ -42,7 +42,7 @@ TEST_P(SignalFromOutside, EndsARunThatHangs) {
   EXPECT_THAT(run.secondsSinceInterruption, Lt(kEndLimitInSeconds));
 }
 
-INSTANTIATE_TEST_SUITE_P(Signals, SignalFromOutside,
+INSTANTIATE_TEST_SUITE_P(Signals, SignalFromTheHost,
                          testing::Values(Ending{"SIGTERM", {SIGTERM}}, Ending{"SIGINT", {SIGINT}},
                                          Ending{"SIGHUP", {SIGHUP}}, Ending{"SIGSEGV", {SIGSEGV}},
                                          Ending{"SIGABRT", {SIGABRT}}, Ending{"SIGBUS", {SIGBUS}},
@@ -53,7 +53,7 @@ INSTANTIATE_TEST_SUITE_P(Signals, SignalFromOutside,
                          [](const auto& instance) { return instance.param.name; });
 
 // The second signal may come while the handler of the first one writes "unexpected exit".
-TEST(TwoSignals, GiveOneUnexpectedExitAtAnyDistance) {
+TEST(TwoSignals, GiveOneUnexpectedExitWhateverTheTimeBetweenThem) {
   if (!kNotWithNestedHandlers.reason().empty()) GTEST_SKIP() << kNotWithNestedHandlers.reason();
   ProgramCall call = hanging("hang", {SIGTERM, SIGINT});
   call.interruption.afterSeconds = 0.001;

@@ -45,7 +45,7 @@ TEST(HostThatStopsReading, DoesNotKeepACrashedProgramAlive) {
   }
 }
 
-TEST(HostThatStopsReading, CanEndAProgramThatWaitsForRoom) {
+TEST(HostThatStopsReading, CanEndAProgramThatWaitsForRoomInThePipe) {
   ProgramCall call = faulty("flood_stdout", "dispatch:52", Reader::kStops);
   call.interruption.signals = {SIGTERM};
   call.interruption.afterText = "6, inspect latency\n";
@@ -69,8 +69,8 @@ TEST(ClosedStandardOutput, ChangesNoStatus) {
   EXPECT_EQ(runVstTorture(call).end, "exit status 0");
 }
 
-// Nobody is left to read the result: the system ends the program at its first line.
-TEST(HostThatHasGone, EndsTheProgram) {
+// Nobody reads the output: SIGPIPE ends the program at its first line.
+TEST(HostThatHasExited, EndsTheProgram) {
   ProgramCall call;
   call.arguments = {samplePlugin("well_behaved_effect")};
   call.reader = Reader::kIsGone;

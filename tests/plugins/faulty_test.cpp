@@ -122,12 +122,12 @@ INSTANTIATE_TEST_SUITE_P(Faulty, FaultPlace,
 struct Lock {
   std::string kind;
   std::string use;  ///< What the tiny host does in its handler of the crash.
-  std::string end;  ///< SIGALRM after a second: the lock is held by somebody else.
+  std::string end;  ///< SIGALRM (14) after a second where the lock is held.
 };
 
 class FaultLock : public testing::TestWithParam<Lock> {};
 
-TEST_P(FaultLock, IsHeldDuringTheCrash) {
+TEST_P(FaultLock, IsHeldDuringTheCrashesThatAreNamedForIt) {
   const ProgramRun run = driveFaulty(GetParam().kind, "dispatch:52",
                                      {{"TINY_HOST_ON_CRASH", GetParam().use}, {"TINY_HOST_SECONDS", "1"}});
   EXPECT_EQ(run.end, GetParam().end);
@@ -139,7 +139,7 @@ INSTANTIATE_TEST_SUITE_P(Faulty, FaultLock,
                                          Lock{"crash_with_stdout_lock", "stdout", "signal 14"},
                                          Lock{"crash_under_destructor_lock", "exit", "signal 14"},
                                          Lock{"crash_with_own_stdout_lock", "stdout", "exit status 8"},
-                                         // No lock is held here.
+                                         // Control cases: a plain crash holds no lock.
                                          Lock{"null_store", "malloc", "exit status 8"},
                                          Lock{"null_store", "stdout", "exit status 8"},
                                          Lock{"null_store", "exit", "exit status 8"}),
@@ -153,7 +153,7 @@ TEST(FaultThatWaits, CrashesWhenTheProcessEnds) {
   }
 }
 
-TEST(FaultThatStays, HangsAsleepOrAwake) {
+TEST(HangingFault, SleepsOrSpinsForEver) {
   for (const char* kind : {"hang", "spin"}) {
     const ProgramRun run = driveFaulty(kind, "dispatch:52", {{"TINY_HOST_SECONDS", "1"}});
     EXPECT_EQ(run.end, "signal 14") << kind;

@@ -74,7 +74,7 @@ TEST_P(SamplePlugin, DoesItsOneThing) {
   EXPECT_EQ(lines(run.standardOutput).back(), GetParam().lastLine);
 }
 
-// What ends no run is seen in the runs of end_to_end_tests that pass.
+// Samples without a fault are tested by the passing runs of end_to_end_tests.
 INSTANTIATE_TEST_SUITE_P(
     Samples, SamplePlugin,
     testing::Values(Behaviour{"both_entries", "main_macho", "no instance", "exit status 3"},

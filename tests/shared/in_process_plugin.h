@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
 // A plug-in module that lives in the test program: a bundle of the recording CoreFoundation whose entry point
-// hands out the instances that the test prepared.
+// returns the instances that the test prepared.
 //
 //   RecordingCoreFoundation core_foundation;
 //   InProcessPlugin plugin(core_foundation, "/b.vst");

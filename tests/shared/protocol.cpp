@@ -37,9 +37,9 @@ ProtocolLine readLine(const std::string& line) {
   const std::size_t comma = line.find(", ");
   if (comma == std::string::npos) return {Kind::kOther, 0, "", line};
   const std::string before = line.substr(0, comma);
-  const std::string behind = line.substr(comma + 2);
-  if (before == "total" && isNumber(behind)) return {Kind::kTotal, std::stoi(behind), "", line};
-  if (isNumber(before)) return {Kind::kStep, std::stoi(before), behind, line};
+  const std::string after = line.substr(comma + 2);
+  if (before == "total" && isNumber(after)) return {Kind::kTotal, std::stoi(after), "", line};
+  if (isNumber(before)) return {Kind::kStep, std::stoi(before), after, line};
   return {Kind::kOther, 0, "", line};
 }
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The reader of the output takes exactly the program's lines for lines of the program.
+// The reader of the output recognises the program's lines and no others.
 #include <gmock/gmock.h>
 
 #include "tests/shared/protocol.h"
@@ -12,7 +12,7 @@ namespace {
 
 using Kind = ProtocolLine::Kind;
 
-TEST(ReadLine, TellsTheFourLinesOfTheProgram) {
+TEST(ReadLine, RecognisesTheLinesOfTheProgram) {
   EXPECT_EQ(readLine("total, 51").kind, Kind::kTotal);
   EXPECT_EQ(readLine("total, 51").number, 51);
   EXPECT_EQ(readLine("14, initialize").kind, Kind::kStep);
@@ -30,7 +30,7 @@ TEST(ReadLine, LeavesEverythingElseToThePlugin) {
   }
 }
 
-TEST(Sections, HoldThePluginsLinesBehindTheProgramsLine) {
+TEST(Sections, HoldThePluginsLinesThatFollowALineOfTheProgram) {
   const std::vector<Section> all = sections("loading\ntotal, 64\n1, first\none\ntwo\n!first failed 5\nbye");
   ASSERT_THAT(all, SizeIs(4));
   EXPECT_THAT(all[0].pluginLines, ElementsAre("loading"));

@@ -137,8 +137,8 @@ class RecordingEffect {
   bool namesProgramsByIndex = false;
 
   /// State for effGetChunk (23) and effSetChunk (24): index 0 is the bank, any other index the program.
-  /// Without effFlagsProgramChunks both requests answer 0 and do nothing. The memory behind an effGetChunk
-  /// answer is valid until the next effGetChunk or effClose.
+  /// Without effFlagsProgramChunks both requests answer 0 and do nothing. The memory that effGetChunk
+  /// returns is valid until the next effGetChunk or effClose.
   std::string bankChunk;
   std::string programChunk;
 

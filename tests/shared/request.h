@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
 // One request that a host made of a plug-in instance, as a value: compared with ==, printed by GoogleTest.
 //
-// RecordingEffect makes them; tests name the ones that they expect:
+// RecordingEffect records them; tests make the expected ones:
 //   EXPECT_THAT(effect.requests(), ElementsAre(connectInput(1), connectInput(0), canDo("offline")));
 // A failing expectation prints them as effConnectInput(index 1, value 1), effCanDo("offline").
 #pragma once

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Requests as values: what is read from a call, which ones are equal, and how they are printed.
+// Requests as values: what is read from a call, when two are equal, and how they are printed.
 #include <cmath>
 #include <limits>
 #include <string>
@@ -34,7 +34,7 @@ TEST(ReceivedRequest, CountsTheZeroBytesOfTheWholeRoom) {
   }
 }
 
-TEST(ReceivedRequest, KeepsTextsAsTheyWereWhenTheyCameIn) {
+TEST(ReceivedRequest, CopiesTextsWhenTheRequestIsMade) {
   char text[] = "offline";
   const Request capability = receivedRequest(effCanDo, 0, 0, text, 0.0f);
   const Request name = receivedRequest(effSetProgramName, 0, 0, text, 0.0f);
@@ -83,7 +83,7 @@ TEST(RequestEquality, ComparesNumbersBitByBit) {
   EXPECT_EQ(setParameterTo(0, nan), setParameterTo(0, nan));
 }
 
-TEST(ExpectedRequests, SayWhatTheirNamesSay) {
+TEST(ExpectedRequests, HaveTheOpcodeAndTheArgumentsOfTheirName) {
   EXPECT_EQ(setProgram(3), receivedRequest(2, 0, 3, nullptr, 0.0f));
   char buffer[256] = {};
   EXPECT_EQ(programNameIndexed(7), receivedRequest(29, 7, -1, buffer, 0.0f));
