@@ -32,6 +32,13 @@ void installSignalGuard() {
 
 }  // namespace
 
+void initialiseUnwinder() {
+  try {
+    throw 0;
+  } catch (int) {
+  }
+}
+
 void signal_callback_handler(int) { exitAfterCrash(); }
 
 CPPAutoReleasePool::CPPAutoReleasePool(int crashCode) {

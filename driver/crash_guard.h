@@ -5,6 +5,13 @@
 struct AutoreleasePool;
 struct ExceptionDelegate;
 
+/// Throws once and catches, so that the shared unwinder finds its way through our frames from then on.
+///
+/// The unwinder fills its tables when it is first used. A plug-in that brings a C++ runtime of its own, symbols
+/// hidden, has an unwinder of its own too and never uses ours: before ours has been used, what such a plug-in
+/// throws ends the process in our frames instead of reaching our handler. Call it before a plug-in is loaded.
+void initialiseUnwinder();
+
 /// The handler of every guarded signal: ends the process through exit(gCrashCode).
 void signal_callback_handler(int);
 

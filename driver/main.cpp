@@ -26,6 +26,7 @@ VST_loadID childNamed(const char* argument) {
 }  // namespace
 
 int main(int argc, const char** argv) {
+  initialiseUnwinder();
   openReport();
   const CPPAutoReleasePool pool(kExitCrashed);
   if (argc < 2) {

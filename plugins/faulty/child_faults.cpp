@@ -20,13 +20,39 @@ void doInAChild(void (*work)()) {
   waitpid(child, nullptr, 0);
 }
 
+/// Longer than a host should wait for a process that the plug-in left behind.
+constexpr unsigned kChildLifeInSeconds = 30;
+
+/// Does `work` in a process with a session of its own: killing the plug-in's process group does not reach it.
+void doInASessionOfItsOwn(void (*work)()) {
+  const pid_t child = fork();
+  if (child != 0) {
+    while (getsid(child) != child) usleep(100);
+    return;
+  }
+  setsid();
+  alarm(kChildLifeInSeconds);
+  work();
+  _exit(0);
+}
+
 }  // namespace
 
-/// The child holds on to the stream for half a minute, longer than its host should wait.
 void forkKeepingStdout() {
   if (fork() != 0) return;
-  sleep(30);
+  sleep(kChildLifeInSeconds);
   _exit(0);
+}
+
+void daemonKeepingStdout() {
+  doInASessionOfItsOwn([] { sleep(kChildLifeInSeconds); });
+}
+
+/// The daemon ends when nobody reads the stream any more.
+void daemonFloodingStdout() {
+  doInASessionOfItsOwn([] {
+    for (;;) floodStdout();
+  });
 }
 
 /// From here on there are two of them.

@@ -6,7 +6,9 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <cwchar>
 #include <exception>
+#include <iostream>
 #include <sstream>
 #include <stdexcept>
 
@@ -16,6 +18,7 @@ namespace sample_plugins {
 
 VstInt32 longTextRequest = kNoRequest;
 bool yieldsNoInstance = false;
+bool answersNullChunk = false;
 
 namespace {
 
@@ -28,7 +31,7 @@ std::string& kindUnderWay() {
   return kind;
 }
 
-/// What stands behind the colon of the fault's name; empty without one.
+/// What follows the colon in the fault's name; empty without one.
 std::string faultDetail() {
   const std::size_t colon = kindUnderWay().find(':');
   return colon == std::string::npos ? "" : kindUnderWay().substr(colon + 1);
@@ -42,13 +45,23 @@ void answerLongTexts() {
 /// Stays in the stream's buffer until somebody flushes it.
 void printWithoutNewline() { std::fputs("a text without an end", stdout); }
 
+// Wide output turns a stream wide that has no orientation yet, and a wide stream prints no bytes. On a byte stream
+// wprintf prints nothing, while std::wcout still prints its text.
+
+void printWide() { std::wprintf(L"a wide text\n"); }
+
+/// A fault may come while the module is loaded, before the stream of this file is ready.
+void printToWideStream() {
+  static const std::ios_base::Init streams;
+  std::wcout << L"a text without an end" << std::flush;
+}
+
 void divideByZero() {
   volatile int number = 0;
   number = 100 / number;  // 1 / number would be done without a division.
 }
 
-void raiseSignal() {
-  const std::string name = faultDetail();
+void raiseSignalNamed(const std::string& name) {
   for (int number = 1; number < NSIG; ++number) {
     const char* abbreviation = sigabbrev_np(number);
     if (abbreviation != nullptr && name == std::string("SIG") + abbreviation) {
@@ -57,6 +70,13 @@ void raiseSignal() {
     }
   }
   complain("no such signal: " + name);
+}
+
+void raiseSignal() { raiseSignalNamed(faultDetail()); }
+
+void raiseSignalInAtExit() {
+  static const std::string name = faultDetail();
+  std::atexit([] { raiseSignalNamed(name); });
 }
 
 void hang() {
@@ -86,6 +106,7 @@ constexpr Fault kFaults[] = {
     {"_exit", [] { _exit(exitStatus()); }},
     {"quick_exit", [] { std::quick_exit(exitStatus()); }},
     {"raise", raiseSignal},
+    {"raise_in_atexit", raiseSignalInAtExit},
     {"divide_by_zero", divideByZero},
     {"illegal_instruction", [] { __builtin_trap(); }},
     {"double_free", freeTwice},
@@ -111,6 +132,8 @@ constexpr Fault kFaults[] = {
     {"block_signals_then_crash", blockSignalsThenCrash},
     {"block_signals", blockSignalsButCrashes},
     {"print", printWithoutNewline},
+    {"wprintf", printWide},
+    {"wcout", printToWideStream},
     {"buffer_stdout", bufferStdout},
     {"close_stdout", closeStdout},
     {"close_stderr", [] { close(STDERR_FILENO); }},
@@ -118,7 +141,10 @@ constexpr Fault kFaults[] = {
     {"flood_stdout", floodStdout},
     {"long_texts", answerLongTexts},
     {"no_instance", [] { yieldsNoInstance = true; }},
+    {"null_chunk", [] { answersNullChunk = true; }},
     {"fork_keeping_stdout", forkKeepingStdout},
+    {"daemon_keeping_stdout", daemonKeepingStdout},
+    {"daemon_flooding_stdout", daemonFloodingStdout},
     {"fork_child_goes_on", forkChildThatGoesOn},
     {"fork_child_exits", forkChildThatExits},
     {"fork_child_crashes", forkChildThatCrashes},
@@ -129,6 +155,16 @@ constexpr Fault kFaults[] = {
     {"hang", hang},
     {"spin", spin},
 };
+
+/// Takes "@load" off the end of a kind; false for a kind without it.
+bool takeLoadSuffix(std::string& kind) {
+  const std::string suffix = "@load";
+  if (kind.size() < suffix.size() || kind.compare(kind.size() - suffix.size(), suffix.size(), suffix) != 0) {
+    return false;
+  }
+  kind.erase(kind.size() - suffix.size());
+  return true;
+}
 
 void commitOneFault() {
   const std::string name = kindUnderWay().substr(0, kindUnderWay().find(':'));
@@ -143,11 +179,13 @@ void commitOneFault() {
 
 }  // namespace
 
-void commitFault() {
+void commitFaults(bool whileLoading) {
   const char* kinds = std::getenv("FAULT_KIND");
   if (kinds == nullptr) complain("FAULT_PLACE is set, FAULT_KIND is not");
   std::istringstream stream(kinds);
-  while (std::getline(stream, kindUnderWay(), '+')) commitOneFault();
+  while (std::getline(stream, kindUnderWay(), '+')) {
+    if (takeLoadSuffix(kindUnderWay()) == whileLoading) commitOneFault();
+  }
 }
 
 void complain(const std::string& problem) {

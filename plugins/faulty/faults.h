@@ -1,10 +1,11 @@
 // SPDX-License-Identifier: MIT
 // What goes wrong, as the environment variable FAULT_KIND says. The names stand in the table of faults.cpp.
 //
-// Several faults, joined by a plus sign, are committed one after the other: print+null_store.
-// FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise takes the signal's
-// name behind a colon: raise:SIGTERM. long_texts takes the request whose answer is too long, or all of them:
-// long_texts:45.
+// Several faults, joined by a plus sign, are committed one after the other: print+null_store. One that ends in
+// "@load" is committed while the module is loaded, the others at FAULT_PLACE: buffer_stdout@load+raise:SIGKILL.
+// FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise and raise_in_atexit take
+// the signal's name after a colon: raise:SIGTERM. long_texts takes the request whose answer is too long, or all of
+// them: long_texts:45.
 #pragma once
 
 #include <string>
@@ -13,8 +14,9 @@
 
 namespace sample_plugins {
 
-/// Does what FAULT_KIND names. Returns from those faults that leave the plug-in running.
-void commitFault();
+/// Commits the faults of FAULT_KIND: with `whileLoading` those that end in "@load", else the others. Returns from
+/// those faults that leave the plug-in running.
+void commitFaults(bool whileLoading);
 
 /// The request, by its opcode, that is answered with 4000 bytes of text from now on.
 extern VstInt32 longTextRequest;
@@ -23,6 +25,9 @@ constexpr VstInt32 kEveryRequest = -2;
 
 /// The entry point answers null from now on.
 extern bool yieldsNoInstance;
+
+/// effGetChunk (23) is answered with a size of 100 bytes and a null pointer from now on.
+extern bool answersNullChunk;
 
 /// A test asked for something that does not exist: says so on standard error and ends the process with 125.
 [[noreturn]] void complain(const std::string& problem);
@@ -82,6 +87,9 @@ void trapFloatingPoint();
 
 // Faults of processes that the plug-in starts.
 void forkKeepingStdout();
+/// These two have a session of their own.
+void daemonKeepingStdout();
+void daemonFloodingStdout();
 void forkChildThatGoesOn();
 void forkChildThatExits();
 void forkChildThatCrashes();

@@ -74,13 +74,18 @@ std::optional<VstIntPtr> answerThatLeadsToTheFault(VstInt32 opcode, void* ptr) {
 class Faulty : public WellBehavedEffect {
  public:
   explicit Faulty(audioMasterCallback host) : WellBehavedEffect(host) {
-    if (isWanted(effGetChunk) || isWanted(effSetChunk)) effect()->flags |= effFlagsProgramChunks;
+    if (isWanted(effGetChunk) || isWanted(effSetChunk) || answersNullChunk)
+      effect()->flags |= effFlagsProgramChunks;
   }
 
  protected:
   VstIntPtr dispatch(VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr, float opt) override {
     logRequest(opcode);
     reach(Moment::dispatch, opcode);
+    if (opcode == effGetChunk && answersNullChunk) {
+      *static_cast<void**>(ptr) = nullptr;
+      return 100;
+    }
     if (const auto answer = answerThatLeadsToTheFault(opcode, ptr)) return *answer;
     if (isAnsweredAtLength(opcode)) {
       std::memset(ptr, 'x', 3999);

@@ -74,9 +74,10 @@ bool waitsForRequest(VstInt32 opcode) {
 
 void reach(Moment moment, VstInt32 opcode) {
   if (!wantedPlace()) return;
+  if (moment == Moment::load) commitFaults(true);
   const Place& wanted = *wantedPlace();
   static int turn = 0;
-  if (moment == wanted.moment && opcode == wanted.opcode && ++turn == wanted.turn) commitFault();
+  if (moment == wanted.moment && opcode == wanted.opcode && ++turn == wanted.turn) commitFaults(false);
 }
 
 }  // namespace sample_plugins
