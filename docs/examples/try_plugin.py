@@ -4,61 +4,92 @@
 
     try_plugin.py [--limit SECONDS] VSTTORTURE BUNDLE [CHILD_ID]
 
-Exits with 0 for "passed" and "shell", with 1 for any other verdict.
+Exits with 0 for "passed" and "shell", 1 for any other verdict, 2 for wrong arguments, 3 when VSTTORTURE cannot be
+started. What the verdicts mean: PROTOCOL.md.
 """
 import argparse
 import os
 import re
+import select
 import signal
 import subprocess
 import sys
-import threading
+import time
 
 TESTS = ["inspect class info", "inspect preset info", "inspect parameter info", "testing setting states",
          "inspect latency", "inspect stream format"]
 FIXED_STEPS = ["test gathering info", *TESTS, *reversed(TESTS), "initialize", "test gathering info"]
+DRAWN_STEPS = TESTS[:5]
 LAST_STEP = 65
 FAILURE = re.compile(r"!.* failed( -?\d+|, unknown error)$", re.MULTILINE)
 LAST_WORDS = "unexpected exit"
+MOST_IN_A_PIPE = 1 << 20
 
 
-def run(command, limit):
-    """What the program printed, and its status: negative for a signal, None when the limit had to end it."""
-    child = subprocess.Popen(command, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, start_new_session=True)
-    chunks = []
-    reader = threading.Thread(target=lambda: chunks.extend(iter(lambda: child.stdout.read1(65536), b"")))
-    reader.start()
-    out_of_time = threading.Event()
-    timer = threading.Timer(limit, lambda: (out_of_time.set(), os.killpg(child.pid, signal.SIGKILL)))
-    timer.start()
-    os.waitid(os.P_PID, child.pid, os.WEXITED | os.WNOWAIT)  # Ended, but not reaped: its group is still its own.
-    timer.cancel()
-    timer.join()
-    os.killpg(child.pid, signal.SIGKILL)  # What the plug-in left behind; it may hold the pipe open.
-    reader.join(1)
-    status = child.wait()
-    return b"".join(chunks).decode(errors="replace"), None if out_of_time.is_set() else status
+def has_ended(child):
+    """Does not reap the child: until then its number, which is its group's too, belongs to nobody else."""
+    return os.waitid(os.P_PID, child.pid, os.WEXITED | os.WNOWAIT | os.WNOHANG) is not None
 
 
-def judge(output, status):
-    """The verdict. Text of the plug-in's own between the lines, or in front of one, does no harm."""
-    total, step = None, 0
+def read_some(pipe, seconds):
+    """What can be read within so many seconds; None for nothing yet, b"" at the end of the pipe."""
+    return os.read(pipe, 65536) if select.select([pipe], [], [], seconds)[0] else None
+
+
+def run(command, limit, **options):
+    """What the program printed, and its status: negative for a signal, None when the limit had to end it.
+
+    options: of subprocess.Popen. Throws OSError when the program cannot be started.
+    """
+    with subprocess.Popen(command, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, start_new_session=True,
+                          **options) as child:
+        pipe, chunks, end = child.stdout.fileno(), [], time.monotonic() + limit
+        chunk = None
+        while not (ended := has_ended(child)) and time.monotonic() < end:
+            if chunk == b"":
+                time.sleep(0.002)  # The plug-in has closed its output, or the process is about to end.
+            elif chunk := read_some(pipe, 0.01):
+                chunks.append(chunk)
+        os.killpg(child.pid, signal.SIGKILL)  # With what the plug-in has left behind.
+        status = child.wait()
+        # All that the program printed is in the pipe by now. A process with a session of its own may still hold
+        # the pipe, and even write to it, so do not wait for the end.
+        rest = 0
+        while rest < MOST_IN_A_PIPE and (chunk := read_some(pipe, 0)):
+            chunks.append(chunk)
+            rest += len(chunk)
+        return b"".join(chunks).decode(errors="replace"), status if ended else None
+
+
+def read_steps(output):
+    """The announced total, None without one, and the texts of the steps that stand in their order.
+
+    Text of the plug-in's own between the lines, or in front of one, is passed over.
+    """
+    total, texts = None, []
     for line in output.split("\n"):
-        expected = FIXED_STEPS[step:step + 1] or TESTS[:5]
         if total is None:
             match = re.search(r"total, (64|51)$", line)
             total = match and int(match[1])
-        elif step < LAST_STEP and line.endswith(tuple(f"{step + 1}, {text}" for text in expected)):
-            step += 1
+        elif len(texts) < LAST_STEP:
+            due = FIXED_STEPS[len(texts):len(texts) + 1] or DRAWN_STEPS
+            texts += [text for text in due if line.endswith(f"{len(texts) + 1}, {text}")]
+    return total, texts
+
+
+def judge(output, status):
+    """The verdict on a run."""
+    total, texts = read_steps(output)
+    step = len(texts)
     if status is None:
         return f"timed out at {step}"
     if status < 0:
-        return f"killed by signal {-status}"
+        return f"killed by signal {-status} at {step}"
     if status == 7:
         return f"crashed at {step}"
     if status == 5 and output == "":
         return "refused"
-    if LAST_WORDS in output:  # Maybe with a text of the plug-in's behind them.
+    if LAST_WORDS in output:  # Text of the plug-in's own may follow them.
         return f"exited at {step} with {status}"
     if status == 3 and FAILURE.search(output):
         return "not loadable" if output == "!create and initialize failed -1\n" else f"failed at {step}"
@@ -67,11 +98,22 @@ def judge(output, status):
     return f"exited at {step} with {status}"
 
 
-if __name__ == "__main__":
+def main():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
-    parser.add_argument("--limit", type=float, default=60, help="seconds a run may take")
-    parser.add_argument("command", nargs="+", metavar="VSTTORTURE BUNDLE CHILD_ID")
+    parser.add_argument("--limit", type=float, default=60, help="seconds that a run may take")
+    parser.add_argument("program", metavar="VSTTORTURE")
+    parser.add_argument("bundle", metavar="BUNDLE")
+    parser.add_argument("child_id", metavar="CHILD_ID", nargs="?")
     arguments = parser.parse_args()
-    verdict = judge(*run(arguments.command, arguments.limit))
+    command = [arguments.program, arguments.bundle] + ([arguments.child_id] if arguments.child_id else [])
+    try:
+        verdict = judge(*run(command, arguments.limit))
+    except OSError as error:
+        print(f"cannot start {arguments.program}: {error.strerror}", file=sys.stderr)
+        return 3
     print(verdict)
-    sys.exit(0 if verdict in ("passed", "shell") else 1)
+    return 0 if verdict in ("passed", "shell") else 1
+
+
+if __name__ == "__main__":
+    sys.exit(main())

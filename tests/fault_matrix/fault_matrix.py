@@ -3,9 +3,10 @@
 
     fault_matrix.py --program build/release/vsttorture --plugins build/release/plugins [--only REGEX] [--list]
 
-Prints a line for each row that fails, then a summary. The rows stand in rows.py. With --consumer it is the example
-of docs/examples that starts, reads and ends the program; its verdict is held to the row in both ways. What does not
-apply to a build with a sanitizer stands in sanitizers.py, and is named in the summary.
+Prints a line for each row that fails, then a summary. The rows stand in rows.py. Each run is made and judged by the
+Python example of docs/examples. With --consumer the compiled C++ example makes and judges each run instead, and its
+verdict and status are compared; the Python one is run as a command for a row of each verdict. What does not apply to a
+build with a sanitizer stands in sanitizers.py, and is named in the summary.
 """
 import argparse
 import collections
@@ -15,32 +16,111 @@ import pathlib
 import re
 import resource
 import sys
-import tempfile
 import time
 
-sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
-import try_plugin  # noqa: E402
-from program_run import (LIMIT_IN_SECONDS, Seen, differences, environment_of, plugin_path,  # noqa: E402
-                         run_row, take_default_signals)
-from rows import all_rows  # noqa: E402
-from sanitizers import proofs, reason_to_leave_out  # noqa: E402
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "shared"))
+from program_run import as_printed, run_program, take_default_signals, try_plugin  # noqa: E402
+from rows import ALL_STEPS, FLOOD, FIRST_DRAWN, LAST_DRAWN, PHASE_OF_DRAWN, TEXT_WITHOUT_END, all_rows  # noqa: E402
+from sanitizers import options_for, proofs, reason_to_leave_out, unwanted_report  # noqa: E402
 
+LIMIT_IN_SECONDS = 10
 HANG_LIMIT_IN_SECONDS = 3
 PROOF_LIMIT_IN_SECONDS = 4
+GRACE_IN_SECONDS = 10
 
 
-def run_by_consumer(row, program, plugins, limit, sanitizer):
-    """One run as the example makes it. Nothing is seen of standard error."""
-    with tempfile.TemporaryDirectory(prefix="fault_matrix.") as home:
-        settings = [f"{name}={value}" for name, value in environment_of(row, home, sanitizer).items()]
-        command = ["env", "-i", "-C", home, *settings, "sh", "-c", 'exec "$@" 2>/dev/null', "sh", program]
-        limit = HANG_LIMIT_IN_SECONDS if row.end.status is None else limit
-        output, status = try_plugin.run([*command, plugin_path(row, plugins)], limit)
-        return Seen(output, row.end.errors, status, None, os.listdir(home))
+def environment_of(row, sanitizer=None):
+    """What the plug-in of the row asks for, and the sanitizer ("address", "thread") that the program is built with."""
+    environment = {name: value for name, value in os.environ.items() if name.endswith("SAN_OPTIONS")}
+    environment.update(options_for(row, environment, sanitizer))
+    if row.kind is not None:
+        environment.update(FAULT_KIND=row.kind, FAULT_PLACE=row.place, FAULT_STATUS=str(row.fault_status))
+    return environment
 
 
-def chosen_rows(pattern):
-    return [row for row in all_rows() if re.search(pattern, row.name)]
+def command_of(row, program, plugins):
+    return [program, row.plugin if row.plugin.startswith("/") else os.path.join(plugins, row.plugin + ".so")]
+
+
+def limit_of(row, limit=LIMIT_IN_SECONDS):
+    return HANG_LIMIT_IN_SECONDS if row.end.status is None else limit
+
+
+def run_row(row, program, plugins, limit=LIMIT_IN_SECONDS, sanitizer=None):
+    return run_program(command_of(row, program, plugins), limit_of(row, limit), environment_of(row, sanitizer))
+
+
+def without_noise(row, output):
+    """Takes out what the plug-in itself printed. None when that is not there."""
+    kinds = (row.kind or "").split("+")
+    if "flood_stdout" in kinds and output.count(FLOOD) < 65536:
+        return None
+    if {"print", "print_when_unloaded", "wcout"}.intersection(kinds):
+        if output.count(TEXT_WITHOUT_END) != 1:
+            return None
+        output = output.replace(TEXT_WITHOUT_END, "")
+    if "daemon_flooding_stdout" in kinds:
+        output = output.rstrip("x")  # Of the last line there may be only the beginning.
+    return output.replace(FLOOD, "")
+
+
+def possible_steps(row):
+    """Which of the drawn steps is the first for the latency is different in each run."""
+    return range(len(try_plugin.FIXED_STEPS) + 1, ALL_STEPS + 1) if row.end.steps == FIRST_DRAWN else [row.end.steps]
+
+
+def number_of_steps(row, texts):
+    """The number of steps that a run with these texts must have."""
+    drawn = texts[len(try_plugin.FIXED_STEPS):]
+    latency = [step for step, text in zip(possible_steps(row), drawn) if text == "inspect latency"]
+    return row.end.steps if row.end.steps != FIRST_DRAWN else min(latency, default=ALL_STEPS)
+
+
+def differences(row, seen, sanitizer=None):
+    """What is seen and should not be, in words; empty for a row that holds."""
+    output = without_noise(row, seen.output)
+    if output is None:
+        return [f"what the plug-in prints is missing: {seen.output[-200:]!r}"]
+    total, texts = try_plugin.read_steps(output)
+    steps, head = number_of_steps(row, texts), as_printed(total, texts)
+    tail = row.end.tail.replace(LAST_DRAWN, PHASE_OF_DRAWN.get(texts[-1], "") if texts else "")
+    found = []
+    if len(texts) != steps:
+        found.append(f"{len(texts)} steps instead of {steps}")
+    if total != (row.end.total if steps > 0 else None):
+        found.append(f"a total of {total}")
+    if output != head + tail:
+        found.append(f"{output.removeprefix(head)[-200:]!r} after the steps instead of {tail!r}")
+    if seen.status != row.end.status:
+        found.append(f"status {seen.status} instead of {row.end.status}")
+    if row.end.errors is not None and seen.errors != row.end.errors:
+        found.append(f"standard error {seen.errors[-200:]!r} instead of {row.end.errors!r}")
+    if unwanted_report(row, seen.errors, sanitizer):
+        found.append(f"a report of the sanitizer: {seen.errors[:2000]!r}")
+    if seen.leftovers:
+        found.append(f"files left: {seen.leftovers}")
+    if seen.seconds > limit_of(row) + GRACE_IN_SECONDS:
+        found.append(f"{seen.seconds:.0f} s")
+    verdict, expected_verdict = try_plugin.judge(seen.output, seen.status), row.end.verdict.format(steps)
+    if verdict != expected_verdict:
+        found.append(f"verdict {verdict!r} instead of {expected_verdict!r}")
+    return found
+
+
+def consumer_differences(row, consumer, program, plugins):
+    """Likewise for the example as a command: it prints the verdict, and its status tells a pass."""
+    limit = limit_of(row)
+    seen = run_program([*consumer, "--limit", str(limit), *command_of(row, program, plugins)],
+                       limit + GRACE_IN_SECONDS, environment_of(row))
+    verdicts = {row.end.verdict.format(steps) for steps in possible_steps(row)}
+    status = 0 if verdicts <= {"passed", "shell"} else 1
+    if seen.output.removesuffix("\n") in verdicts and seen.status == status:
+        return []
+    return [f"{seen.output!r} and status {seen.status} instead of {min(verdicts)!r} and {status}"]
+
+
+def a_row_of_each_verdict(rows):
+    return list({row.end.verdict.split("{")[0]: row for row in rows}.values())
 
 
 def main():
@@ -49,12 +129,12 @@ def main():
     parser.add_argument("--plugins", help="the folder of the sample plug-ins")
     parser.add_argument("--only", default="", metavar="REGEX", help="rows whose name matches")
     parser.add_argument("--list", action="store_true", help="print the rows and what they demand")
-    parser.add_argument("--consumer", action="store_true", help="let the example run the program")
+    parser.add_argument("--consumer", metavar="TRY_PLUGIN", help="let this compiled example run the program")
     parser.add_argument("--sanitizer", choices=["address", "thread"], help="the one that the program is built with")
     parser.add_argument("--jobs", type=int, default=16, help="runs at a time; some of them only wait")
     arguments = parser.parse_args()
 
-    rows = chosen_rows(arguments.only)
+    rows = [row for row in all_rows() if re.search(arguments.only, row.name)]
     if arguments.list:
         for row in rows:
             print(f"{row.name}\t{row.end.steps} steps, {row.end.tail!r}, status {row.end.status}")
@@ -68,25 +148,33 @@ def main():
     started = time.monotonic()
     program, plugins = os.path.abspath(arguments.program), os.path.abspath(arguments.plugins)
     sanitizer = arguments.sanitizer
-    run = run_by_consumer if arguments.consumer else run_row
 
     def check(row, limit=LIMIT_IN_SECONDS):
         """What is wrong with the row; empty when it holds."""
-        return differences(row, run(row, program, plugins, limit, sanitizer), try_plugin.judge, sanitizer)
+        if arguments.consumer:
+            return consumer_differences(row, [os.path.abspath(arguments.consumer)], program, plugins)
+        return differences(row, run_row(row, program, plugins, limit, sanitizer), sanitizer)
+
+    def check_python_command(row):
+        return consumer_differences(row, [sys.executable, try_plugin.__file__], program, plugins)
 
     left_out = collections.Counter(reason_to_leave_out(row, sanitizer) for row in rows)
     applying = [row for row in rows if reason_to_leave_out(row, sanitizer) is None]
     failed = 0
     with concurrent.futures.ThreadPoolExecutor(arguments.jobs) as pool:
-        for row, found in zip(applying, pool.map(check, applying)):
-            if found:
+        checks = [(row.name, pool.submit(check, row)) for row in applying]
+        if arguments.consumer:
+            checks += [(f"{row.name} in Python", pool.submit(check_python_command, row))
+                       for row in a_row_of_each_verdict(rows)]
+        proven = [(row.name, pool.submit(check, row, PROOF_LIMIT_IN_SECONDS)) for row in proofs(rows, sanitizer)]
+        for name, found in checks:
+            if found.result():
                 failed += 1
-                print(f"{row.name}: {'; '.join(found)}", flush=True)
-        tried = proofs(rows, sanitizer)
-        for row, found in zip(tried, pool.map(lambda row: check(row, PROOF_LIMIT_IN_SECONDS), tried)):
-            if not found:
+                print(f"{name}: {'; '.join(found.result())}", flush=True)
+        for name, found in proven:
+            if not found.result():
                 failed += 1
-                print(f"{row.name}: holds, although it is said not to apply", flush=True)
+                print(f"{name}: holds, although it is said not to apply", flush=True)
     for reason, count in left_out.items():
         if reason is not None:
             print(f"{count} rows do not apply: {reason}")

@@ -1,8 +1,8 @@
 # SPDX-License-Identifier: MIT
 """The rows of the fault matrix: what goes wrong, where, and what a host then has to see.
 
-A run is described by the lines that stand (the first N steps), what follows them, and the status. Nothing here is
-taken from the program: the steps, the phases, and the step to which each request belongs are literals.
+A run is described by the steps that are printed (the first N), what follows them, and the status. Nothing here is
+taken from the program: the phases, and the step to which each request belongs are literals.
 
 Which rows there are:
   - every kind of fault at every place,
@@ -10,14 +10,6 @@ Which rows there are:
 """
 import collections
 
-STEP_TEXTS = [
-    "test gathering info", "inspect class info", "inspect preset info", "inspect parameter info",
-    "testing setting states", "inspect latency", "inspect stream format", "inspect stream format",
-    "inspect latency", "testing setting states", "inspect parameter info", "inspect preset info",
-    "inspect class info", "initialize", "test gathering info",
-]
-DRAWN_TEXTS = ["inspect class info", "inspect preset info", "inspect parameter info", "testing setting states",
-               "inspect latency"]
 PHASE_OF_DRAWN = {
     "inspect class info": "inspect class info test",
     "inspect preset info": "inspect preset info test",
@@ -29,6 +21,7 @@ ALL_STEPS = 65
 FIRST_DRAWN = "the first drawn inspect latency"
 LAST_WORDS = "unexpected exit"
 TEXT_WITHOUT_END = "a text without an end"
+FLOOD = "x" * 127 + "\n"
 
 # ----- Places. The steps are those printed when the fault happens there.
 #
@@ -128,6 +121,7 @@ KILLED = "killed"  # no word, a signal
 THROWN = "thrown"  # by the place
 PASS = "pass"      # as if nothing had happened
 LATE = "late"      # a whole run, then status 7 without a word
+LATE_KILLED = "late killed"  # a whole run, then a signal
 MUTE = "mute"      # nothing is printed any more, status 0
 HANG = "hang"      # until the host kills it
 
@@ -247,9 +241,11 @@ def end_of_kind(kind, place):
         CRASH: lambda: crash_at(place.steps, kind.errors),
         EXIT: lambda: End(place.steps, LAST_WORDS, kind.detail, f"exited at {{}} with {kind.detail}", ""),
         GONE: lambda: gone_at(place.steps, kind.detail),
-        KILLED: lambda: End(place.steps, "", -kind.detail, f"killed by signal {kind.detail}", ""),
+        KILLED: lambda: End(place.steps, "", -kind.detail, f"killed by signal {kind.detail} at {{}}", ""),
         PASS: lambda: passed(total=place.total),
         LATE: lambda: End(passed(total=place.total).steps, "", 7, "crashed at {}", ""),
+        LATE_KILLED: lambda: End(passed(total=place.total).steps, "", -kind.detail,
+                                 f"killed by signal {kind.detail} at {{}}", ""),
         MUTE: lambda: muted_at(place),
         HANG: lambda: End(place.steps, "", None, "timed out at {}", ""),
     }[kind.leads_to]()
@@ -270,14 +266,15 @@ def rows_of_pairs():
             yield row(kind, place)
 
 
-def rows_of_the_own_runtime():
-    """The program's own runtime meets an unwinder that is not its own, and aborts: a crash, wherever it is."""
-    for kind in ["throw_int", "throw_runtime_error", "throw_struct"]:
-        for place in PLACES:
-            yield row(KIND_OF[kind], place, "faulty_own_runtime", crash_at(place.steps, "", place.total))
-    for kind in ["null_store", "thread_throw", "exit", "stack_overflow"]:
-        for place in ["load", "dispatch:52"]:
-            yield row(KIND_OF[kind], PLACE_OF[place], "faulty_own_runtime")
+def rows_of_own_runtimes():
+    """A C++ runtime of the plug-in's own, hidden or exported, changes nothing that a host sees."""
+    for plugin in ["faulty_own_runtime", "faulty_exported_runtime"]:
+        for kind in ["throw_int", "throw_runtime_error", "throw_struct"]:
+            for place in PLACES:
+                yield row(KIND_OF[kind], place, plugin)
+        for kind in ["null_store", "thread_throw", "exit", "stack_overflow"]:
+            for place in ["load", "dispatch:52"]:
+                yield row(KIND_OF[kind], PLACE_OF[place], plugin)
 
 
 # Text requests, and the step in which the first of them is made.
@@ -340,6 +337,21 @@ COMBINATIONS = [
     Kind("throw_when_unloaded+exit", CRASH),
     Kind("throw_when_unloaded+null_store", CRASH),
     Kind("exec", GONE, 9),
+    Kind("daemon_keeping_stdout", PASS),
+    Kind("daemon_keeping_stdout+null_store", CRASH),
+    Kind("daemon_flooding_stdout", PASS),
+    Kind("daemon_flooding_stdout+null_store", CRASH),
+    Kind("wprintf", PASS),
+    Kind("wprintf+null_store", CRASH),
+    Kind("wcout", PASS),
+    Kind("wcout+null_store", CRASH),
+    Kind("buffer_stdout@load+raise:SIGKILL", KILLED, 9),
+    Kind("buffer_stdout@load+_exit", GONE, 9),
+    Kind("raise_in_atexit:SIGILL", LATE_KILLED, 4),
+    Kind("raise_in_atexit:SIGTRAP", LATE_KILLED, 5),
+    Kind("raise_in_atexit:SIGFPE", LATE_KILLED, 8),
+    Kind("raise_in_atexit:SIGSYS", LATE_KILLED, 31),
+    Kind("raise_in_atexit:SIGSEGV", LATE),
     Kind("raise:SIGQUIT", KILLED, 3),
     Kind("raise:SIGUSR1", KILLED, 10),
     Kind("raise:SIGPIPE", KILLED, 13),
@@ -370,6 +382,11 @@ def rows_of_combinations():
               End(6, f"!{LATENCY} failed, unknown error\n{LAST_WORDS}", 7, "crashed at {}", not_rethrown))
     yield Row("faulty/print_when_unloaded+exit(0)@dispatch:1:2", "faulty", "print_when_unloaded+exit",
               "dispatch:1:2", 0, End(ALL_STEPS, LAST_WORDS, 0, "exited at {} with 0", ""))
+    # Each line is flushed, so that all of them stand although the plug-in buffers the stream and never flushes it.
+    for place in ["dispatch:58", "dispatch:52", "dispatch:52:3", "dispatch:1:2"]:
+        yield Row(f"faulty/buffer_stdout@load+_exit(0)@{place}", "faulty", "buffer_stdout@load+_exit", place, 0,
+                  gone_at(PLACE_OF[place].steps, 0))
+        yield row(Kind("buffer_stdout@load+raise:SIGKILL", KILLED, 9), PLACE_OF[place])
 
 
 def rows_of_whole_plugins():
@@ -379,6 +396,7 @@ def rows_of_whole_plugins():
         ("well_behaved_instrument", passed()),
         ("older_entry", passed()),
         ("faulty_own_runtime", passed()),
+        ("faulty_exported_runtime", passed()),
         ("shell", End(1, "", 1, "shell", "", 51)),
         ("no_entry", crash_at(0, "")),
         ("null_instance", crash_at(0, "")),
@@ -395,6 +413,6 @@ def rows_of_whole_plugins():
 
 def all_rows():
     """Each row once, by its name."""
-    sources = [rows_of_pairs, rows_of_the_own_runtime, rows_of_long_texts, rows_of_statuses, rows_of_combinations,
+    sources = [rows_of_pairs, rows_of_own_runtimes, rows_of_long_texts, rows_of_statuses, rows_of_combinations,
                rows_of_whole_plugins]
     return list({row.name: row for source in sources for row in source()}.values())

@@ -8,15 +8,12 @@ PROGRAM is the program without that net. That the whole program passes the same 
 import argparse
 import concurrent.futures
 import os
-import pathlib
 import resource
 import sys
 import time
 
-sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
-import try_plugin  # noqa: E402
-from program_run import run_row, take_default_signals  # noqa: E402
-from rows import all_rows  # noqa: E402
+from fault_matrix import run_row, take_default_signals, try_plugin
+from rows import all_rows
 
 JOBS = 8  # Those that hang only wait.
 LIMIT_IN_SECONDS = 4  # The timer that a variant lacks is one of one second.
@@ -24,17 +21,17 @@ LIMIT_IN_SECONDS = 4  # The timer that a variant lacks is one of one second.
 # {net: {row: what a host sees without it, the verdict and whether the last words stand}}
 NEEDED_BY = {
     "signal_stack": {
-        "faulty/stack_overflow@dispatch:52": ("killed by signal 11", False),
-        "faulty/stack_overflow@load": ("killed by signal 11", False),
-        "faulty_own_runtime/stack_overflow@dispatch:52": ("killed by signal 11", False),
+        "faulty/stack_overflow@dispatch:52": ("killed by signal 11 at 6", False),
+        "faulty/stack_overflow@load": ("killed by signal 11 at 0", False),
+        "faulty_own_runtime/stack_overflow@dispatch:52": ("killed by signal 11 at 6", False),
     },
     "exit_now": {
-        "faulty/crash_in_every_atexit+null_store@dispatch:52": ("killed by signal 11", False),
-        "faulty/crash_in_every_atexit@dispatch:52": ("killed by signal 11", False),
+        "faulty/crash_in_every_atexit+null_store@dispatch:52": ("killed by signal 11 at 6", False),
+        "faulty/crash_in_every_atexit@dispatch:52": ("killed by signal 11 at 65", False),
     },
     "second_signal": {
-        "faulty/crash_in_atexit+null_store@dispatch:52": ("killed by signal 11", False),
-        "faulty/crash_in_static_destructor+null_store@dispatch:52": ("killed by signal 11", False),
+        "faulty/crash_in_atexit+null_store@dispatch:52": ("killed by signal 11 at 6", False),
+        "faulty/crash_in_static_destructor+null_store@dispatch:52": ("killed by signal 11 at 6", False),
         "faulty/block_signals+crash_with_stdout_lock@dispatch:52": ("timed out at 6", False),
     },
     "timer": {
@@ -59,11 +56,11 @@ NEEDED_BY = {
         "faulty/vfork_child_crashes@dispatch:52": ("crashed at 6", True),
     },
     "exception_handler": {
-        "faulty/raise:SIGILL@dispatch:52": ("killed by signal 4", False),
-        "faulty/raise:SIGTRAP@dispatch:52": ("killed by signal 5", False),
-        "faulty/raise:SIGSYS@dispatch:52": ("killed by signal 31", False),
-        "faulty/divide_by_zero@dispatch:52": ("killed by signal 8", False),
-        "faulty/illegal_instruction@dispatch:52": ("killed by signal 4", False),
+        "faulty/raise:SIGILL@dispatch:52": ("killed by signal 4 at 6", False),
+        "faulty/raise:SIGTRAP@dispatch:52": ("killed by signal 5 at 6", False),
+        "faulty/raise:SIGSYS@dispatch:52": ("killed by signal 31 at 6", False),
+        "faulty/divide_by_zero@dispatch:52": ("killed by signal 8 at 6", False),
+        "faulty/illegal_instruction@dispatch:52": ("killed by signal 4 at 6", False),
     },
 }
 # A row of each variant that needs no net: the variant is the program otherwise.

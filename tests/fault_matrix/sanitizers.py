@@ -62,11 +62,13 @@ def is_reported(row, sanitizer):
     return any(kind in kinds_of(row) for kind in REPORTED.get(sanitizer, []))
 
 
-def add_options(environment, row, sanitizer):
-    if sanitizer is None:
-        return
-    for name, options in [OPTIONS[sanitizer]] + ([ABORTS] if is_reported(row, sanitizer) else []):
-        environment[name] = ":".join(filter(None, [environment.get(name), options]))
+def options_for(row, environment, sanitizer):
+    """The environment variables that the row needs: those that are set, and more."""
+    added = {}
+    wanted = [OPTIONS[sanitizer]] if sanitizer else []
+    for name, options in wanted + [ABORTS] * is_reported(row, sanitizer):
+        added[name] = ":".join(filter(None, [added.get(name, environment.get(name)), options]))
+    return added
 
 
 def unwanted_report(row, errors, sanitizer):

@@ -5,8 +5,8 @@
 
 After each run its folder, which is its HOME and TMPDIR as well, must be empty, although core files are allowed: a
 crash that the guard caught leaves none. At the end there must be no zombie, no process that runs the program, and no
-temporary file. The verdict of a run is not looked at: which one a place leads to is what
-the fault matrix knows. Prints the seed first, so that a run can be repeated.
+temporary file. Which verdict a place leads to is tested by the fault matrix, not here. Prints the seed first, so that
+a run can be repeated.
 """
 import argparse
 import collections
@@ -20,10 +20,8 @@ import sys
 import tempfile
 import time
 
-sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
-import try_plugin  # noqa: E402
-from program_run import run_row, take_default_signals  # noqa: E402
-from rows import KINDS, End, Row  # noqa: E402
+from fault_matrix import run_row, take_default_signals, try_plugin
+from rows import KINDS, End, Row
 
 SHARE_OF_OTHER_SAMPLES = 0.1
 MOMENTS = ["load", "entry", "getParameter", "setParameter"]
@@ -37,7 +35,7 @@ def random_row(number, draw, samples):
     if draw.random() < SHARE_OF_OTHER_SAMPLES:
         plugin = draw.choice(samples)
         return Row(f"{number}: {plugin}", plugin, None, None, 0, ANY_END)
-    plugin = draw.choice(["faulty", "faulty_own_runtime"])
+    plugin = draw.choice(["faulty", "faulty_own_runtime", "faulty_exported_runtime"])
     kind = "+".join(draw.choice(KINDS).name for _ in range(draw.choice([1, 1, 1, 2, 3])))
     place = draw.choice(MOMENTS + [f"dispatch:{opcode}" for opcode in OPCODES])
     if place != "load" and draw.random() < 0.5:

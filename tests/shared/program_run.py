@@ -1,0 +1,39 @@
+# SPDX-License-Identifier: MIT
+"""Runs vsttorture as the example of docs/examples does, in a home of its own. For all tests written in Python."""
+import collections
+import os
+import pathlib
+import signal
+import sys
+import tempfile
+import time
+
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
+import try_plugin  # noqa: E402
+
+# status: negative for a signal, None for a run that was ended for its length. leftovers: files in its folder.
+Seen = collections.namedtuple("Seen", "output errors status seconds leftovers")
+
+
+def take_default_signals():
+    """A shell starts what it sends to the background with SIGQUIT ignored, and each run would inherit that."""
+    for number in (signal.SIGQUIT, signal.SIGUSR1, signal.SIGALRM, signal.SIGXCPU, signal.SIGVTALRM):
+        signal.signal(number, signal.SIG_DFL)
+
+
+def run_program(command, limit, environment=()):
+    """One run, with nothing in its environment but a fresh home, the C locale, a short PATH and what is given."""
+    with tempfile.TemporaryDirectory(prefix="run.", ignore_cleanup_errors=True) as home, \
+         tempfile.TemporaryFile() as errors:
+        surroundings = {"HOME": home, "TMPDIR": home, "LC_ALL": "C", "PATH": "/usr/bin:/bin", **dict(environment)}
+        started = time.monotonic()
+        output, status = try_plugin.run(command, limit, cwd=home, env=surroundings, stderr=errors)
+        seconds = time.monotonic() - started
+        errors.seek(0)
+        return Seen(output, errors.read().decode(errors="replace"), status, seconds, os.listdir(home))
+
+
+def as_printed(total, texts):
+    """What a run prints that gets as far. The arguments are those that try_plugin.read_steps() gives."""
+    head = "" if total is None else f"total, {total}\n"
+    return head + "".join(f"{number}, {text}\n" for number, text in enumerate(texts, 1))
