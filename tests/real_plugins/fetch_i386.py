@@ -6,9 +6,9 @@
 Each package is unpacked to FOLDER/PACKAGE, all that they depend on to FOLDER/libraries, without the C and C++
 runtimes, which g++-multilib supplies. Nothing is installed: apt works on lists and a cache of its own in
 FOLDER/apt, for i386 alone, so neither the machine's packages nor its architectures change, and no rights are
-needed. FOLDER/missing names the files that the archive did not have, one a line, as happens when it is out of
-step with its index; FOLDER/done says that there is nothing left to do. Exits with 1 when not even
-dpf-plugins-vst came, of which five modules need no library at all.
+needed. FOLDER/missing names the packages that the archive did not have, one a line, as happens when it does not match
+its index; FOLDER/done says that there is nothing left to do. Exits with 1 when dpf-plugins-vst could not be fetched,
+of which five modules need no library at all.
 """
 import os
 import pathlib
@@ -53,10 +53,10 @@ class Apt:
 
     def update(self):
         if self.run("update").returncode != 0:
-            print("not every index came; going on with those that did")
+            print("not every index could be fetched; going on with those that were")
 
     def fetch(self, packages):
-        """Downloads packages with all that they depend on; {package: its file} of what that is, or {}."""
+        """Downloads packages with all that they depend on. {package: its file} of these, {} when apt refuses."""
         install = ["install", "-y", "--no-install-recommends", *packages]
         listed = self.run(*install, "--print-uris", stdout=subprocess.PIPE)
         files = re.findall(r"^'[^']+' (\S+\.deb) ", listed.stdout, re.MULTILINE)
@@ -69,7 +69,7 @@ def fetch(folder, packages):
     apt.update()
     files = apt.fetch(packages)
     for package in packages:
-        # One that cannot be had with its libraries does not keep the others away.
+        # A package whose libraries cannot be found must not keep apt from fetching the others.
         if package not in files:
             files = {**apt.fetch([package]), **files}
 
@@ -100,7 +100,7 @@ def main():
         print(f"not fetched: {package}")
     (folder / "missing").write_text("".join(f"{package}\n" for package in missing))
     if LEAST in missing:
-        print(f"{LEAST} did not come, so there is no 32-bit plug-in that is sure to load", file=sys.stderr)
+        print(f"{LEAST} is missing, so there is no 32-bit plug-in that is sure to load", file=sys.stderr)
         return 1
     if not missing:
         (folder / "done").touch()

@@ -12,15 +12,15 @@ import os
 import pathlib
 import sys
 
-from real_plugins import NOTHING_TO_RUN, run_program
+from real_plugins import NOTHING_TO_RUN, TIME_LIMIT_IN_SECONDS, run_program
 
 
 def fault(program, path, architectures):
     """What is wrong with the end of a run, None for nothing."""
-    output, errors, status, _ = run_program(program, path)
-    expected = f"vsttorture: {path} is for {architectures[1]}, this program is for {architectures[0]}\n"
-    seen = (output, errors, status)
-    return None if seen == ("!create and initialize failed -1\n", expected, 3) else f"{path}: {seen}"
+    seen = run_program([program, path], TIME_LIMIT_IN_SECONDS)
+    errors = f"vsttorture: {path} is for {architectures[1]}, this program is for {architectures[0]}\n"
+    expected = ("!create and initialize failed -1\n", errors, 3)
+    return None if (seen.output, seen.errors, seen.status) == expected else f"{path}: {seen}"
 
 
 def main():

@@ -1,19 +1,18 @@
 # SPDX-License-Identifier: MIT
-"""Runs vsttorture over every plug-in of some Debian packages and demands the end that expectations.tsv names.
+"""Runs vsttorture over every plug-in of some Debian packages and demands the verdict that expectations.tsv names.
 
     real_plugins.py --program build/release/vsttorture [--jobs 2] [--table] [--required] [PACKAGE...]
     real_plugins.py --program build/x86/vsttorture --root build/i386_plugins [...]
 
-The modules come from the package manager and must be exactly those of the table. Each run has a fresh HOME,
-no display, the C locale and pipes for its output. A line is printed for each deviation, then a summary; --table
-prints package, module, end and seconds of each run. A package that is not installed is left out and said so, or
-is a failure with --required (or VSTTORTURE_REAL_PLUGINS=required in the environment). Exits with 77 when
-nothing was there to run.
+The modules come from the package manager and must be exactly those of the table. A run has no display and a home of
+its own. A verdict of "passed" also demands that nothing but the lines of the run was printed. Prints a line for each
+deviation, then a summary; --table prints package, module, verdict and seconds of each run. A package that is not
+installed is left out with a message, or is a failure with --required (or VSTTORTURE_REAL_PLUGINS=required in the
+environment). Exits with 77 when there was nothing to run.
 
 With --root the modules are those of the i386 packages that fetch_i386.py has unpacked there, with the libraries
-beside them, and the table is expectations_i386.tsv. What the archive did not have (ROOT/missing) is left out
-and said so, and with it the modules that lack a library: no failure, as long as something was run. The five
-modules that need no library are never left out.
+beside them. What the archive did not have (ROOT/missing) is left out with a message, and with it the modules that lack
+a library: no failure, as long as something was run. The five modules that need no library are never left out.
 """
 import argparse
 import concurrent.futures
@@ -21,13 +20,12 @@ import csv
 import os
 import pathlib
 import re
-import signal
 import subprocess
 import sys
-import tempfile
 import time
 
-from run_end import run_end
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "shared"))
+from program_run import as_printed, run_program, try_plugin  # noqa: E402
 
 NOTHING_TO_RUN = 77
 TIME_LIMIT_IN_SECONDS = 120
@@ -36,13 +34,13 @@ NEED_NO_LIBRARY = {"dpf-plugins-vst": {"Kars-vst.so", "MaBitcrush-vst.so", "MaFr
 FOLDERS = re.compile(r"(?P<folder>/usr/lib/vst|/usr/lib/lxvst|/usr/lib/[^/]+/iem-plugin-suite/vst)/(?P<module>.+)")
 
 
-def expected_ends(name="expectations.tsv"):
-    """{package: {module: end}} of a table beside this file."""
-    ends = {}
-    with open(pathlib.Path(__file__).with_name(name), newline="") as table:
+def expected_verdicts(architecture):
+    """{package: {module: verdict}} of the table beside this file."""
+    verdicts = {}
+    with open(pathlib.Path(__file__).with_name("expectations.tsv"), newline="") as table:
         for row in csv.DictReader(table, delimiter="\t"):
-            ends.setdefault(row["package"], {})[row["module"]] = row["end"]
-    return ends
+            verdicts.setdefault(row["package"], {})[row["module"]] = row[architecture]
+    return verdicts
 
 
 def exports_entry_point(path):
@@ -66,69 +64,57 @@ def modules_among(paths, root=""):
     return modules
 
 
-def installed_modules(package):
-    """{module: path} of an installed package, None for a package that is not installed."""
-    try:
-        listed = subprocess.run(["dpkg", "-L", package], capture_output=True, text=True)
-    except FileNotFoundError:
-        return None
-    return modules_among(listed.stdout.splitlines()) if listed.returncode == 0 else None
+class InstalledPackages:
+    """The packages of this machine."""
+    architecture, environment, missing = "amd64", {}, ()
+
+    def modules(self, package):
+        """{module: path} of a package, None for one that is not installed."""
+        try:
+            listed = subprocess.run(["dpkg", "-L", package], capture_output=True, text=True)
+        except FileNotFoundError:
+            return None
+        return modules_among(listed.stdout.splitlines()) if listed.returncode == 0 else None
 
 
 class UnpackedPackages:
     """What fetch_i386.py has left in a folder."""
+    architecture = "i386"
 
     def __init__(self, root):
         self.root = os.path.realpath(root)
         missing = pathlib.Path(self.root, "missing")
         self.missing = missing.read_text().split() if missing.exists() else []
-        libraries = f"{self.root}/libraries"
-        self.library_path = f"{libraries}/usr/lib/i386-linux-gnu:{libraries}/lib/i386-linux-gnu"
+        folders = [f"{self.root}/libraries/{folder}/i386-linux-gnu" for folder in ("usr/lib", "lib")]
+        self.environment = {"LD_LIBRARY_PATH": ":".join(folders)}
 
     def modules(self, package):
-        """{module: path} of an unpacked package, None for one that is not there."""
+        """{module: path} of a package, None for one that is not there."""
         folder = f"{self.root}/{package}"
         if not os.path.isdir(folder):
             return None
         return modules_among([f"{at}/{name}" for at, _, names in os.walk(folder) for name in names], folder)
 
 
-def run_program(program, path, library_path=None):
-    """One run: its standard output and standard error, its status (None when it was stopped), its seconds."""
-    started = time.monotonic()
-    libraries = {"LD_LIBRARY_PATH": library_path} if library_path else {}
-    with tempfile.TemporaryDirectory(prefix="real_plugins.", ignore_cleanup_errors=True) as home:
-        process = subprocess.Popen(
-            [program, path], cwd=home, env={"HOME": home, "LC_ALL": "C", "PATH": "/usr/bin:/bin", **libraries},
-            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE, start_new_session=True)
-        try:
-            output, errors = process.communicate(timeout=TIME_LIMIT_IN_SECONDS)
-            status = process.returncode
-        except subprocess.TimeoutExpired:
-            os.killpg(process.pid, signal.SIGKILL)
-            output, errors = process.communicate()
-            status = None
-    seconds = time.monotonic() - started
-    return output.decode(errors="replace"), errors.decode(errors="replace"), status, seconds
-
-
-def run(program, path, library_path=None):
-    """One run: its end, what it said on standard error, how many seconds it took."""
-    output, errors, status, seconds = run_program(program, path, library_path)
-    return run_end(output, status), errors, seconds
+def verdict_on(seen):
+    verdict = try_plugin.judge(seen.output, seen.status)
+    is_clean = seen.output == as_printed(*try_plugin.read_steps(seen.output))
+    return verdict if is_clean or verdict != "passed" else "passed, with text of its own"
 
 
 class Checker:
     """Runs packages and counts what came out."""
 
-    def __init__(self, program, jobs, table, library_path=None, missing=()):
-        self.library_path = library_path
-        self.missing = missing
+    def __init__(self, program, packages, jobs, table):
         self.program = os.path.abspath(program)
+        self.packages = packages
         self.pool = concurrent.futures.ThreadPoolExecutor(jobs)
         self.table = table
         self.run_count = 0
         self.deviation_count = 0
+
+    def run(self, path):
+        return run_program([self.program, path], TIME_LIMIT_IN_SECONDS, self.packages.environment)
 
     def deviation(self, name, expected, seen):
         print(f"{name}: expected {expected}; seen {seen}")
@@ -141,18 +127,18 @@ class Checker:
             self.deviation(f"{package} {module}", "no such module", modules[module])
 
         present = sorted(expected.keys() & modules.keys())
-        runs = self.pool.map(lambda module: run(self.program, modules[module], self.library_path), present)
-        for module, (end, errors, seconds) in zip(present, runs):
-            may_lack_a_library = self.missing and module not in NEED_NO_LIBRARY.get(package, ())
-            if may_lack_a_library and "cannot open shared object file" in errors and end != expected[module]:
-                print(f"left out: {package} {module}, {errors.strip()}")
+        for module, seen in zip(present, self.pool.map(lambda module: self.run(modules[module]), present)):
+            verdict = verdict_on(seen)
+            may_lack_a_library = self.packages.missing and module not in NEED_NO_LIBRARY.get(package, ())
+            if may_lack_a_library and "cannot open shared object file" in seen.errors and verdict != expected[module]:
+                print(f"left out: {package} {module}, {seen.errors.strip()}")
                 continue
             self.run_count += 1
             if self.table:
-                print(f"{package}\t{module}\t{end}\t{seconds:.2f}", flush=True)
-            if end != expected[module]:
-                self.deviation(f"{package} {module}", expected[module], end)
-                print("".join(f"    {line}\n" for line in errors.splitlines()[-10:]), end="", flush=True)
+                print(f"{package}\t{module}\t{verdict}\t{seen.seconds:.2f}", flush=True)
+            if verdict != expected[module]:
+                self.deviation(f"{package} {module}", expected[module], verdict)
+                print("".join(f"    {line}\n" for line in seen.errors.splitlines()[-10:]), end="", flush=True)
 
 
 def main():
@@ -163,23 +149,18 @@ def main():
     parser.add_argument("--required", action="store_true", help="let a missing package be a failure",
                         default=os.environ.get("VSTTORTURE_REAL_PLUGINS") == "required")
     parser.add_argument("--root", help="the folder that fetch_i386.py has filled")
-    parser.add_argument("packages", nargs="*", metavar="PACKAGE")
+    parser.add_argument("names", nargs="*", metavar="PACKAGE")
     arguments = parser.parse_args()
 
     started = time.monotonic()
-    if arguments.root:
-        unpacked = UnpackedPackages(arguments.root)
-        ends, modules_of = expected_ends("expectations_i386.tsv"), unpacked.modules
-        checker = Checker(arguments.program, arguments.jobs, arguments.table, unpacked.library_path,
-                          unpacked.missing)
-    else:
-        ends, modules_of = expected_ends(), installed_modules
-        checker = Checker(arguments.program, arguments.jobs, arguments.table)
-    for package in arguments.packages or ends:
-        modules = modules_of(package)
+    packages = UnpackedPackages(arguments.root) if arguments.root else InstalledPackages()
+    verdicts = expected_verdicts(packages.architecture)
+    checker = Checker(arguments.program, packages, arguments.jobs, arguments.table)
+    for package in arguments.names or verdicts:
+        modules = packages.modules(package)
         if modules is not None:
-            checker.check(package, ends[package], modules)
-        elif package in checker.missing and not (arguments.required and package in NEED_NO_LIBRARY):
+            checker.check(package, verdicts[package], modules)
+        elif package in packages.missing and not (arguments.required and package in NEED_NO_LIBRARY):
             print(f"left out: {package} could not be fetched")
         elif arguments.required:
             checker.deviation(package, "an installed package", "none")
