@@ -5,11 +5,11 @@
 struct AutoreleasePool;
 struct ExceptionDelegate;
 
-/// Throws once and catches, so that the shared unwinder finds its way through our frames from then on.
+/// Throws once and catches, so that the unwinder of this program is ready. Call it before a plug-in is loaded.
 ///
-/// The unwinder fills its tables when it is first used. A plug-in that brings a C++ runtime of its own, symbols
-/// hidden, has an unwinder of its own too and never uses ours: before ours has been used, what such a plug-in
-/// throws ends the process in our frames instead of reaching our handler. Call it before a plug-in is loaded.
+/// A plug-in that was linked with a C++ runtime of its own, symbols hidden, also has its own unwinder. When it
+/// throws, that one walks the stack, but the handlers in our frames use ours, which fills its tables when
+/// something is first thrown through it. With empty tables it aborts.
 void initialiseUnwinder();
 
 /// The handler of every guarded signal: ends the process through exit(gCrashCode).

@@ -3,8 +3,10 @@
 //
 //     try_plugin [--limit SECONDS] VSTTORTURE BUNDLE [CHILD_ID]
 //
-// Exits with 0 for "passed" and "shell", 1 for any other verdict, 2 for wrong arguments, 3 when VSTTORTURE cannot be
-// started. What the verdicts mean: PROTOCOL.md. Needs C++17 and POSIX: c++ -std=c++17 -o try_plugin try_plugin.cpp
+// Exits with 0 for "passed" and "shell", 1 for any other verdict, 2 for wrong arguments, 3 when VSTTORTURE
+// cannot be started. What the verdicts mean: PROTOCOL.md. Needs C++17 and POSIX:
+//
+//     c++ -std=c++17 -o try_plugin try_plugin.cpp
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
@@ -85,18 +87,16 @@ Run finish(pid_t child, int pipe, Clock::time_point limit) {
   ssize_t size = -1;
   bool ended = false;
   while (!(ended = hasEnded(child)) && Clock::now() < limit) {
-    if (size == 0) {
-      std::this_thread::sleep_for(milliseconds(2));  // It has closed its output, or is about to end.
-    } else {
-      size = readSome(pipe, 10, run.output);
-    }
+    if (size != 0) size = readSome(pipe, 10, run.output);
+    // Lets many small writes come together. After the end of the pipe, just waits.
+    std::this_thread::sleep_for(milliseconds(1));
   }
   kill(-child, SIGKILL);  // With what the plug-in has left behind.
   int status = 0;
   waitpid(child, &status, 0);
   if (ended) run.status = WIFSIGNALED(status) ? -WTERMSIG(status) : WEXITSTATUS(status);
-  // All that the program printed is in the pipe by now. A process with a session of its own may still hold the pipe,
-  // and even write to it, so do not wait for the end.
+  // All that the program printed is in the pipe by now. A process with a session of its own may still hold
+  // the pipe, and even write to it, so do not wait for the end.
   const std::size_t most = run.output.size() + kMostInAPipe;
   while (run.output.size() < most && readSome(pipe, 0, run.output) > 0) {
   }

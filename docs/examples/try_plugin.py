@@ -43,22 +43,20 @@ def run(command, limit, **options):
     """
     with subprocess.Popen(command, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, start_new_session=True,
                           **options) as child:
-        pipe, chunks, end = child.stdout.fileno(), [], time.monotonic() + limit
-        chunk = None
+        pipe, chunks, end = child.stdout.fileno(), [None], time.monotonic() + limit
         while not (ended := has_ended(child)) and time.monotonic() < end:
-            if chunk == b"":
-                time.sleep(0.002)  # The plug-in has closed its output, or the process is about to end.
-            elif chunk := read_some(pipe, 0.01):
-                chunks.append(chunk)
+            if chunks[-1] != b"":
+                chunks.append(read_some(pipe, 0.01))
+            time.sleep(0.001)  # Lets many small writes come together. After the end of the pipe, just waits.
         os.killpg(child.pid, signal.SIGKILL)  # With what the plug-in has left behind.
         status = child.wait()
         # All that the program printed is in the pipe by now. A process with a session of its own may still hold
         # the pipe, and even write to it, so do not wait for the end.
-        rest = 0
-        while rest < MOST_IN_A_PIPE and (chunk := read_some(pipe, 0)):
-            chunks.append(chunk)
-            rest += len(chunk)
-        return b"".join(chunks).decode(errors="replace"), status if ended else None
+        rest = b""
+        while len(rest) < MOST_IN_A_PIPE and (chunk := read_some(pipe, 0)):
+            rest += chunk
+        output = b"".join(filter(None, chunks)) + rest
+        return output.decode(errors="replace"), status if ended else None
 
 
 def read_steps(output):
@@ -67,7 +65,7 @@ def read_steps(output):
     Text of the plug-in's own between the lines, or in front of one, is passed over.
     """
     total, texts = None, []
-    for line in output.split("\n"):
+    for line in [line for line in output.split("\n") if ", " in line]:
         if total is None:
             match = re.search(r"total, (64|51)$", line)
             total = match and int(match[1])

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Faults of processes that the plug-in starts: they share its output, and are no part of the run.
+// Faults of processes that the plug-in starts: they share its output and are not part of the run.
 #include <cstdlib>
 
 #include <sys/wait.h>
@@ -55,7 +55,7 @@ void daemonFloodingStdout() {
   });
 }
 
-/// From here on there are two of them.
+/// From here on two processes go on with the run.
 void forkChildThatGoesOn() { static_cast<void>(fork()); }
 
 void forkChildThatExits() {
@@ -64,7 +64,7 @@ void forkChildThatExits() {
 
 void forkChildThatCrashes() { doInAChild(storeToAddressZero); }
 
-/// The child works in its parent's memory.
+/// The child runs in its parent's memory.
 void vforkChildThatCrashes() {
   const pid_t child = vfork();  // NOLINT(clang-analyzer-security.insecureAPI.vfork): that is the point
   if (child == 0) {

@@ -28,7 +28,7 @@ enum class WhenUnloaded { kNothing, kThrow, kPrint, kLinger };
 WhenUnloaded whenUnloaded = WhenUnloaded::kNothing;
 std::atomic<bool> isUnloaded{false};
 
-/// Runs behind every exit handler, also those that the host has registered before it loaded the plug-in.
+/// Runs after every exit handler, including those that the host registered before it loaded the plug-in.
 __attribute__((destructor)) void unload() {
   isUnloaded = true;
   if (whenUnloaded == WhenUnloaded::kThrow) throw 5;
@@ -69,7 +69,7 @@ void throwWhenUnloaded() { whenUnloaded = WhenUnloaded::kThrow; }
 
 void printWhenUnloaded() { whenUnloaded = WhenUnloaded::kPrint; }
 
-/// The limit is for a plug-in that is just being loaded: it is not unloaded before that is done.
+/// The wait is limited, since a plug-in that is still being loaded is not unloaded.
 void exitOnAThread() {
   whenUnloaded = WhenUnloaded::kLinger;
   std::thread([] { std::exit(exitStatus()); }).detach();

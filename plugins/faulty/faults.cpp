@@ -45,8 +45,8 @@ void answerLongTexts() {
 /// Stays in the stream's buffer until somebody flushes it.
 void printWithoutNewline() { std::fputs("a text without an end", stdout); }
 
-// Wide output turns a stream wide that has no orientation yet, and a wide stream prints no bytes. On a byte stream
-// wprintf prints nothing, while std::wcout still prints its text.
+// Wide output turns a stream wide that has no orientation yet, and a wide stream prints no bytes. On a byte
+// stream wprintf prints nothing, while std::wcout still prints its text.
 
 void printWide() { std::wprintf(L"a wide text\n"); }
 

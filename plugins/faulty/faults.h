@@ -1,11 +1,13 @@
 // SPDX-License-Identifier: MIT
-// What goes wrong, as the environment variable FAULT_KIND says. The names stand in the table of faults.cpp.
+// What goes wrong, as the environment variable FAULT_KIND says. The names are in the table of faults.cpp.
 //
-// Several faults, joined by a plus sign, are committed one after the other: print+null_store. One that ends in
-// "@load" is committed while the module is loaded, the others at FAULT_PLACE: buffer_stdout@load+raise:SIGKILL.
-// FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise and raise_in_atexit take
-// the signal's name after a colon: raise:SIGTERM. long_texts takes the request whose answer is too long, or all of
-// them: long_texts:45.
+// Several faults, joined by a plus sign, are committed one after the other: print+null_store. One that ends
+// in "@load" is committed while the module is loaded, the others at FAULT_PLACE:
+// buffer_stdout@load+raise:SIGKILL.
+//
+// FAULT_STATUS is the status that the exiting faults end with, 0 when it is not set. raise and raise_in_atexit
+// take the signal's name after a colon: raise:SIGTERM. long_texts takes the request whose answer is too long:
+// long_texts:45. Without a request it applies to all text requests.
 #pragma once
 
 #include <string>
@@ -14,8 +16,8 @@
 
 namespace sample_plugins {
 
-/// Commits the faults of FAULT_KIND: with `whileLoading` those that end in "@load", else the others. Returns from
-/// those faults that leave the plug-in running.
+/// Commits the faults of FAULT_KIND: with `whileLoading` those that end in "@load", else the others. Returns
+/// from those faults that leave the plug-in running.
 void commitFaults(bool whileLoading);
 
 /// The request, by its opcode, that is answered with 4000 bytes of text from now on.
@@ -29,10 +31,11 @@ extern bool yieldsNoInstance;
 /// effGetChunk (23) is answered with a size of 100 bytes and a null pointer from now on.
 extern bool answersNullChunk;
 
-/// A test asked for something that does not exist: says so on standard error and ends the process with 125.
+/// For a test that asks for something that does not exist: prints the problem on standard error and ends the
+/// process with status 125.
 [[noreturn]] void complain(const std::string& problem);
 
-/// What the exiting faults end with.
+/// The status that the exiting faults end the process with.
 int exitStatus();
 
 /// The plainest crash.
@@ -49,7 +52,7 @@ void crashWithHeapLock();
 void crashWithStdoutLock();
 void crashWithOwnStdoutLock();
 void crashUnderDestructorLock();
-/// No crash: the next one who prints waits for ever.
+/// No crash: whoever prints next waits for ever.
 void holdStdoutLock();
 
 // Faults on a thread of the plug-in's own.
@@ -65,19 +68,19 @@ void leaveTheThread();
 
 // Faults that wait until the process ends.
 void crashInAtExit();
-/// Each time one of them crashes, the next one stands there already.
+/// Each of these handlers registers the next one before it crashes.
 void crashInEveryAtExit();
 void crashInStaticDestructor();
 void hangInAtExit();
 void useHeapInAtExit();
-/// Behind every exit handler.
+/// These two happen after every exit handler.
 void throwWhenUnloaded();
 void printWhenUnloaded();
 
 // Faults of the process: the plug-in changes what it shares with its host.
 void replaceHandlersThenCrash();
 void blockSignalsThenCrash();
-/// Those that tell of a crash still arrive.
+/// Signals that report a crash still arrive.
 void blockSignalsButCrashes();
 void bufferStdout();
 void closeStdout();

@@ -55,9 +55,9 @@ bool isAnsweredAtLength(VstInt32 opcode) {
 
 bool isWanted(VstInt32 opcode) { return longTextRequest == opcode || waitsForRequest(opcode); }
 
-/// Some requests are made only after another answer: the product's name when the effect has none, a program's
-/// name by its number when the program cannot be selected, the next child of a shell, a new name for a
-/// program whose name is another each time.
+/// Some requests are made only after a certain answer to another one: the product's name when the effect has
+/// none, a program's name by its number when the program cannot be selected, the next child of a shell, a new
+/// name for a program whose name is another each time.
 std::optional<VstIntPtr> answerThatLeadsToTheFault(VstInt32 opcode, void* ptr) {
   if (opcode == effGetEffectName && isWanted(effGetProductString)) return 0;
   if (opcode == effSetProgram && isWanted(effGetProgramNameIndexed)) return 0;
@@ -70,7 +70,7 @@ std::optional<VstIntPtr> answerThatLeadsToTheFault(VstInt32 opcode, void* ptr) {
   return std::nullopt;
 }
 
-/// Counts the places that it gets to.
+/// Reports every place that it reaches.
 class Faulty : public WellBehavedEffect {
  public:
   explicit Faulty(audioMasterCallback host) : WellBehavedEffect(host) {

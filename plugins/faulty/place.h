@@ -21,7 +21,7 @@ bool waitsForSetParameter();
 /// Whether the fault happens when this request arrives.
 bool waitsForRequest(VstInt32 opcode);
 
-/// Tells that the plug-in has got there. The fault is committed when this is the place, and its turn.
+/// Reports that the plug-in has reached this moment. The fault is committed when this is its place and turn.
 /// `opcode` tells requests apart; other moments have none.
 void reach(Moment moment, VstInt32 opcode = 0);
 

@@ -21,9 +21,10 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "shared"))
 from program_run import as_printed, run_program, take_default_signals, try_plugin  # noqa: E402
 from rows import ALL_STEPS, FLOOD, FIRST_DRAWN, LAST_DRAWN, PHASE_OF_DRAWN, TEXT_WITHOUT_END, all_rows  # noqa: E402
-from sanitizers import options_for, proofs, reason_to_leave_out, unwanted_report  # noqa: E402
+from sanitizers import kinds_of, options_for, proofs, reason_to_leave_out, unwanted_report  # noqa: E402
 
 LIMIT_IN_SECONDS = 10
+FLOOD_LIMIT_IN_SECONDS = 60  # On a busy machine 8 MiB of small writes take long.
 HANG_LIMIT_IN_SECONDS = 3
 PROOF_LIMIT_IN_SECONDS = 4
 GRACE_IN_SECONDS = 10
@@ -43,7 +44,9 @@ def command_of(row, program, plugins):
 
 
 def limit_of(row, limit=LIMIT_IN_SECONDS):
-    return HANG_LIMIT_IN_SECONDS if row.end.status is None else limit
+    if row.end.status is None:
+        return HANG_LIMIT_IN_SECONDS
+    return FLOOD_LIMIT_IN_SECONDS if "flood_stdout" in kinds_of(row) else limit
 
 
 def run_row(row, program, plugins, limit=LIMIT_IN_SECONDS, sanitizer=None):
@@ -52,7 +55,7 @@ def run_row(row, program, plugins, limit=LIMIT_IN_SECONDS, sanitizer=None):
 
 def without_noise(row, output):
     """Takes out what the plug-in itself printed. None when that is not there."""
-    kinds = (row.kind or "").split("+")
+    kinds = kinds_of(row)
     if "flood_stdout" in kinds and output.count(FLOOD) < 65536:
         return None
     if {"print", "print_when_unloaded", "wcout"}.intersection(kinds):

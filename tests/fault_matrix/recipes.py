@@ -3,8 +3,8 @@
 
     recipes.py --program build/release/vsttorture --plugins build/release/plugins RECIPE...
 
-A recipe is the commands below a heading of the page. The program is stripped, as it is in packages. Exits with 77 when a
-tool is missing that the recipe needs, or with 1 with VSTTORTURE_DEBUGGERS=required in the environment.
+A recipe is the commands below a heading of the page. The program is stripped, as it is in packages. When a tool that
+the recipe needs is missing it exits with 77, or with 1 if VSTTORTURE_DEBUGGERS=required is in the environment.
 """
 import argparse
 import collections

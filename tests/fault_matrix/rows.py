@@ -6,7 +6,7 @@ taken from the program: the phases, and the step to which each request belongs a
 
 Which rows there are:
   - every kind of fault at every place,
-  - rows of their own: texts that are too long, faults that follow each other, whole plug-ins.
+  - rows for single cases: texts that are too long, faults that follow each other, whole plug-ins.
 """
 import collections
 
@@ -23,13 +23,12 @@ LAST_WORDS = "unexpected exit"
 TEXT_WITHOUT_END = "a text without an end"
 FLOOD = "x" * 127 + "\n"
 
-# ----- Places. The steps are those printed when the fault happens there.
-#
-# What becomes of something thrown: "line" is a failure line with the phase; at creation there is then "no
-# instance", or "no second instance" (the description before the first drawn test does without); parameter calls
-# swallow it.
+# ----- Places.
 
-# total: 51 for a place that only a shell gets to; its whole run is one step.
+# steps: those that are printed when the fault happens there. thrown: what becomes of something thrown: a failure
+# "line" with the phase; "no instance" or "no second instance" at creation (the first drawn test is the first step that
+# needs the second one); "swallowed" in parameter calls. total: 51 for a place that only a shell reaches, whose whole
+# run is one step.
 Place = collections.namedtuple("Place", "name steps phase thrown total", defaults=(64,))
 
 CREATE = "create and initialize"
@@ -114,13 +113,13 @@ PLACE_OF = {place.name: place for place in PLACES}
 
 # ----- Kinds, by what they lead to.
 
-CRASH = "crash"    # the last words, status 7
-EXIT = "exit"      # the last words, the plug-in's status
-GONE = "gone"      # no word, the plug-in's status
-KILLED = "killed"  # no word, a signal
+CRASH = "crash"    # "unexpected exit", status 7
+EXIT = "exit"      # "unexpected exit", the plug-in's status
+GONE = "gone"      # the plug-in's status, without "unexpected exit"
+KILLED = "killed"  # a signal, without "unexpected exit"
 THROWN = "thrown"  # by the place
 PASS = "pass"      # as if nothing had happened
-LATE = "late"      # a whole run, then status 7 without a word
+LATE = "late"      # a whole run, then status 7 without "unexpected exit"
 LATE_KILLED = "late killed"  # a whole run, then a signal
 MUTE = "mute"      # nothing is printed any more, status 0
 HANG = "hang"      # until the host kills it
@@ -191,8 +190,8 @@ KIND_OF = {kind.name: kind for kind in KINDS}
 
 # ----- What a host has to see.
 
-# steps: number, or FIRST_DRAWN. tail: what stands behind the step lines. status: as subprocess has it, None for a
-# run that the host ends. errors: the whole of standard error, None for anything. verdict: of docs/examples, with
+# steps: number, or FIRST_DRAWN. tail: what follows the step lines. status: negative for a signal, None for a run
+# that the host ends. errors: the whole of standard error, None for anything. verdict: of docs/examples, with
 # {} for the number of steps.
 End = collections.namedtuple("End", "steps tail status verdict errors total", defaults=(None, 64))
 
@@ -206,7 +205,7 @@ def passed(errors="", total=64):
 
 
 def gone_at(steps, status):
-    """A plug-in that leaves without a word cannot be told from the program that leaves by itself."""
+    """A plug-in that calls _exit cannot be told from a program that ends by itself."""
     if steps == 0 and status == 5:
         return End(steps, "", status, "refused", "")
     if steps == ALL_STEPS and status == 0:
@@ -215,7 +214,7 @@ def gone_at(steps, status):
 
 
 def muted_at(place):
-    """Where no line follows, none is missing."""
+    """At the last place no line follows, so none is missing."""
     whole_run = passed(total=place.total)
     return whole_run if place.steps == whole_run.steps else gone_at(place.steps, 0)
 
@@ -317,7 +316,7 @@ def rows_of_statuses():
                 yield Row(f"faulty/{kind}({status})@{place}", "faulty", kind, place, status, end)
 
 
-# Faults that follow each other, and others that need not be tried at every place.
+# Faults that follow each other, and others that are not tried at every place.
 COMBINATIONS = [
     Kind("flood_stdout+null_store", CRASH),
     Kind("fork_keeping_stdout+null_store", CRASH),
@@ -375,7 +374,7 @@ def rows_of_combinations():
         yield row(Kind("close_stdout+null_store", MUTE), PLACE_OF[place], end=End(steps, "", 7, "crashed at {}", ""))
         for kind in COMBINATIONS:
             yield row(kind, PLACE_OF[place])
-    # The forced unwinding passes the handler of the phase, which must not end it.
+    # The forced unwinding passes through the handler of the phase, which must not end it.
     not_rethrown = "FATAL: exception not rethrown\n"
     yield Row("faulty/leave_the_thread@entry", "faulty", "leave_the_thread", "entry", 9, crash_at(0, not_rethrown))
     yield Row("faulty/leave_the_thread@dispatch:52", "faulty", "leave_the_thread", "dispatch:52", 9,
