@@ -28,6 +28,7 @@ MOMENTS = ["load", "entry", "getParameter", "setParameter"]
 OPCODES = [0, 1, 2, 3, 4, 5, 6, 7, 8, 10, 11, 12, 22, 23, 24, 26, 27, 29, 31, 32, 33, 34, 35, 44, 45, 47, 48, 51, 52, 56,
            58, 70]
 MOST_TURNS = 40
+DYING_LIMIT_IN_SECONDS = 5
 ANY_END = End(0, "", 0, "")
 
 
@@ -54,6 +55,14 @@ def processes(program):
                 found.append(folder.name)
         except OSError:
             pass  # Gone meanwhile, or of another user.
+    return found
+
+
+def processes_that_stay(program):
+    """What a run has killed may still be dying."""
+    end = time.monotonic() + DYING_LIMIT_IN_SECONDS
+    while (found := processes(program)) and time.monotonic() < end:
+        time.sleep(0.1)
     return found
 
 
@@ -98,7 +107,7 @@ def main():
                 if seen.status is None or left:
                     problems += 1
                     print(f"{row.name}: {verdict}, files left: {left}", flush=True)
-        left = os.listdir(folder) + processes(program)
+        left = os.listdir(folder) + processes_that_stay(program)
     if left:
         problems += 1
         print(f"left behind: {left}")

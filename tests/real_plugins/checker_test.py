@@ -41,6 +41,7 @@ class Scripted(unittest.TestCase):
              mock.patch.object(real_plugins, "expected_verdicts", lambda _: table), \
              mock.patch.object(real_plugins.InstalledPackages, "modules", lambda _, name: dict(packages).get(name)), \
              mock.patch.object(real_plugins, "exports_entry_point", lambda path: "helper" not in path), \
+             mock.patch.dict(os.environ, {"VSTTORTURE_REAL_PLUGINS": ""}), \
              contextlib.redirect_stdout(output):
             status = real_plugins.main()
         return status, re.sub(r" in \d+ s", "", output.getvalue())
