@@ -25,8 +25,8 @@ from rows import KINDS, End, Row
 
 SHARE_OF_OTHER_SAMPLES = 0.1
 MOMENTS = ["load", "entry", "getParameter", "setParameter"]
-OPCODES = [0, 1, 2, 3, 4, 5, 6, 7, 8, 10, 11, 12, 22, 23, 24, 26, 27, 29, 31, 32, 33, 34, 35, 44, 45, 47, 48, 51, 52, 56,
-           58, 70]
+OPCODES = [0, 1, 2, 3, 4, 5, 6, 7, 8, 10, 11, 12, 22, 23, 24, 26, 27, 29, 31, 32, 33, 34, 35, 44, 45, 47, 48, 51, 52,
+           56, 58, 70]
 MOST_TURNS = 40
 DYING_LIMIT_IN_SECONDS = 5
 ANY_END = End(0, "", 0, "")
