@@ -1,27 +1,29 @@
 // SPDX-License-Identifier: MIT
-// Parameter values of an instance, one after the other under one hold of the wrapper's lock.
+// Reads and sets several parameter values of an instance under one hold of the wrapper's lock.
 //
-// The lock costs more than a plug-in that just tells a value. Where all values are read or written in a row
-// it is taken once for all of them; VSTWrapper::getParameter and setParameter take it for their one.
+// Taking the lock costs more than reading a value from a simple plug-in. Code that reads or sets all values
+// in a row therefore takes the lock once; VSTWrapper::getParameter and setParameter take it for one value.
 #pragma once
 
 #include <mutex>
 
 #include "host/vst_wrapper.h"
 
-/// Holds the lock for as long as it lives. An index outside 0 to numParams - 1, as it is at that moment,
-/// reads as 0.0 and writes nothing. What the plug-in throws is swallowed, value by value.
+/// Takes the lock when the first value is read or set, and releases it when destroyed. Without any value it
+/// takes no lock. An index outside 0 to numParams - 1 (numParams is read afresh each time) reads as 0.0 and
+/// sets nothing. Exceptions from the plug-in are swallowed, separately for each value.
 class LockedValues {
  public:
   explicit LockedValues(VSTWrapper& wrapper)
-      : effect(wrapper.effect), paramBeingSet(wrapper.paramBeingSet), guard(wrapper.lock) {}
+      : effect(wrapper.effect), paramBeingSet(wrapper.paramBeingSet), hold(wrapper.lock, std::defer_lock) {}
 
   [[nodiscard]] bool has(VstInt32 index) const {
     return effect != nullptr && index >= 0 && index < effect->numParams;
   }
 
-  [[nodiscard]] float get(VstInt32 index) const {
+  [[nodiscard]] float get(VstInt32 index) {
     if (!has(index)) return 0.0f;
+    takeLock();
     try {
       return ask(index);
     } catch (...) {
@@ -31,17 +33,19 @@ class LockedValues {
 
   void set(VstInt32 index, float value) {
     if (!has(index)) return;
+    takeLock();
     try {
-      // On purpose: a value that the plug-in holds already is never sent.
+      // On purpose: a value equal to the present one is never sent.
       if (ask(index) == value) return;
       const ParamBeingSet being(paramBeingSet, index);
       effect->setParameter(effect, index, value);
-    } catch (...) {  // The plug-in's own trouble: the parameter stays as it is.
+    } catch (...) {  // The parameter keeps the value that the plug-in left it with.
     }
   }
 
  private:
-  /// Names the parameter that is being set, for as long as it lives.
+  /// Sets paramBeingSet to `index`, and back to -1 when destroyed.
+  /// On purpose: also -1 when an outer setParameter is still running.
   class ParamBeingSet {
    public:
     ParamBeingSet(VstInt32& itsSlot, VstInt32 index) : slot(itsSlot) { slot = index; }
@@ -53,8 +57,12 @@ class LockedValues {
     VstInt32& slot;
   };
 
-  /// The answer goes through memory: where floats are returned in a wider register, it would otherwise differ
-  /// from the 32-bit value that the plug-in was given.
+  void takeLock() {
+    if (!hold.owns_lock()) hold.lock();
+  }
+
+  /// Asks the plug-in for a value. The volatile variable rounds it to 32 bits: where floats are returned in a
+  /// wider register, the answer could otherwise differ from the value that the plug-in was given.
   [[nodiscard]] float ask(VstInt32 index) const {
     const volatile float value = effect->getParameter(effect, index);
     return value;
@@ -62,5 +70,5 @@ class LockedValues {
 
   AEffect* const effect;
   VstInt32& paramBeingSet;
-  const std::lock_guard<const NiduCoreRecursiveMutex> guard;
+  std::unique_lock<const NiduCoreRecursiveMutex> hold;
 };

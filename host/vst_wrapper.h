@@ -203,7 +203,6 @@ class VSTWrapper {
   void connectAllPins();
   [[nodiscard]] VstInt32 currentProgram() const;
   [[nodiscard]] VstInt32 parameterCount() const { return effect == nullptr ? 0 : effect->numParams; }
-  [[nodiscard]] bool hasParameter(VstInt32 index) const { return index >= 0 && index < parameterCount(); }
   [[nodiscard]] VstInt32 programCount() const;
   [[nodiscard]] bool hasChunks() const;
 

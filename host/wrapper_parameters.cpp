@@ -12,13 +12,9 @@ constexpr std::size_t kParameterTextBufferSize = 256;
 
 }  // namespace
 
-float VSTWrapper::getParameter(int index) {
-  return hasParameter(index) ? LockedValues(*this).get(index) : 0.0f;
-}
+float VSTWrapper::getParameter(int index) { return LockedValues(*this).get(index); }
 
-void VSTWrapper::setParameter(int index, float value) {
-  if (hasParameter(index)) LockedValues(*this).set(index, value);
-}
+void VSTWrapper::setParameter(int index, float value) { LockedValues(*this).set(index, value); }
 
 std::string VSTWrapper::getParameterName(int index) {
   char name[kParameterNameBufferSize];

@@ -74,7 +74,7 @@ void VSTWrapper::writeProgramBlock(char* block, VstInt32 parameters) {
   writeHeader(block, kPresetParameterProgramMagic, effect, parameters);
   writeProgramName(block, getCurrentProgramName());
   char* value = block + kProgramContentAt;
-  const LockedValues values(*this);
+  LockedValues values(*this);
   for (VstInt32 i = 0; i < parameters; ++i, value += sizeof(float)) writeFloat(value, values.get(i));
 }
 

@@ -92,7 +92,7 @@ void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
   std::memset(store.data(), 0, static_cast<std::size_t>(store.size()));
   const std::string name = getCurrentProgramName();
   std::memcpy(store.data(), name.c_str(), std::min(name.size(), kStoreNameSize - 1));
-  const LockedValues values(*this);
+  LockedValues values(*this);
   for (VstInt32 i = 0; i < parameters; ++i) {
     const float value = values.get(i);
     std::memcpy(valueInStore(store.data(), i), &value, sizeof value);
