@@ -29,11 +29,13 @@ char* valueInStore(char* store, VstInt32 index) {
 }  // namespace
 
 void VSTWrapper::setCurrentProgram(int index) {
-  const VstInt32 programs = programCount();
-  if (programs <= 0) return;
+  if (programCount() <= 0) return;
   // On purpose: compared as given, before it is clamped.
   if (index == currentProgram()) return;
-  dispatch(*effect, effSetProgram, 0, std::clamp(index, 0, programs - 1));
+  // The count is read again, since the plug-in may have changed it while it was asked.
+  const std::int64_t last = std::int64_t{programCount()} - 1;
+  const std::int64_t program = index < 0 ? 0 : std::min<std::int64_t>(index, last);
+  dispatch(*effect, effSetProgram, 0, static_cast<VstIntPtr>(program));
 }
 
 std::string VSTWrapper::getCurrentProgramName() {
