@@ -148,8 +148,15 @@ class VSTWrapper {
 
   // ---- Preset and bank data -------------------------------------------------------------------------------
 
-  /// Writes the state into `out` in the layout of fxp (one program) or fxb (bank) data, as a chunk where the
-  /// plug-in has effFlagsProgramChunks, else as parameter values. Always true.
+  /// Writes the state into `out` in the layout of fxp (one program) or fxb (bank) data: as a chunk if the
+  /// plug-in has effFlagsProgramChunks, else as parameter values. Always true. The counts are read once, at
+  /// the start; a parameter that no longer exists when its turn comes is saved as 0.0.
+  /// On purpose: a negative numParams is not corrected. It is used in computing sizes and written in the
+  /// count field of a program. A negative size is a failed allocation (the int -1); a size smaller than the
+  /// header (56 bytes for a program, 156 for a bank) becomes that of the header. Where the programs of a bank
+  /// get less than 56 bytes each, only the beginning of each one is written.
+  /// On purpose: a negative numParams is not corrected. From -16 on there are just the 64 bytes of the name,
+  /// below that the size is negative, which is a failed allocation (the int -1).
   bool saveToFXBData(AutoBuffer<char>& out, bool asBank);
 
   /// Checks fxp or fxb data of `size` bytes and gives it to the plug-in. False for what is refused; a bank

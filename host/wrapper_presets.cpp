@@ -19,11 +19,20 @@ constexpr VstInt32 kFormatVersion = 1;
 constexpr int kSmallestData = 28;
 constexpr std::int64_t kChunkSizeField = 4;
 
-/// An 'FxCk' block with this many parameter values.
-int programSizeOrFail(VstInt32 parameters) {
-  return sizeOrFail(kProgramContentAt, parameters, sizeof(float));
+/// The size in bytes of an 'FxCk' block with this many parameter values.
+/// On purpose: a negative count is not corrected, so the block comes out smaller than its header or negative.
+constexpr std::int64_t programSize(VstInt32 parameters) {
+  return std::int64_t{kProgramContentAt} + parameters * std::int64_t{sizeof(float)};
 }
 
+/// Makes room for `fixed` + `count` x `each` bytes, and at least for the header. Throws the int -1 for a
+/// negative sum, and where there is no memory.
+void makeRoom(AutoBuffer<char>& out, std::size_t headerSize, std::int64_t fixed, VstInt32 count,
+              std::int64_t each) {
+  out.setSize(std::max(sizeOrFail(fixed, count, each), static_cast<int>(headerSize)));
+}
+
+/// Writes the 28 bytes that all forms begin with.
 /// On purpose: the byte-size field is 0 and not the size.
 void writeHeader(char* at, VstInt32 formMagic, const AEffect* effect, VstInt32 count) {
   writeWord(at + kChunkMagicAt, kPresetChunkMagic);
@@ -66,8 +75,7 @@ void VSTWrapper::setChunkData(const char* data, int size, bool isPreset) {
 }
 
 void VSTWrapper::setParamsInProgramBlock(fxProgram* block) {
-  writeProgramBlock(reinterpret_cast<char*>(block), std::max(parameterCount(), 0));
-  // On purpose: the pointer is not checked. A null chunk with a size crashes, as a bad pointer does.
+  writeProgramBlock(reinterpret_cast<char*>(block), parameterCount());
 }
 
 void VSTWrapper::writeProgramBlock(char* block, VstInt32 parameters) {
@@ -84,8 +92,8 @@ bool VSTWrapper::saveToFXBData(AutoBuffer<char>& out, bool asBank) {
   } else if (asBank) {
     saveParameterBank(out);
   } else {
-    const VstInt32 parameters = std::max(parameterCount(), 0);
-    out.setSize(programSizeOrFail(parameters));
+    const VstInt32 parameters = parameterCount();
+    makeRoom(out, kProgramContentAt, programSize(parameters), 0, 0);
     writeProgramBlock(out.data(), parameters);
   }
   return true;
@@ -109,29 +117,34 @@ void VSTWrapper::saveChunk(AutoBuffer<char>& out, bool asBank) {
 }
 
 void VSTWrapper::saveParameterBank(AutoBuffer<char>& out) {
-  // The counts are read once: a plug-in that changes them on the way cannot make a block leave the buffer.
-  const VstInt32 parameters = std::max(parameterCount(), 0);
+  // The counts are read once: a plug-in that changes them meanwhile cannot move a block out of the buffer.
+  const VstInt32 parameters = parameterCount();
   const VstInt32 programs = programCount();
   const VstInt32 blocks = std::max(programs, 1);
-  const int blockSize = programSizeOrFail(parameters);
-  out.setSize(sizeOrFail(kBankContentAt, blocks, blockSize));
-  // Each program writes the whole of its block. Only the room in a bank without programs may stay empty.
-  const int unwritten = programs > 0 ? 0 : blockSize;
+  const std::int64_t blockSize = programSize(parameters);
+  makeRoom(out, kBankContentAt, kBankContentAt, blocks, blockSize);
+  // Each program fills its block. Only in a bank without programs can the one block stay unwritten.
+  const std::int64_t unwritten = programs > 0 ? 0 : std::max<std::int64_t>(blockSize, 0);
   std::memset(out.data(), 0, kBankContentAt + static_cast<std::size_t>(unwritten));
   writeHeader(out.data(), kPresetParameterBankMagic, effect, programs);
 
-  const auto blockAt = [&](VstInt32 program) {
-    return out.data() + kBankContentAt + std::int64_t{program} * blockSize;
+  const auto writeBlock = [&](VstInt32 program) {
+    const std::int64_t at = std::int64_t{kBankContentAt} + program * blockSize;
+    if (parameters >= 0) return writeProgramBlock(out.data() + at, parameters);
+    // A negative count leaves a block less room than its header takes. Only what has room is written.
+    char header[kProgramContentAt];
+    writeProgramBlock(header, parameters);
+    if (blockSize > 0) std::memcpy(out.data() + at, header, static_cast<std::size_t>(blockSize));
   };
   const VstInt32 current = currentProgram();
   AutoBuffer<char> store;
   createTempParameterStore(store);
   // A current program outside the bank has no block of its own.
-  if (current >= 0 && current < blocks) writeProgramBlock(blockAt(current), parameters);
+  if (current >= 0 && current < blocks) writeBlock(current);
   for (VstInt32 i = 0; i < programs; ++i) {
     if (i == current) continue;
     setCurrentProgram(i);
-    writeProgramBlock(blockAt(i), parameters);
+    writeBlock(i);
   }
   setCurrentProgram(current);
   restoreFromTempParameterStore(store);

@@ -89,8 +89,10 @@ void VSTWrapper::updateStoredProgramNames() {
 }
 
 void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
-  const VstInt32 parameters = std::max(parameterCount(), 0);
-  store.setSize(sizeOrFail(kStoreNameSize, parameters, sizeof(float)));
+  // On purpose: a negative count is not corrected. The size is then that of the name, or a failed allocation.
+  const VstInt32 parameters = parameterCount();
+  const int size = sizeOrFail(kStoreNameSize, parameters, sizeof(float));
+  store.setSize(std::max(size, static_cast<int>(kStoreNameSize)));
   std::memset(store.data(), 0, static_cast<std::size_t>(store.size()));
   const std::string name = getCurrentProgramName();
   std::memcpy(store.data(), name.c_str(), std::min(name.size(), kStoreNameSize - 1));

@@ -5,10 +5,11 @@
 #include <cstdint>
 #include <limits>
 
-/// `fixed` + `count` x `each`, in bytes. Throws the int -1 where that is more than a buffer can hold.
-/// `count` is at least 0; `fixed` and `each` are below 2^32.
+/// `fixed` + `count` x `each`, in bytes. Throws the int -1 where that is negative or more than an int holds.
 inline int sizeOrFail(std::int64_t fixed, std::int32_t count, std::int64_t each) {
-  constexpr std::int64_t kMax = std::numeric_limits<int>::max();
-  if (fixed > kMax || (count > 0 && each > (kMax - fixed) / count)) throw -1;
-  return static_cast<int>(fixed + count * each);
+  std::int64_t size = 0;
+  if (__builtin_mul_overflow(std::int64_t{count}, each, &size)) throw -1;
+  if (__builtin_add_overflow(size, fixed, &size)) throw -1;
+  if (size < 0 || size > std::numeric_limits<int>::max()) throw -1;
+  return static_cast<int>(size);
 }

@@ -69,6 +69,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* input, std::size_t siz
   try {
     loadAndSave(*wrapper, data.get(), static_cast<int>(dataSize));
   } catch (const TooManyRequests&) {  // Thrown from a request, as plug-ins do.
+  } catch (int) {                     // A negative number of parameters gave a size that cannot be allocated.
   }
   effect.onRequest = nullptr;
   return 0;
