@@ -12,8 +12,8 @@ struct Capability {
   VstInt32 answer;
 };
 
-// On purpose: some of these are claimed although the callback does not serve them (it answers
-// audioMasterGetTime and audioMasterSizeWindow with 0).
+// On purpose: the host claims capabilities that the callback does not serve (it answers audioMasterGetTime,
+// 7, and audioMasterSizeWindow, 15, with 0).
 constexpr Capability kCapabilities[] = {
     {"sendVstEvents", 1},
     {"sendVstMidiEvent", 1},

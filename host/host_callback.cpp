@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
-// The host's side of the conversation: what plug-ins are answered when they call their host.
+// The host callback: the function that plug-ins call, and its answers.
 //
-// Threads: any that the plug-in has. Reads VSTWrapper::gCurrentLoadID and no other state, never the instance:
-//          the answers are the same for all instances, and while an entry point runs.
+// Threads: any thread of the plug-in. Reads VSTWrapper::gCurrentLoadID and no other state. It never looks at
+//          the instance, so the answers are the same for all instances, also while an entry point runs.
 #include <cstring>
 
 #include "host/host_answers.h"

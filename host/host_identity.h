@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Who this host says it is.
+// The name and version that this host tells plug-ins.
 #pragma once
 
 #include <cstdint>
@@ -15,5 +15,5 @@ struct KelClientVersion {
 /// Fills in the host's version: 8.0.0.
 void GetHostVersion(KelClientVersion& version);
 
-/// The bundle identifier of the application that starts this tool, in reverse-DNS form.
+/// The bundle identifier of the application that starts this program, in reverse-DNS form.
 std::string GetHostId();

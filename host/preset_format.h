@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
-// Reading and writing the fields of preset and bank data.
+// Reads and writes the fields of preset and bank data.
 //
-// The data is big-endian and this program runs on little-endian processors only, so every field is reversed,
-// unconditionally, on the way in and on the way out. Pointers need no alignment.
+// The data is big-endian. This program runs on little-endian processors only, so the bytes of every field are
+// reversed unconditionally, on reading and on writing. Pointers need no alignment.
 #pragma once
 
 #include <cstddef>
@@ -26,17 +26,20 @@ inline VstInt32 vst_swapFloat(float value) {
   return vst_swap(word);
 }
 
+/// Reads a 32-bit number.
 inline VstInt32 readWord(const char* at) {
   VstInt32 word = 0;
   std::memcpy(&word, at, sizeof word);
   return vst_swap(word);
 }
 
+/// Writes a 32-bit number.
 inline void writeWord(char* at, VstInt32 value) {
   const VstInt32 word = vst_swap(value);
   std::memcpy(at, &word, sizeof word);
 }
 
+/// Reads a 32-bit float.
 inline float readFloat(const char* at) {
   const VstInt32 word = readWord(at);
   float value = 0.0f;
@@ -44,12 +47,14 @@ inline float readFloat(const char* at) {
   return value;
 }
 
+/// Writes a 32-bit float.
 inline void writeFloat(char* at, float value) {
   const VstInt32 word = vst_swapFloat(value);
   std::memcpy(at, &word, sizeof word);
 }
 
-/// The name field of a program up to its first zero byte.
+/// The name in a program's name field: up to its first zero byte, or all 28 bytes if there is none.
 std::string readProgramName(const char* program);
-/// Writes the first 27 characters and fills the rest of the field with zero bytes.
+
+/// Writes the first 27 characters of `name` and fills the rest of the 28 bytes with zero bytes.
 void writeProgramName(char* program, const std::string& name);

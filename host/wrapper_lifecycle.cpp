@@ -14,6 +14,7 @@ constexpr std::size_t kNameBufferSize = 114;
 constexpr std::uint32_t kExtensionTokenMask = 0xFFFF0000u;
 constexpr std::uint32_t kExtensionToken = 0xBEEF0000u;
 
+/// The instance, or null when the entry point throws.
 AEffect* callEntry(void* entry) {
   try {
     return reinterpret_cast<PluginEntryProc>(entry)(VSTWrapper::masterCallback);
@@ -22,7 +23,7 @@ AEffect* callEntry(void* entry) {
   }
 }
 
-/// Tells the host callback which child is wanted, for as long as it lives.
+/// Makes the host callback answer with this child's identifier, until it is destroyed.
 class CurrentLoadID {
  public:
   explicit CurrentLoadID(const VST_ChildSpec& child) {
@@ -52,7 +53,7 @@ VSTWrapper::VSTWrapper(const NiduCOM::i_ptr<VSTPluginLoader>& module, const VST_
     : loader(module), childSpec(child), supportEffect(support) {
   void* entry = loader->getMainEntry();
   nidu_FailNULL(entry);
-  // On purpose: any instance will do, its magic number is not looked at.
+  // On purpose: any instance is accepted; its magic number is not checked.
   effect = callEntry(entry);
   nidu_FailNULL(effect);
   effect->resvd2 = reinterpret_cast<VstIntPtr>(this);
@@ -78,7 +79,7 @@ VSTWrapper::~VSTWrapper() noexcept(false) {
     }
     dispatch(*effect, effClose);
   } catch (...) {
-    // The failure that is under way already is the one to report.
+    // A second exception during unwinding would end the process; the first one is the one to report.
     if (!isUnwinding) throw;
   }
 }
@@ -126,7 +127,7 @@ std::string VSTWrapper::getManufacturerName() {
   vst_zerostruct(buffer);
   if (dispatch(*effect, effGetVendorString, 0, 0, buffer) == 0) return "unknown";
   std::string vendor = textIn(buffer);
-  // On purpose: this maker's sampler reports its product name as its maker.
+  // On purpose: one maker's sampler reports its product name as the maker's name.
   if (vendor == "Play" && getEffectName() == "Play") return "EastWest";
   return vendor;
 }

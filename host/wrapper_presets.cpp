@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
 // VSTWrapper: preset and bank data.
 //
-// Four forms: one program or a bank of all, each with parameter values or with the plug-in's own chunk. The
-// layout is in vst2/preset_data.h, its fields are read and written through host/preset_format.h.
+// There are four forms: one program or a bank of all programs, each with parameter values or with the
+// plug-in's own chunk. vst2/preset_data.h has the layout; host/preset_format.h reads and writes the fields.
 #include <algorithm>
 #include <cstring>
 #include <limits>
@@ -44,8 +44,10 @@ void writeHeader(char* at, VstInt32 formMagic, const AEffect* effect, VstInt32 c
   writeWord(at + kCountAt, count);
 }
 
-/// Where program `index` of a parameter bank starts, as the first program's count says. A negative count
-/// gives a place before the data. The stride is kept to what decides, so that the product cannot overflow.
+/// The offset of program `index` in a parameter bank. All programs are taken to be as long as the first one's
+/// parameter count says; a negative count can give an offset before the data. The stride is limited to plus
+/// or minus INT_MAX, beyond which no program but the first is inside anyway, so that the product cannot
+/// overflow.
 std::int64_t bankProgramAt(const char* bank, VstInt32 index) {
   constexpr std::int64_t kFarthest = std::numeric_limits<VstInt32>::max();
   const std::int64_t parameters = readWord(bank + kBankContentAt + kCountAt);
@@ -65,6 +67,7 @@ void VSTWrapper::getChunkData(AutoBuffer<char>& out, bool isPreset) const {
   const VstIntPtr size = dispatch(*effect, effGetChunk, isPreset ? 1 : 0, 0, &chunk);
   if (size > std::numeric_limits<int>::max() || size < 0) throw -1;
   out.setSize(static_cast<int>(size));
+  // On purpose: the pointer is not checked. A null chunk with a size crashes, as a bad pointer does.
   if (size > 0) std::memcpy(out.data(), chunk, static_cast<std::size_t>(size));
 }
 
@@ -106,7 +109,7 @@ void VSTWrapper::saveChunk(AutoBuffer<char>& out, bool asBank) {
   const std::int64_t fixedSize = static_cast<std::int64_t>(contentAt) + kChunkSizeField;
   out.setSize(sizeOrFail(fixedSize, chunk.size(), 1));
   std::memset(out.data(), 0, contentAt);
-  // On purpose: a program's count is the number of programs too, not of parameters.
+  // On purpose: the count of a single program, too, is the number of programs and not of parameters.
   writeHeader(out.data(), asBank ? kPresetChunkBankMagic : kPresetChunkProgramMagic, effect,
               effect->numPrograms);
   if (!asBank) writeProgramName(out.data(), getCurrentProgramName());
@@ -161,8 +164,8 @@ bool VSTWrapper::restoreProgramSettings(const fxProgram* block) {
 void VSTWrapper::loadProgramValues(const char* block) {
   changeProgramName(currentProgram(), readProgramName(block));
   const VstInt32 count = readWord(block + kCountAt);
-  // On purpose: the values are not checked against the size of the data. Those that no parameter takes are
-  // not read.
+  // On purpose: the values are not checked against the size of the data. Values beyond the plug-in's last
+  // parameter are not read.
   const char* value = block + kProgramContentAt;
   LockedValues values(*this);
   for (VstInt32 i = 0; i < count && values.has(i); ++i, value += sizeof(float)) {
@@ -178,13 +181,13 @@ bool VSTWrapper::loadFromFXBData(const void* data, int size) {
   if (chunkMagic != kPresetChunkMagic && !isReversed) return false;
   if (readWord(bytes + kFormatVersionAt) > kFormatVersion) return false;
 
-  // On purpose: the parameter forms are known in their proper byte order only, the chunk forms in both.
-  // On purpose: the size of a chunk is read without a look at whether the data reaches that far.
+  // On purpose: the parameter forms are recognised in their proper byte order only, the chunk forms in both.
+  // On purpose: the chunk size is read without checking that the data reaches that far.
   switch (readWord(bytes + kFormMagicAt)) {
     case kPresetParameterBankMagic:
       return loadParameterBank(bytes, size);
     case kPresetParameterProgramMagic:
-      // On purpose: here the reversed chunk magic is refused after all.
+      // On purpose: this form alone is refused behind the reversed chunk magic.
       if (isReversed) return false;
       loadProgramValues(bytes);
       return true;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
-// VSTWrapper: programs, and the store that saves the current one while others are visited.
+// VSTWrapper: programs, and the store that saves the current program while others are visited.
 //
-// A temporary parameter store is the program's name (64 bytes, zero-terminated), then one 32-bit float for
+// A temporary parameter store holds the program's name (64 bytes, zero-terminated), then one 32-bit float for
 // each parameter in the machine's own byte order.
 #include <algorithm>
 #include <cstring>
@@ -18,6 +18,7 @@ constexpr std::size_t kProgramNameBufferSize = 256;
 constexpr std::size_t kMaxSentNameLength = 24;
 constexpr std::size_t kStoreNameSize = 64;
 
+/// How many values a store holds, whatever the number of parameters is now.
 VstInt32 valuesInStore(const AutoBuffer<char>& store) {
   return (store.size() - VstInt32{kStoreNameSize}) / VstInt32{sizeof(float)};
 }
@@ -49,7 +50,7 @@ std::string VSTWrapper::getCurrentProgramName() {
   if (program >= storedProgramNames.size()) {
     allocateOrFail([&] { storedProgramNames.resize(program + 1); });
   }
-  // On purpose: a stored name stays, whatever the plug-in calls the program later.
+  // On purpose: a stored name is never replaced, even when the plug-in renames the program.
   if (storedProgramNames[program].empty()) storedProgramNames[program] = name;
   return name;
 }
@@ -105,7 +106,7 @@ void VSTWrapper::createTempParameterStore(AutoBuffer<char>& store) {
 
 void VSTWrapper::restoreFromTempParameterStore(const AutoBuffer<char>& store) {
   changeProgramName(currentProgram(), store.data());
-  // A plug-in may have got more parameters meanwhile: nothing is read behind the store's end.
+  // The plug-in may have more parameters than when the store was made; only the stored ones are set.
   LockedValues values(*this);
   for (VstInt32 i = 0; i < valuesInStore(store) && values.has(i); ++i) {
     float value = 0.0f;
