@@ -1,18 +1,24 @@
 // SPDX-License-Identifier: MIT
-// VSTWrapper::masterCallback: the answer to every request that a plug-in can make.
+// VSTWrapper::masterCallback: the answer to every request that a plug-in can make, and what stands behind the
+// answers.
+#include <cctype>
 #include <climits>
 #include <cstdint>
+#include <map>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
+#include "host/host_answers.h"
+#include "host/host_identity.h"
 #include "host/vst_wrapper.h"
+#include "tests/host/named_case.h"
 #include "tests/shared/recording_core_foundation.h"
 
 namespace {
 
+using testing::ElementsAre;
 using testing::IsEmpty;
 
 constexpr VstInt32 kNidu = 1313424469;  // 'NIDU'
@@ -21,107 +27,64 @@ VstIntPtr ask(VstInt32 opcode, void* ptr = nullptr) {
   return VSTWrapper::masterCallback(nullptr, opcode, 0, 0, ptr, 0.0f);
 }
 
+VstIntPtr askWith(VstInt32 opcode, std::string text) { return ask(opcode, text.data()); }
+
+std::vector<VstInt32> someOpcodes() {
+  std::vector<VstInt32> opcodes = {
+      INT_MIN, -kNidu,    -37,       -2,         -1,     1000,
+      2400,    kNidu - 1, kNidu + 1, 0x5544494E, INT_MAX};  // 0x5544494E is 'UDIN'
+  for (VstInt32 opcode = 0; opcode <= 300; ++opcode) opcodes.push_back(opcode);
+  return opcodes;
+}
+
 class VSTWrapperMasterCallback : public testing::Test {
  protected:
-  doubles::RecordingCoreFoundation core_foundation;
+  doubles::RecordingCoreFoundation core_foundation;  // The locale is en_US.
 };
 
-struct AnswerCase {
-  VstInt32 opcode;
-  VstIntPtr answer;
-};
-
-const AnswerCase kAnswers[] = {
-    {0, 0},          {1, 2400},    {2, 0},       {3, 0},     {4, 0},         {5, 0},         {6, 0},
-    {7, 0},          {8, 0},       {9, 0},       {10, 0},    {11, 0},        {12, 0},        {13, 0},
-    {14, 0},         {15, 0},      {16, 0},      {17, 0},    {18, 0},        {19, 0},        {20, 0},
-    {21, 0},         {22, 0},      {23, 0},      {24, 0},    {25, 0},        {26, 0},        {27, 0},
-    {28, 0},         {29, 0},      {30, 0},      {31, 0},    {32, 0},        {33, 0},        {34, 134217728},
-    {35, 0},         {36, 0},      {37, 0},      {38, 1},    {39, 0},        {40, 0},        {41, 0},
-    {42, 0},         {43, 0},      {44, 0},      {45, 0},    {46, 0},        {47, 0},        {48, 0},
-    {49, 0},         {50, 0},      {51, 0},      {52, 0},    {53, 0},        {54, 0},        {55, 0},
-    {56, 0},         {57, 0},      {58, 0},      {59, 0},    {60, 0},        {61, 0},        {70, 0},
-    {99, 0},         {256, 0},     {257, 0},     {1000, 0},  {2400, 0},      {-1, 0},        {-2, 0},
-    {-37, 0},        {INT_MIN, 0}, {INT_MAX, 0}, {kNidu, 0}, {kNidu - 1, 0}, {kNidu + 1, 0}, {-kNidu, 0},
-    {0x5544494E, 0},  // 'UDIN'
-};
-
-TEST_F(VSTWrapperMasterCallback, AnswersEachRequestInThisWay) {
-  for (const AnswerCase& row : kAnswers) {
-    char text[64] = {};
-    EXPECT_EQ(ask(row.opcode, text), row.answer) << "opcode " << row.opcode;
-  }
-}
-
-TEST_F(VSTWrapperMasterCallback, LooksAtNothingButOpcodeAndPointer) {
+TEST_F(VSTWrapperMasterCallback, AnswersByTheOpcodeAloneAndZeroToAllButFive) {
+  const std::map<VstInt32, VstIntPtr> answers = {{1, 2400}, {34, 134217728}, {38, 1}};
   auto* const garbage = reinterpret_cast<AEffect*>(std::uintptr_t{1});
-  for (const AnswerCase& row : kAnswers) {
+  for (const VstInt32 opcode : someOpcodes()) {
+    SCOPED_TRACE("opcode " + std::to_string(opcode));
+    const auto found = answers.find(opcode);
+    const VstIntPtr answer = found == answers.end() ? 0 : found->second;
     char text[64] = {};
-    EXPECT_EQ(VSTWrapper::masterCallback(garbage, row.opcode, -1, -1, text, -1.0f), row.answer)
-        << "opcode " << row.opcode;
-    EXPECT_EQ(VSTWrapper::masterCallback(nullptr, row.opcode, INT_MAX, 4711, text, 1e30f), row.answer)
-        << "opcode " << row.opcode;
+    EXPECT_EQ(VSTWrapper::masterCallback(nullptr, opcode, 0, 0, text, 0.0f), answer);
+    EXPECT_EQ(VSTWrapper::masterCallback(garbage, opcode, -1, -1, text, -1.0f), answer);
+    EXPECT_EQ(VSTWrapper::masterCallback(nullptr, opcode, INT_MAX, 4711, text, 1e30f), answer);
+    if (opcode != 32 && opcode != 33 && opcode != 37) {
+      EXPECT_EQ(ask(opcode, nullptr), answer);
+    }
   }
 }
 
-TEST_F(VSTWrapperMasterCallback, NeedsThePointerInFourTextRequestsAndTheServiceOnly) {
-  for (const AnswerCase& row : kAnswers) {
-    if (row.opcode == 32 || row.opcode == 33 || row.opcode == 37 || row.opcode == kNidu) continue;
-    EXPECT_EQ(ask(row.opcode, nullptr), row.answer) << "opcode " << row.opcode;
-  }
-}
-
-TEST_F(VSTWrapperMasterCallback, WritesNothingButTheTwoNames) {
-  for (const AnswerCase& row : kAnswers) {
-    if (row.opcode == 32 || row.opcode == 33) continue;
+TEST_F(VSTWrapperMasterCallback, WritesOnlyTheTwoNamesAndAsksTheSystemOnlyForTheLanguage) {
+  for (const VstInt32 opcode : someOpcodes()) {
+    if (opcode == 32 || opcode == 33 || opcode == 38) continue;
     std::string text(80, 'z');
-    ask(row.opcode, text.data());
-    EXPECT_EQ(text, std::string(80, 'z')) << "opcode " << row.opcode;
-  }
-}
-
-TEST_F(VSTWrapperMasterCallback, AsksTheSystemForTheLanguageOnly) {
-  for (const AnswerCase& row : kAnswers) {
-    if (row.opcode == 38) continue;
-    char text[64] = {};
-    ask(row.opcode, text);
+    ask(opcode, text.data());
+    EXPECT_EQ(text, std::string(80, 'z')) << "opcode " << opcode;
   }
   EXPECT_THAT(core_foundation.calls(), IsEmpty());
 }
 
-TEST_F(VSTWrapperMasterCallback, AnswersTheSameOnAnotherThread) {
-  std::thread other([] {
-    EXPECT_EQ(ask(1), 2400);
-    EXPECT_EQ(ask(34), 134217728);
-    EXPECT_EQ(ask(2), 0);
-  });
-  other.join();
-}
-
-// ---- Names ----
-
-// On purpose: answered with 0 although the text is there.
+// On purpose: answered with 0 although the text is written.
 TEST_F(VSTWrapperMasterCallback, WritesTheVendorWithItsZeroByteAndAnswersZero) {
   std::string text(80, 'z');
   EXPECT_EQ(ask(32, text.data()), 0);
   EXPECT_EQ(text, std::string("NIDU\0", 5) + std::string(75, 'z'));
 }
 
-// On purpose: answered with 0 although the text is there.
+// On purpose: answered with 0 although the text is written.
 TEST_F(VSTWrapperMasterCallback, WritesTheProductInto64BytesZeroPaddedAndAnswersZero) {
   std::string text(80, 'z');
   EXPECT_EQ(ask(33, text.data()), 0);
   EXPECT_EQ(text, "com.nidu.kel" + std::string(52, '\0') + std::string(16, 'z'));
 }
 
-TEST_F(VSTWrapperMasterCallback, HasVersionEight) { EXPECT_EQ(ask(34), 0x08000000); }
-
-// ---- The vendor's own service ----
-
-TEST_F(VSTWrapperMasterCallback, HandsOutTheTrackSampleService) {
-  char name[] = "niduGetTrackSampleForCurBlock";
-  const VstIntPtr answer = ask(kNidu, name);
-  ASSERT_NE(answer, 0);
+TEST_F(VSTWrapperMasterCallback, ReturnsTheFunctionOfTheTrackSampleService) {
+  const VstIntPtr answer = askWith(kNidu, "niduGetTrackSampleForCurBlock");
   const auto service = reinterpret_cast<double (*)(AEffect*)>(answer);
   // The whole pointer arrives, wherever the program lies in memory.
   ASSERT_EQ(service, &VSTWrapper::trackSamplePosThunk);
@@ -130,20 +93,127 @@ TEST_F(VSTWrapperMasterCallback, HandsOutTheTrackSampleService) {
 }
 
 TEST_F(VSTWrapperMasterCallback, KnowsNoOtherService) {
-  for (const char* name :
-       {"", "n", "niduGetTrackSampleForCurBloc", "niduGetTrackSampleForCurBlock ",
-        " niduGetTrackSampleForCurBlock", "niduGetTrackSampleForCurBlocks", "NIDUGetTrackSampleForCurBlock",
-        "niduGetTrackSampleForCurblock", "nidugettracksampleforcurblock", "sendVstEvents"}) {
-    std::string text = name;
-    EXPECT_EQ(ask(kNidu, text.data()), 0) << name;
+  for (const char* name : {"", "niduGetTrackSampleForCurBloc", "niduGetTrackSampleForCurBlock ",
+                           " niduGetTrackSampleForCurBlock", "NIDUGetTrackSampleForCurBlock",
+                           "niduGetTrackSampleForCurblock", "sendVstEvents"}) {
+    EXPECT_EQ(askWith(kNidu, name), 0) << name;
   }
 }
 
 // On purpose: the service has an opcode of its own.
-TEST_F(VSTWrapperMasterCallback, HandsOutNothingThroughVendorSpecific) {
+TEST_F(VSTWrapperMasterCallback, ReturnsNoServiceThroughVendorSpecific) {
   char name[] = "niduGetTrackSampleForCurBlock";
-  EXPECT_EQ(ask(35, name), 0);
   EXPECT_EQ(VSTWrapper::masterCallback(nullptr, 35, kNidu, kNidu, name, 0.0f), 0);
+}
+
+// ---- audioMasterCanDo (37)
+
+struct CapabilityCase {
+  const char* name;
+  VstInt32 answer;
+};
+
+class HostCanDo : public testing::TestWithParam<CapabilityCase> {};
+
+TEST_P(HostCanDo, ComparesTheWholeTextCaseSensitively) {
+  const std::string capability = GetParam().name;
+  EXPECT_EQ(askWith(37, capability), GetParam().answer);
+  std::string upper = capability;
+  for (char& letter : upper) letter = static_cast<char>(std::toupper(letter));
+  for (const std::string& other :
+       {upper, capability + ' ', ' ' + capability, capability + 's', capability + capability}) {
+    EXPECT_EQ(askWith(37, other), 0) << '"' << other << '"';
+  }
+  for (std::size_t length = 0; length < capability.size(); ++length) {
+    const std::string beginning = capability.substr(0, length);
+    // The last capability begins with the second.
+    EXPECT_EQ(askWith(37, beginning), beginning == "sendVstMidiEvent" ? 1 : 0) << beginning;
+  }
+}
+
+// On purpose: the host claims capabilities that it does not serve; it answers audioMasterGetTime (7) and
+// audioMasterSizeWindow (15) with 0.
+INSTANTIATE_TEST_SUITE_P(
+    Each, HostCanDo,
+    testing::Values(CapabilityCase{"sendVstEvents", 1}, CapabilityCase{"sendVstMidiEvent", 1},
+                    CapabilityCase{"sendVstTimeInfo", 1}, CapabilityCase{"receiveVstEvents", 1},
+                    CapabilityCase{"receiveVstMidiEvent", 1}, CapabilityCase{"reportConnectionChanges", 1},
+                    CapabilityCase{"acceptIOChanges", 0}, CapabilityCase{"sizeWindow", 1},
+                    CapabilityCase{"offline", 0}, CapabilityCase{"openFileSelector", 0},
+                    CapabilityCase{"closeFileSelector", 0}, CapabilityCase{"startStopProcess", 0},
+                    CapabilityCase{"shellCategory", 1}, CapabilityCase{"sendVstMidiEventFlagIsRealtime", 1},
+                    // Capabilities that other hosts claim.
+                    CapabilityCase{"supplyIdle", 0}, CapabilityCase{"asyncProcessing", 0},
+                    CapabilityCase{"editFile", 0}, CapabilityCase{"hasCockosExtensions", 0}),
+    host_tests::nameOfCase<CapabilityCase>);
+
+// ---- audioMasterGetLanguage (38)
+
+struct LocaleCase {
+  const char* name;
+  const char* identifier;
+  VstInt32 language;
+};
+
+class HostLanguage : public testing::TestWithParam<LocaleCase> {
+ protected:
+  doubles::RecordingCoreFoundation core_foundation;
+};
+
+TEST_P(HostLanguage, IsDecidedByTheFirstTwoCharacters) {
+  core_foundation.setLocale(GetParam().identifier);
+  EXPECT_EQ(ask(38), GetParam().language);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Of, HostLanguage,
+    testing::Values(LocaleCase{"English", "en", 1}, LocaleCase{"German", "de", 2},
+                    LocaleCase{"SwissGerman", "de_CH", 2}, LocaleCase{"CanadianFrench", "fr_CA", 3},
+                    LocaleCase{"Italian", "it_IT", 4}, LocaleCase{"MexicanSpanish", "es_MX", 5},
+                    LocaleCase{"Japanese", "ja_JP", 6}, LocaleCase{"BrazilianPortuguese", "pt_BR", 1},
+                    LocaleCase{"Danish", "da_DK", 1}, LocaleCase{"LowerSorbian", "dsb", 1},
+                    LocaleCase{"ThreeLettersBeginningWithTwo", "den", 2}, LocaleCase{"UpperCase", "DE", 1},
+                    LocaleCase{"LeadingBlank", " de", 1}, LocaleCase{"OneLetter", "d", 1},
+                    LocaleCase{"Nothing", "", 1}),
+    host_tests::nameOfCase<LocaleCase>);
+
+class HostLanguageOfJapan : public testing::Test {
+ protected:
+  HostLanguageOfJapan() { core_foundation.setLocale("ja_JP"); }
+  doubles::RecordingCoreFoundation core_foundation;
+};
+
+// On purpose: the locale is not released.
+TEST_F(HostLanguageOfJapan, IsReadFromALocaleThatIsCopiedAndNotReleased) {
+  EXPECT_EQ(ask(38), 6);
+  EXPECT_THAT(core_foundation.calls(),
+              ElementsAre("CFLocaleCopyCurrent() -> locale", "CFLocaleGetIdentifier(\"ja_JP\") -> string",
+                          "CFStringGetCString(\"ja_JP\", 255 bytes, ASCII) -> true"));
+  EXPECT_THAT(core_foundation.aliveObjects(), ElementsAre("locale \"ja_JP\""));
+  core_foundation.setLocale("de_CH");
+  EXPECT_EQ(ask(38), 2);  // The locale is read anew each time.
+}
+
+TEST_F(HostLanguageOfJapan, IsEnglishIfTheIdentifierCannotBeConverted) {
+  core_foundation.setLocale("ja_" + std::string(251, 'x'));  // 254 characters and the zero byte
+  EXPECT_EQ(ask(38), 6);
+  core_foundation.setLocale("ja_" + std::string(252, 'x'));
+  EXPECT_EQ(ask(38), 1);
+  core_foundation.setLocale("ja_\xC3\xA9");
+  EXPECT_EQ(ask(38), 1);
+  core_foundation.setLocale("ja_JP");
+  core_foundation.failStep(doubles::Step::kGetCString);
+  EXPECT_EQ(ask(38), 1);
+}
+
+// ---- Identity
+
+TEST(PackedVersion, JoinsThePartsByOr) {
+  EXPECT_EQ(packedVersion({1, 2, 3}), 0x01020003);
+  EXPECT_EQ(packedVersion({127, 255, 65535}), 2147483647);
+  // A part that is too large does not carry into the next one.
+  EXPECT_EQ(packedVersion({0, 1, 65536}), 65536);
+  EXPECT_EQ(packedVersion({1, 256, 0}), 16777216);
 }
 
 }  // namespace

@@ -5,12 +5,20 @@
 #include <cstdio>
 
 namespace preset_bytes {
+namespace {
+
+std::string name28(std::string name) {
+  name.resize(28);
+  return name;
+}
+
+}  // namespace
 
 std::string hex(const std::string& digits) {
   std::string bytes;
   std::string pair;
   for (const char digit : digits) {
-    if (digit == ' ' || digit == '\n') continue;
+    if (digit == ' ') continue;
     pair += digit;
     if (pair.size() < 2) continue;
     bytes += static_cast<char>(std::stoi(pair, nullptr, 16));
@@ -36,15 +44,8 @@ std::string word(std::int64_t number) {
   return bytes;
 }
 
-std::string name28(const std::string& name) {
-  std::string field = name;
-  field.resize(28);
-  return field;
-}
-
-std::string header(const std::string& formMagic, std::int64_t count, std::int64_t formatVersion,
-                   const std::string& chunkMagic) {
-  return chunkMagic + word(0) + formMagic + word(formatVersion) + "Demo" + word(1) + word(count);
+std::string header(const std::string& formMagic, std::int64_t count, std::int64_t formatVersion) {
+  return "CcnK" + word(0) + formMagic + word(formatVersion) + "Demo" + word(1) + word(count);
 }
 
 std::string program(const std::string& name, const std::vector<std::uint32_t>& values) {

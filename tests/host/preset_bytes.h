@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
-// Preset and bank data as a test writes it down: byte by byte, from texts and numbers in reading order.
-//
-// Nothing here uses the program's own offsets or swaps.
+// Preset and bank data as a test writes it down: byte by byte, from texts and numbers in reading order. Uses
+// none of the program's own offsets and swaps.
 #pragma once
 
 #include <cstddef>
@@ -11,21 +10,17 @@
 
 namespace preset_bytes {
 
-/// The bytes of hex digits; blanks and line ends between them do not count.
+/// The bytes of hex digits; blanks between them do not count.
 std::string hex(const std::string& digits);
 
-/// The same the other way round, in groups of four bytes: what tests compare, so that a failure can be read.
+/// Bytes as hex digits in groups of four bytes. Tests compare these, so that a failure is readable.
 std::string inHex(const std::string& bytes);
 
 /// Four bytes, the most significant first.
 std::string word(std::int64_t number);
 
-/// A name in its 28 bytes, the rest of them zero.
-std::string name28(const std::string& name);
-
 /// The first 28 bytes of every form, as the plug-in 'Demo' of version 1 writes them.
-std::string header(const std::string& formMagic, std::int64_t count, std::int64_t formatVersion = 1,
-                   const std::string& chunkMagic = "CcnK");
+std::string header(const std::string& formMagic, std::int64_t count, std::int64_t formatVersion = 1);
 
 /// A program with parameter values ('FxCk'), the values given as their 32 bits.
 std::string program(const std::string& name, const std::vector<std::uint32_t>& values);
@@ -33,8 +28,8 @@ std::string program(const std::string& name, const std::vector<std::uint32_t>& v
 /// A bank of such programs ('FxBk').
 std::string bank(const std::vector<std::string>& programs);
 
-/// A program ('FPCh') or a bank ('FBCh') with a chunk, which claims a size of its own if `claimedSize` is
-/// given.
+/// A program ('FPCh') or a bank ('FBCh') with a chunk. `claimedSize` is the size field, if it is not the size
+/// of the chunk.
 std::string programChunk(const std::string& name, const std::string& chunk);
 std::string programChunk(const std::string& name, const std::string& chunk, std::int64_t claimedSize);
 std::string bankChunk(const std::string& chunk);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The fixture of the preset tests, and the conversations that they are made of.
+// The fixture of the preset tests, and the requests that saving and loading consist of.
 #include "tests/host/preset_fixture.h"
 
 namespace preset_tests {
@@ -16,8 +16,6 @@ Requests inOrder(const std::vector<Requests>& parts) {
 Requests asksProgram() { return {request(effGetProgram)}; }
 Requests asksName() { return {request(effGetProgramName), request(effGetProgram)}; }
 Requests selects(VstIntPtr index) { return {request(effGetProgram), doubles::setProgram(index)}; }
-Requests finds() { return asksProgram(); }
-
 Requests renames(const std::string& sent) { return inOrder({keepsName(), {doubles::setProgramName(sent)}}); }
 Requests keepsName() { return inOrder({asksProgram(), asksProgram(), asksName()}); }
 
@@ -34,19 +32,6 @@ Requests sets(VstInt32 parameter, float value) {
 PresetTest::PresetTest() {
   effect.aeffect.uniqueID = 0x44656D6F;
   effect.aeffect.version = 1;
-}
-
-PresetTest::~PresetTest() {
-  effect.onRequest = nullptr;  // What it refers to is gone by now, and closing is a request.
-}
-
-void PresetTest::open() {
-  plugin.willCreate(effect);
-  NiduCOM::i_ptr<VSTPluginLoader> loader;
-  loader.reset(new VSTPluginLoader(VST_DLL_Info("/test.vst", "test")), NiduCOM::AddRef::kAdopt);
-  wrapper.reset(VSTWrapper::New(loader, VST_ChildSpec(), nullptr));
-  ASSERT_NE(wrapper, nullptr);
-  effect.forget();
 }
 
 void PresetTest::openWithChunks() {

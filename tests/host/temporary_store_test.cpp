@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: MIT
-// VSTWrapper::createTempParameterStore and restoreFromTempParameterStore: bytes and conversation.
+// VSTWrapper::createTempParameterStore and restoreFromTempParameterStore: bytes and requests.
 #include <climits>
 #include <cstring>
 #include <string>
 
+#include "tests/shared/thrown.h"
 #include "tests/shared/wrapper_fixture.h"
 
 namespace {
@@ -40,6 +41,7 @@ class VSTWrapperTempParameterStore : public host_tests::WrapperTest {
     AutoBuffer<char> store;
     store.setSize(static_cast<int>(content.size()));
     std::memcpy(store.data(), content.data(), content.size());
+    effect.forget();
     wrapper->restoreFromTempParameterStore(store);
   }
 };
@@ -48,34 +50,31 @@ TEST_F(VSTWrapperTempParameterStore, HoldsTheNameAndTheValuesInMachineByteOrder)
   EXPECT_EQ(created(), nameField("Loud") + bytes("\x00\x00\x80\x3F"
                                                  "\x00\x00\x00\xBF"
                                                  "\xCD\xCC\xCC\x3D"));
-}
-
-TEST_F(VSTWrapperTempParameterStore, IsMadeInThisConversation) {
-  created();
   EXPECT_THAT(effect.requests(), ElementsAre(request(effGetProgramName), request(effGetProgram),
                                              getParameterOf(0), getParameterOf(1), getParameterOf(2)));
-}
-
-TEST_F(VSTWrapperTempParameterStore, StoresTheNameInTheWrapperToo) {
-  created();
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("", "Loud"));
 }
 
 TEST_F(VSTWrapperTempParameterStore, HoldsTheFirst63CharactersOfTheName) {
   effect.setParameters({});
-  for (const std::size_t length : {0u, 62u, 63u, 64u, 65u, 200u}) {
-    effect.setText(effGetProgramName, std::string(length, 'n'));
+  for (const std::size_t length : {0u, 63u, 64u, 256u}) {
+    effect.setUnterminatedText(effGetProgramName, length, 'n');
     EXPECT_EQ(created(), nameField(std::string(std::min<std::size_t>(length, 63), 'n'))) << length;
   }
-  effect.setUnterminatedText(effGetProgramName, 256, 'n');
-  EXPECT_EQ(created(), std::string(63, 'n') + '\0');
 }
 
-TEST_F(VSTWrapperTempParameterStore, Is64BytesForAPluginWithoutParameters) {
-  for (const VstInt32 count : {0, -1, INT_MIN}) {
+// On purpose: a negative count is used as it is. 4 x -16 + 64 is 0, for which there still is the name.
+TEST_F(VSTWrapperTempParameterStore, HasNoValuesForNegativeCountsAndIsMinusOneBelowASizeOfZero) {
+  for (const VstInt32 count : {0, -1, -16}) {
     effect.aeffect.numParams = count;
-    EXPECT_EQ(created(), nameField("Loud"));
+    EXPECT_EQ(created(), nameField("Loud")) << count;
   }
+  effect.forget();
+  for (const VstInt32 count : {-17, INT_MIN, 536870896, INT_MAX}) {
+    effect.aeffect.numParams = count;
+    EXPECT_EQ(thrownInt([this] { created(); }), -1) << count;
+  }
+  EXPECT_THAT(effect.requests(), IsEmpty());
 }
 
 TEST_F(VSTWrapperTempParameterStore, HoldsZeroWhereThePluginThrows) {
@@ -87,100 +86,48 @@ TEST_F(VSTWrapperTempParameterStore, HoldsZeroWhereThePluginThrows) {
                                                  "\xCD\xCC\xCC\x3D"));
 }
 
-TEST_F(VSTWrapperTempParameterStore, ReplacesWhatTheBufferHeldBefore) {
-  effect.setUnterminatedText(effGetProgramName, 63);
-  effect.aeffect.numParams = 200;
-  AutoBuffer<char> store;
-  wrapper->createTempParameterStore(store);
-  ASSERT_EQ(store.size(), 864);
-  effect.setText(effGetProgramName, "Loud");
-  effect.aeffect.numParams = 3;
-  wrapper->createTempParameterStore(store);
-  ASSERT_EQ(store.size(), 76);
-  EXPECT_STREQ(store.data(), "Loud");
-  EXPECT_EQ(std::string(store.data() + 4, 60), std::string(60, '\0'));
+TEST_F(VSTWrapperTempParameterStore, HoldsZeroWhereTheParametersAreGoneMeanwhile) {
+  effect.onRequest = [this](const Request& request) {
+    if (request == getParameterOf(0)) effect.aeffect.numParams = 1;
+  };
+  EXPECT_EQ(created(), nameField("Loud") + bytes("\x00\x00\x80\x3F") + std::string(8, '\0'));
 }
 
-// ---- Restoring ----
+// ---- Restoring
 
 TEST_F(VSTWrapperTempParameterStore, IsRestoredNameFirstAndThenTheValuesThatDiffer) {
   restore(nameField("Edited") + bytes("\x00\x00\x00\x3F"     // 0.5
-                                      "\x00\x00\x00\xBF"     // -0.5, which it holds
+                                      "\x00\x00\x00\xBF"     // -0.5, the present value
                                       "\x00\x00\x80\x3F"));  // 1.0
   EXPECT_THAT(
       effect.requests(),
       ElementsAre(request(effGetProgram), request(effGetProgram), request(effGetProgramName),
                   request(effGetProgram), setProgramName("Edited"), getParameterOf(0),
                   setParameterTo(0, 0.5f), getParameterOf(1), getParameterOf(2), setParameterTo(2, 1.0f)));
-  EXPECT_EQ(effect.program(1).name, "Edited");
-  EXPECT_THAT(effect.program(1).parameters, ElementsAre(0.5f, -0.5f, 1.0f));
-  EXPECT_EQ(effect.program(0).name, "Soft");
 }
 
-TEST_F(VSTWrapperTempParameterStore, ChangesNothingWhereNothingChangedSince) {
-  const std::string content = created();
-  effect.forget();
-  restore(content);
-  EXPECT_THAT(effect.requests(),
-              ElementsAre(request(effGetProgram), request(effGetProgram), request(effGetProgramName),
-                          request(effGetProgram), getParameterOf(0), getParameterOf(1), getParameterOf(2)));
-}
-
-TEST_F(VSTWrapperTempParameterStore, RestoresIntoTheProgramThatIsCurrentNow) {
-  const std::string content = created();
-  effect.currentProgram = 0;
-  restore(content);
-  EXPECT_EQ(effect.program(0).name, "Loud");
-  EXPECT_THAT(effect.program(0).parameters, ElementsAre(1.0f, -0.5f, 0.1f));
-}
-
-TEST_F(VSTWrapperTempParameterStore, RestoresThe24CharactersOfANameThatCanBeSent) {
-  restore(nameField("123456789.123456789.123456789.") + std::string(12, '\0'));
+TEST_F(VSTWrapperTempParameterStore, SendsTheFirst24CharactersOfANameThatEndsAtItsZeroByte) {
+  restore(nameField("123456789.123456789.123456789."));
   EXPECT_THAT(effect.requestsOf(effSetProgramName), ElementsAre(setProgramName("123456789.123456789.1234")));
-}
-
-TEST_F(VSTWrapperTempParameterStore, ReadsTheNameUpToItsZeroByte) {
-  std::string field = nameField("Loud");
-  field[10] = 'x';
-  restore(field + std::string(12, '\0'));
+  std::string field = nameField("123456789.123456789.1234");
+  field[30] = 'x';
+  restore(field);
   EXPECT_THAT(effect.requestsOf(effSetProgramName), IsEmpty());
 }
 
-// On purpose: a store of another number of parameters is not refused.
-TEST_F(VSTWrapperTempParameterStore, RestoresNoMoreValuesThanThereAreParametersNow) {
+// On purpose: a store with another number of parameters is not refused.
+TEST_F(VSTWrapperTempParameterStore, RestoresAsManyValuesAsBothItAndThePluginHave) {
   const std::string content = created();
-  effect.aeffect.numParams = 1;
-  effect.forget();
-  restore(content);
-  EXPECT_THAT(effect.parameterReads(), ElementsAre(getParameterOf(0)));
-  effect.aeffect.numParams = -1;
-  effect.forget();
-  restore(content);
-  EXPECT_THAT(effect.parameterReads(), IsEmpty());
-}
-
-TEST_F(VSTWrapperTempParameterStore, RestoresNoMoreValuesThanItHolds) {
-  const std::string content = created();
-  effect.aeffect.numParams = 1000;
-  effect.forget();
-  restore(content);
-  EXPECT_THAT(effect.parameterReads(), ElementsAre(getParameterOf(0), getParameterOf(1), getParameterOf(2)));
-}
-
-TEST_F(VSTWrapperTempParameterStore, RestoresNoNameInAPluginWithoutPrograms) {
-  effect.aeffect.numPrograms = 0;
-  restore(nameField("Edited") + std::string(12, '\0'));
-  EXPECT_THAT(effect.requestsOf(effSetProgramName), IsEmpty());
-  EXPECT_THAT(effect.parameterWrites(),
-              ElementsAre(setParameterTo(0, 0.0f), setParameterTo(1, 0.0f), setParameterTo(2, 0.0f)));
-}
-
-TEST_F(VSTWrapperTempParameterStore, GoesOnWithTheNextValueWhereThePluginThrows) {
-  effect.onRequest = [](const Request& request) {
-    if (request.kind == Request::Kind::kSetParameter && request.index == 0) throw 7;
-  };
-  restore(nameField("Loud") + std::string(12, '\0'));
-  EXPECT_THAT(effect.program(1).parameters, ElementsAre(1.0f, 0.0f, 0.0f));
+  struct {
+    VstInt32 parameters;
+    std::vector<Request> reads;
+  } const rows[] = {
+      {1, {getParameterOf(0)}}, {-1, {}}, {1000, {getParameterOf(0), getParameterOf(1), getParameterOf(2)}}};
+  for (const auto& row : rows) {
+    effect.aeffect.numParams = row.parameters;
+    restore(content);
+    EXPECT_EQ(effect.parameterReads(), row.reads);
+  }
 }
 
 }  // namespace

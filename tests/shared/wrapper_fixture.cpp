@@ -5,6 +5,13 @@
 #include <stdexcept>
 
 namespace host_tests {
+namespace {
+
+struct NotAnException {
+  int code;
+};
+
+}  // namespace
 
 const std::vector<Thrown>& everyThrown() {
   static const std::vector<Thrown> all = {
@@ -22,7 +29,8 @@ WrapperTest::WrapperTest() {
 }
 
 WrapperTest::~WrapperTest() {
-  effect.onRequest = nullptr;  // What it refers to is gone by now, and closing is a request.
+  // The hook refers to variables of the test, which no longer exist; closing is a request too.
+  effect.onRequest = nullptr;
 }
 
 std::unique_ptr<VSTWrapper> WrapperTest::create(const VST_ChildSpec& child, KelVSTSupportEffect* support) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A wrapper around the recording instance, for tests of its conversation with the plug-in.
+// A wrapper around the recording instance, for tests of what it asks the plug-in.
 //
 //   effect.setParameters({0.25f});
 //   open();
@@ -22,12 +22,7 @@
 
 namespace host_tests {
 
-/// What a plug-in throws that is no std::exception and no number.
-struct NotAnException {
-  int code;
-};
-
-/// One kind of thing that a plug-in throws.
+/// A type of exception that a plug-in may throw.
 struct Thrown {
   const char* name;
   void (*raise)();
@@ -36,20 +31,24 @@ struct Thrown {
 /// An int, a std::exception, a struct, a text.
 const std::vector<Thrown>& everyThrown();
 
+constexpr auto isWrite = [](const doubles::Request& request) {
+  return request.kind == doubles::Request::Kind::kSetParameter;
+};
+
 class WrapperTest : public testing::Test {
  protected:
   /// Loads the module that holds the plug-in.
   WrapperTest();
   ~WrapperTest() override;
 
-  /// VSTWrapper::New() with this module, as it is.
+  /// VSTWrapper::New() with this module.
   std::unique_ptr<VSTWrapper> create(const VST_ChildSpec& child = VST_ChildSpec(),
                                      KelVSTSupportEffect* support = nullptr);
 
-  /// Creates the wrapper around `effect` and forgets what was asked on the way.
+  /// Creates the wrapper around `effect` and forgets the requests made meanwhile.
   void open(const VST_ChildSpec& child = VST_ChildSpec());
 
-  /// Deletes the wrapper. Not by its smart pointer, which lets no exception pass.
+  /// Deletes the wrapper, and not through the smart pointer, which lets no exception pass.
   void close();
 
   /// From now on: throws the int 7 out of every request with this opcode.
