@@ -374,6 +374,8 @@ def rows_of_combinations():
         yield row(Kind("close_stdout+null_store", MUTE), PLACE_OF[place], end=End(steps, "", 7, "crashed at {}", ""))
         for kind in COMBINATIONS:
             yield row(kind, PLACE_OF[place])
+    # The size of a null chunk is taken as it is, and the copy is made from the null pointer.
+    yield Row("faulty/null_chunk@entry", "faulty", "null_chunk", "entry", 9, crash_at(5))
     # The forced unwinding passes through the handler of the phase, which must not end it.
     not_rethrown = "FATAL: exception not rethrown\n"
     yield Row("faulty/leave_the_thread@entry", "faulty", "leave_the_thread", "entry", 9, crash_at(0, not_rethrown))
