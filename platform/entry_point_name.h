@@ -4,6 +4,6 @@
 
 #include "platform/core_foundation.h"
 
-/// The third and last name to look for, after those that all systems share; null when this system has no name
-/// of its own. A constant string, owned by nobody.
+/// The name to look for after those that all systems share: "main" on Linux, null (no such name) on macOS. A
+/// constant string, owned by nobody.
 CFStringRef systemEntryPointName();

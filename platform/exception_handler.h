@@ -1,19 +1,19 @@
 // SPDX-License-Identifier: MIT
-// The system's handler for exceptions that nobody caught, and the pool and delegate that arm it.
+// The system's handler for exceptions that nobody caught, and the pool and delegate that belong to it.
 //
-// On macOS: Foundation's NSAutoreleasePool and NSExceptionHandler with an Objective-C++ delegate. On Linux:
-// the same in C++, where the exceptions are the system exceptions that arrive as SIGILL, SIGFPE, SIGTRAP and
-// SIGSYS. Each one reaches the delegate three times: shall it be displayed (no), logged (yes, one line on
-// standard error), handled (leaves the process).
+// On macOS: Foundation's NSAutoreleasePool and NSExceptionHandler. The handler asks its Objective-C++ delegate
+// whether to display an exception (no), to log it (yes), and to handle it (the process exits).
+// On Linux: a handler of the system exceptions that arrive as SIGILL, SIGFPE, SIGTRAP and SIGSYS. While there is
+// a delegate, it logs each with one line on standard error and the process exits. The pool is empty.
 //
-// Ownership: what a make function returns is released once, by releasing it.
-// Threads:   make and release on the main thread; the delegate may be asked on any.
+// Ownership: the caller releases what a make function returns, once, with the release function below it.
+// Threads:   make and release on the main thread. An exception is handled on the thread that it occurs on.
 #pragma once
 
-/// What the delegate does at two points of its life.
+/// What the delegate calls.
 struct ExceptionDelegateActions {
-  void (*installSignalGuard)();  ///< At the end of its init.
-  void (*exitProcess)();         ///< When it is asked to handle an exception. Does not return.
+  void (*installSignalGuard)();  ///< Called once, at the end of its initialisation.
+  void (*exitProcess)();         ///< Called to handle an exception. Does not return.
 };
 
 struct AutoreleasePool;
@@ -23,8 +23,8 @@ struct ExceptionDelegate;
 AutoreleasePool* makeAutoreleasePool();
 void releaseAutoreleasePool(AutoreleasePool* pool);
 
-/// A delegate (nidu_VST_Support_ExceptionHandlerDelegate) that is the default exception handler's from now
-/// on, with all ten log and handle bits of its mask set (1023).
+/// Makes a delegate and gives it to the default exception handler. On macOS it is a
+/// nidu_VST_Support_ExceptionHandlerDelegate, and all ten log and handle bits of the handler's mask are set (1023).
 ExceptionDelegate* makeExceptionDelegate(const ExceptionDelegateActions& actions);
-/// Detaches it from the handler.
+/// Takes the delegate away from the handler: the system then treats exceptions as it does by default.
 void releaseExceptionDelegate(ExceptionDelegate* delegate);

@@ -6,7 +6,7 @@
 //
 // Order:     a token given while threads wait goes to the one that has waited longest, and to no other: the
 //            thread that signals cannot take it back.
-// Ownership: who creates a semaphore destroys it. Nobody may start to use it after that.
+// Ownership: whoever creates a semaphore destroys it. No call may begin to use it after that.
 // Threads:   any. A signal happens before the return of the wait that receives its token.
 #pragma once
 
@@ -37,8 +37,8 @@ extern "C" {
 task_t mach_task_self();
 
 /// Creates a semaphore that holds `value` tokens (0 or more). KERN_INVALID_ARGUMENT for another task than
-/// mach_task_self(), another policy than SYNC_POLICY_FIFO or a negative value; KERN_RESOURCE_SHORTAGE
-/// without memory. Every failure sets *semaphore to null.
+/// mach_task_self(), another policy than SYNC_POLICY_FIFO or a negative value; KERN_RESOURCE_SHORTAGE when
+/// memory runs out. Every failure sets *semaphore to null.
 kern_return_t semaphore_create(task_t task, semaphore_t* semaphore, int policy, int value);
 
 /// Destroys a semaphore. Threads that wait on it wake up with KERN_TERMINATED. KERN_INVALID_ARGUMENT for a
@@ -50,7 +50,8 @@ kern_return_t semaphore_destroy(task_t task, semaphore_t semaphore);
 /// semaphore was destroyed meanwhile, KERN_INVALID_ARGUMENT for a null semaphore.
 kern_return_t semaphore_wait(semaphore_t semaphore);
 
-/// Gives one token: to the thread that has waited longest, or to a later wait. Never sleeps for long.
+/// Gives one token: to the thread that has waited longest, or to a later wait. Does not wait for other threads
+/// beyond a short lock.
 /// KERN_INVALID_ARGUMENT for a null semaphore.
 kern_return_t semaphore_signal(semaphore_t semaphore);
 

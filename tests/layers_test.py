@@ -171,10 +171,10 @@ class Faults(unittest.TestCase):
         self.assert_fault("host/a.cpp", "#include HEADER", "host/a.cpp:1: #include HEADER cannot be read")
 
     def test_the_sources_of_one_system_are_for_platform_alone(self):
-        text = '#include "platform/linux/utf8.h"'
+        text = '#include "platform/linux/file_kind.h"'
         self.assert_fine("platform/linux/a.cpp", text)
         self.assert_fault("loader/a.cpp", text,
-                          'loader/a.cpp:1: "platform/linux/utf8.h" belongs to one operating system')
+                          'loader/a.cpp:1: "platform/linux/file_kind.h" belongs to one operating system')
 
     def test_only_platform_asks_for_an_operating_system(self):
         lines = {"#ifdef __linux__": "__linux__", "#ifndef __APPLE__": "__APPLE__", "#if defined(_WIN32)": "_WIN32",

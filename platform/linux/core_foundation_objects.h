@@ -1,59 +1,73 @@
 // SPDX-License-Identifier: MIT
-// The objects behind CoreFoundation's references: one counted base and the two kinds that several sources
-// look into.
-//
-// Every object begins with its CountedObject, so that a CFTypeRef of any kind can be counted.
+// What the Linux sources behind platform/core_foundation.h share: their objects, the check for UTF-8, and the
+// line on standard error.
 #pragma once
 
-#include <atomic>
-#include <limits>
+#include <map>
+#include <memory>
+#include <mutex>
 #include <string>
+#include <string_view>
 #include <utility>
 
 #include "platform/core_foundation.h"
 
 namespace core_foundation {
 
-/// Begins with one reference, which belongs to the maker; the last release deletes it. Any thread.
-class CountedObject {
+/// The base of every object, at its front, so that a CFTypeRef of any kind can be released. No function of the
+/// header adds a reference: an object has one owner, and its release deletes the object.
+class Object {
  public:
-  enum class Lifetime { kCounted, kConstant };
+  /// kConstant: owned by nobody, and left alone by CFRelease.
+  enum class Lifetime { kOwned, kConstant };
 
-  CountedObject(const CountedObject&) = delete;
-  CountedObject& operator=(const CountedObject&) = delete;
-  virtual ~CountedObject() = default;
+  Object(const Object&) = delete;
+  Object& operator=(const Object&) = delete;
+  virtual ~Object() = default;
 
-  void retain() const {
-    if (lifetime == Lifetime::kCounted) references.fetch_add(1, std::memory_order_relaxed);
-  }
-  void release() const {
-    if (lifetime == Lifetime::kCounted && references.fetch_sub(1, std::memory_order_acq_rel) == 1)
-      delete this;
-  }
-  [[nodiscard]] CFIndex retainCount() const {
-    return lifetime == Lifetime::kCounted ? references.load() : std::numeric_limits<CFIndex>::max();
-  }
+  const Lifetime lifetime;  // NOLINT(misc-non-private-member-variables-in-classes): never changes
 
  protected:
-  explicit CountedObject(Lifetime howLong = Lifetime::kCounted) : lifetime(howLong) {}
+  explicit Object(Lifetime howLong) : lifetime(howLong) {}
+};
+
+/// Constant objects by the text that they are made from: equal texts give the same object. Never destroyed,
+/// because code that runs while the process ends may still ask. Any thread.
+template <typename Constant>
+class ConstantTable {
+ public:
+  /// The object for `text`, made on the first call with it.
+  const Constant* intern(const std::string& text) {
+    const std::lock_guard<std::mutex> guard(lock);
+    std::unique_ptr<const Constant>& object = objects[text];
+    if (!object) object = std::make_unique<const Constant>(text, Object::Lifetime::kConstant);
+    return object.get();
+  }
 
  private:
-  const Lifetime lifetime;
-  mutable std::atomic<CFIndex> references{1};
+  std::mutex lock;
+  std::map<std::string, std::unique_ptr<const Constant>> objects;
 };
+
+/// True when `bytes` are whole, shortest-form UTF-8 sequences of U+0000 to U+10FFFF without surrogates.
+bool isValidUtf8(std::string_view bytes);
+
+/// Writes "vsttorture: ", `reason` and a line end to standard error, as one line of valid UTF-8: control
+/// characters become blanks, and in a text that is not UTF-8 every byte above 0x7F becomes \xNN.
+void logFailure(std::string_view reason);
 
 }  // namespace core_foundation
 
 // NOLINTBEGIN(bugprone-reserved-identifier,misc-non-private-member-variables-in-classes): the names that the
 // references point to; records whose members never change
-struct __CFString final : core_foundation::CountedObject {
-  explicit __CFString(std::string utf8, Lifetime howLong = Lifetime::kCounted)
-      : CountedObject(howLong), text(std::move(utf8)) {}
+struct __CFString final : core_foundation::Object {
+  explicit __CFString(std::string utf8, Lifetime howLong = Lifetime::kOwned)
+      : Object(howLong), text(std::move(utf8)) {}
   const std::string text;  ///< Valid UTF-8.
 };
 
-struct __CFURL final : core_foundation::CountedObject {
-  explicit __CFURL(std::string absolutePath) : path(std::move(absolutePath)) {}
+struct __CFURL final : core_foundation::Object {
+  explicit __CFURL(std::string absolutePath) : Object(Lifetime::kOwned), path(std::move(absolutePath)) {}
   const std::string path;  ///< Absolute, not ending with a slash except for "/".
 };
 // NOLINTEND(bugprone-reserved-identifier,misc-non-private-member-variables-in-classes)

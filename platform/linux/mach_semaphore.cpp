@@ -1,17 +1,17 @@
 // SPDX-License-Identifier: MIT
 // Mach semaphores on futexes.
 //
-// Tokens are handed over, not put down: a signal takes the first waiter out of the queue and writes its
-// outcome into a word on that waiter's stack. A plain POSIX semaphore would let the signalling thread take
-// its token back at once, thousands of times in a row, while the other one starves.
+// A signal hands its token directly to a waiter: it takes the first waiter out of the queue and writes the
+// outcome into a word on that waiter's stack. With a plain POSIX semaphore the signalling thread could take its
+// token back at once, thousands of times in a row, while the waiter starves.
 //
-// Lifetimes decide the shape of this file:
-// - One lock guards the queues of all semaphores. It outlives each of them, so a thread that was handed the
-//   last token may destroy the semaphore while the thread that signalled is still on its way out, and a
-//   waiter that was interrupted may ask for its outcome after the semaphore is gone.
-// - From the moment an outcome is written, the waiter may return and its word may vanish. The wake that
-//   follows passes the address to the kernel as a mere number. If something else lives there by then, that
-//   is woken once for nothing, which each user of a futex has to expect anyway.
+// Lifetimes:
+// - One lock guards the queues of all semaphores, and it outlives them. So a thread that received the last token
+//   may destroy the semaphore while the signalling thread has not yet returned from semaphore_signal(), and an
+//   interrupted waiter may look at its outcome after the semaphore is gone.
+// - As soon as an outcome is written, the waiter may return, and its word on the stack may be reused. The wake
+//   that follows passes only the word's address to the kernel. If another futex is at that address by then, it
+//   is woken without cause, which every user of a futex has to expect anyway.
 #include "platform/mach_semaphore.h"
 
 #include <atomic>
@@ -30,8 +30,8 @@ constexpr task_t kThisTask = 1;
 
 enum Outcome : std::uint32_t { kStillWaiting, kTokenReceived, kSemaphoreDestroyed };
 
-/// One sleeping thread; lives on its stack. `outcome` leaves kStillWaiting once, under the lock, at the
-/// moment the waiter leaves the queue by somebody else's hand.
+/// One sleeping thread; lives on its stack. `outcome` changes once, under the lock, by the thread that takes the
+/// waiter out of the queue.
 struct Waiter {
   std::atomic<std::uint32_t> outcome{kStillWaiting};
   Waiter* next = nullptr;
@@ -39,15 +39,15 @@ struct Waiter {
 
 std::mutex queuesLock;
 
-/// Sleeps while `word` holds kStillWaiting. False when a signal handler cut the sleep short; true says
-/// nothing about the word.
+/// Sleeps while `word` holds kStillWaiting. False when a signal handler ended the sleep; after true the word may
+/// hold any outcome.
 bool sleepOn(const std::atomic<std::uint32_t>& word) {
   const long result = syscall(SYS_futex, &word, FUTEX_WAIT_PRIVATE, kStillWaiting, nullptr, nullptr, 0);
   return result == 0 || errno != EINTR;
 }
 
-/// Ends the wait of a waiter that is out of its queue. It may be gone when this returns. Needs the lock;
-/// the wake that must follow does not.
+/// Ends the wait of a waiter that was taken out of its queue. The waiter may no longer exist when this returns.
+/// Call it with the lock held, then wake() with the result; the wake needs no lock.
 const void* settle(Waiter& waiter, Outcome outcome) {
   waiter.outcome.store(outcome, std::memory_order_release);
   return &waiter.outcome;
@@ -65,7 +65,7 @@ struct MachSemaphore {
   int tokens;
   Waiter* first = nullptr;  // in order of arrival; null while there are tokens
 
-  /// The link that points to `waiter`; for null the one at the end, where the next one is put.
+  /// The link that points to `waiter`; for null the one at the end of the queue.
   Waiter** linkTo(const Waiter* waiter) {
     Waiter** link = &first;
     while (*link != waiter) link = &(*link)->next;
@@ -111,8 +111,8 @@ kern_return_t semaphore_wait(semaphore_t semaphore) {
     if (outcome != kStillWaiting) return resultOf(outcome);
     if (sleepOn(me.outcome)) continue;
 
-    // Interrupted. A token that came meanwhile must not be lost, so the outcome has the last word; while
-    // there is none, the semaphore is alive and this waiter is in its queue.
+    // Interrupted. A token that came meanwhile must not be lost, so the outcome is read once more, under the
+    // lock. Without an outcome the semaphore still exists and this waiter is in its queue.
     const std::lock_guard<std::mutex> guard(queuesLock);
     if (me.outcome.load(std::memory_order_acquire) != kStillWaiting) continue;
     *semaphore->linkTo(&me) = me.next;

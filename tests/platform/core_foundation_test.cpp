@@ -1,10 +1,7 @@
 // SPDX-License-Identifier: MIT
-// Strings, counts, URLs and the current locale.
+// Strings, URLs and the current locale.
 #include <filesystem>
-#include <limits>
 #include <string>
-#include <thread>
-#include <vector>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -12,232 +9,168 @@
 
 #include "platform/core_foundation.h"
 #include "platform/entry_point_name.h"
-#include "tests/platform/temporary_folder.h"
+#include "tests/platform/bundle_files.h"
 
 namespace {
 
 using testing::internal::CaptureStderr;
 using testing::internal::GetCapturedStderr;
 
-CFStringRef makeUtf8(const std::string& text) {
-  return CFStringCreateWithCString(nullptr, text.c_str(), 0x08000100);
-}
+constexpr CFStringEncoding kUtf8 = 0x08000100;
+constexpr CFStringEncoding kAscii = 0x0600;
+constexpr CFStringEncoding kMacRoman = 0;
 
-std::string textOf(CFStringRef string, CFStringEncoding encoding = 0x08000100) {
+std::string textOf(CFStringRef string, CFStringEncoding encoding = kUtf8) {
   char buffer[64];
   return CFStringGetCString(string, buffer, sizeof buffer, encoding) ? buffer : "(no text)";
 }
 
-struct Utf8Case {
+struct Text {
   const char* name;
+  CFStringEncoding encoding;
   const char* bytes;
-  bool valid;
+  std::string failure;  // The line on standard error; "" for a text that is valid.
 };
-class CFStringCreateWithCStringUtf8 : public testing::TestWithParam<Utf8Case> {};
+class CFStringCreateWithCStringTest : public testing::TestWithParam<Text> {};
 
-TEST_P(CFStringCreateWithCStringUtf8, TakesValidTextOnlyAndTellsWhy) {
+TEST_P(CFStringCreateWithCStringTest, TakesOnlyValidTextAndReportsOther) {
+  const Text& row = GetParam();
   CaptureStderr();
-  const CFStringRef string = makeUtf8(GetParam().bytes);
-  const std::string said = GetCapturedStderr();
-  if (GetParam().valid) {
-    ASSERT_NE(string, nullptr);
-    EXPECT_EQ(textOf(string), GetParam().bytes);
-    EXPECT_EQ(said, "");
-    CFRelease(string);
-  } else {
-    EXPECT_EQ(string, nullptr);
-    EXPECT_THAT(said, testing::MatchesRegex("vsttorture: not valid UTF-8: [ -~]+\n"));
-  }
+  const CFStringRef string = CFStringCreateWithCString(nullptr, row.bytes, row.encoding);
+  EXPECT_EQ(GetCapturedStderr(), row.failure);
+  ASSERT_EQ(string != nullptr, row.failure.empty());
+  if (string == nullptr) return;
+  EXPECT_EQ(textOf(string, row.encoding), row.bytes);
+  CFRelease(string);
+}
+
+std::string notUtf8(const std::string& shown) { return "vsttorture: not valid UTF-8: " + shown + "\n"; }
+
+INSTANTIATE_TEST_SUITE_P(
+    Texts, CFStringCreateWithCStringTest,
+    testing::Values(Text{"Empty", kUtf8, "", ""}, Text{"OneByte", kUtf8, "/opt/a b.so\x7F", ""},
+                    Text{"TwoBytes", kUtf8, "\xC2\x80 \xDF\xBF", ""},
+                    Text{"ThreeBytes", kUtf8, "\xE0\xA0\x80 \xEF\xBF\xBF", ""},
+                    Text{"FourBytes", kUtf8, "\xF0\x90\x80\x80 \xF4\x8F\xBF\xBF", ""},
+                    Text{"BesideSurrogates", kUtf8, "\xED\x9F\xBF \xEE\x80\x80", ""},
+                    Text{"LoneFollowing", kUtf8, "a\x80", notUtf8("a\\x80")},
+                    Text{"OverlongSlash", kUtf8, "\xC0\xAF", notUtf8("\\xc0\\xaf")},
+                    Text{"OverlongTwo", kUtf8, "\xC1\xBF", notUtf8("\\xc1\\xbf")},
+                    Text{"OverlongThree", kUtf8, "\xE0\x9F\xBF", notUtf8("\\xe0\\x9f\\xbf")},
+                    Text{"OverlongFour", kUtf8, "\xF0\x8F\xBF\xBF", notUtf8("\\xf0\\x8f\\xbf\\xbf")},
+                    Text{"FirstSurrogate", kUtf8, "\xED\xA0\x80", notUtf8("\\xed\\xa0\\x80")},
+                    Text{"LastSurrogate", kUtf8, "\xED\xBF\xBF", notUtf8("\\xed\\xbf\\xbf")},
+                    Text{"AboveTheLast", kUtf8, "\xF4\x90\x80\x80", notUtf8("\\xf4\\x90\\x80\\x80")},
+                    Text{"LeadF5", kUtf8, "\xF5\x80\x80\x80", notUtf8("\\xf5\\x80\\x80\\x80")},
+                    Text{"ByteFF", kUtf8, "\xFF", notUtf8("\\xff")},
+                    Text{"TruncatedTwo", kUtf8, "a\xC3", notUtf8("a\\xc3")},
+                    Text{"TruncatedThree", kUtf8, "\xE2\x82", notUtf8("\\xe2\\x82")},
+                    Text{"TruncatedFour", kUtf8, "\xF0\x9F\x8E", notUtf8("\\xf0\\x9f\\x8e")},
+                    Text{"CutByAscii", kUtf8, "\xE2\x82z", notUtf8("\\xe2\\x82z")},
+                    Text{"ControlCharactersBecomeBlanks", kUtf8, "/a\nb\x1F\x7F/\x8E",
+                         notUtf8("/a b  /\\x8e")},
+                    Text{"Ascii", kAscii, "plain\x7F", ""},
+                    Text{"AsciiAbove7F", kAscii, "\xC3\xA4",
+                         "vsttorture: not valid in the requested encoding: \xC3\xA4\n"},
+                    Text{"AnUnknownEncoding", kMacRoman, "plain",
+                         "vsttorture: not valid in the requested encoding: plain\n"}),
+    [](const auto& test) { return test.param.name; });
+
+TEST(CFStringGetCString, NeedsRoomForTheTerminatingZeroAndWritesNothingBehindIt) {
+  char buffer[] = "???????";
+  EXPECT_FALSE(CFStringGetCString(CFSTR(""), buffer, 0, kAscii));
+  EXPECT_FALSE(CFStringGetCString(CFSTR(""), buffer, -1, kAscii));
+  EXPECT_FALSE(CFStringGetCString(CFSTR("de_CH"), buffer, 5, kAscii));
+  EXPECT_TRUE(CFStringGetCString(CFSTR("de_CH"), buffer, 6, kAscii));
+  EXPECT_EQ(std::string(buffer, 7), std::string("de_CH\0?", 7));
+}
+
+TEST(CFStringGetCString, FailsForCharactersThatTheEncodingLacks) {
+  EXPECT_EQ(textOf(CFSTR("j\xC3\xA4"), kUtf8), "j\xC3\xA4");
+  EXPECT_EQ(textOf(CFSTR("j\xC3\xA4"), kAscii), "(no text)");
+  EXPECT_EQ(textOf(CFSTR("plain"), kMacRoman), "(no text)");
+}
+
+TEST(CFSTR, GivesOneObjectForEqualTextsThatReleasesLeaveAlone) {
+  const CFStringRef constant = CFSTR("a constant");
+  for (int i = 0; i < 3; ++i) CFRelease(constant);
+  EXPECT_EQ(CFSTR("a constant"), constant);
+  EXPECT_NE(CFSTR("A constant"), constant);
+  EXPECT_EQ(textOf(constant), "a constant");
+  EXPECT_EQ(systemEntryPointName(), CFSTR("main"));
+}
+
+struct RefusedPath {
+  const char* name;
+  const char* path;
+  CFURLPathStyle style;
+  const char* failure;
+};
+class CFURLCreateWithFileSystemPathTest : public testing::TestWithParam<RefusedPath> {};
+
+TEST_P(CFURLCreateWithFileSystemPathTest, ReportsWhatIsNoUsablePath) {
+  const BundleFiles files;
+  const CurrentDirectory removed(files.makeFolder("removed"));
+  std::filesystem::remove(files.path("removed"));
+  CaptureStderr();
+  const CFStringRef path = CFStringCreateWithCString(nullptr, GetParam().path, kUtf8);
+  const CFURLRef url = CFURLCreateWithFileSystemPath(nullptr, path, GetParam().style, 0);
+  CFRelease(path);
+  EXPECT_EQ(GetCapturedStderr(), GetParam().failure);
+  EXPECT_EQ(url != nullptr, *GetParam().failure == '\0');
+  if (url != nullptr) CFRelease(url);
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Table, CFStringCreateWithCStringUtf8,
-    testing::Values(
-        Utf8Case{"Empty", "", true}, Utf8Case{"Ascii", "/opt/a b.so", true},
-        Utf8Case{"TwoBytes", "\xC2\x80 \xDF\xBF", true},
-        Utf8Case{"ThreeBytes", "\xE0\xA0\x80 \xEF\xBF\xBF", true},
-        Utf8Case{"FourBytes", "\xF0\x90\x80\x80 \xF4\x8F\xBF\xBF", true},
-        Utf8Case{"BesideSurrogates", "\xED\x9F\xBF \xEE\x80\x80", true},
-        Utf8Case{"LoneFollowing", "a\x80", false}, Utf8Case{"OverlongSlash", "\xC0\xAF", false},
-        Utf8Case{"OverlongTwo", "\xC1\xBF", false}, Utf8Case{"OverlongThree", "\xE0\x9F\xBF", false},
-        Utf8Case{"OverlongFour", "\xF0\x8F\xBF\xBF", false},
-        Utf8Case{"FirstSurrogate", "\xED\xA0\x80", false}, Utf8Case{"LastSurrogate", "\xED\xBF\xBF", false},
-        Utf8Case{"AboveTheLast", "\xF4\x90\x80\x80", false}, Utf8Case{"LeadF5", "\xF5\x80\x80\x80", false},
-        Utf8Case{"ByteFF", "\xFF", false}, Utf8Case{"TruncatedTwo", "a\xC3", false},
-        Utf8Case{"TruncatedThree", "\xE2\x82", false}, Utf8Case{"TruncatedFour", "\xF0\x9F\x8E", false},
-        Utf8Case{"CutByAscii", "\xE2\x82z", false}, Utf8Case{"Latin1", "caf\xE9.so", false}),
+    Paths, CFURLCreateWithFileSystemPathTest,
+    testing::Values(RefusedPath{"Empty", "", 0, "vsttorture: the path is empty\n"},
+                    RefusedPath{"OfAnotherStyle", "C:\\a", 2, "vsttorture: not a POSIX path: C:\\a\n"},
+                    RefusedPath{"RelativeWithoutACurrentDirectory", "a.so", 0,
+                                "vsttorture: a.so: no current directory: No such file or directory\n"},
+                    RefusedPath{"AbsoluteWithoutACurrentDirectory", "/a.so", 0, ""}),
     [](const auto& test) { return test.param.name; });
 
-TEST(CFStringCreateWithCString, AsciiHoldsNothingAbove7F) {
-  const CFStringRef string = CFStringCreateWithCString(nullptr, "plain", 0x0600);
-  ASSERT_NE(string, nullptr);
-  EXPECT_EQ(textOf(string), "plain");
-  CFRelease(string);
-  CaptureStderr();
-  EXPECT_EQ(CFStringCreateWithCString(nullptr, "\xC3\xA4", 0x0600), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: not valid in the encoding asked for: \xC3\xA4\n");
-}
-
-TEST(CFStringCreateWithCString, AnUnknownEncodingGivesNull) {
-  CaptureStderr();
-  EXPECT_EQ(CFStringCreateWithCString(nullptr, "plain", 0x0100), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: not valid in the encoding asked for: plain\n");
-}
-
-TEST(CFStringCreateWithCString, TheReasonShowsBytesThatAreNoText) {
-  CaptureStderr();
-  EXPECT_EQ(makeUtf8("/a\nb/\xFF\x8E.so"), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: not valid UTF-8: /a b/\\xff\\x8e.so\n");
-}
-
-TEST(CFStringGetCString, NeedsRoomForTheTerminatingZero) {
-  char buffer[] = "??????";
-  EXPECT_FALSE(CFStringGetCString(CFSTR("de_CH"), buffer, 5, 0x0600));
-  EXPECT_TRUE(CFStringGetCString(CFSTR("de_CH"), buffer, 6, 0x0600));
-  EXPECT_STREQ(buffer, "de_CH");
-}
-
-TEST(CFStringGetCString, WritesNothingBehindTheText) {
-  char buffer[] = "??????";
-  EXPECT_TRUE(CFStringGetCString(CFSTR("de"), buffer, 6, 0x0600));
-  EXPECT_EQ(std::string(buffer, 6), std::string("de\0???", 6));
-}
-
-TEST(CFStringGetCString, RefusesSizesBelowOne) {
-  char buffer[] = "?";
-  EXPECT_FALSE(CFStringGetCString(CFSTR(""), buffer, 0, 0x0600));
-  EXPECT_FALSE(CFStringGetCString(CFSTR(""), buffer, -1, 0x0600));
-  EXPECT_STREQ(buffer, "?");
-}
-
-TEST(CFStringGetCString, AsciiCannotSayOtherLetters) {
-  const CFStringRef string = makeUtf8("j\xC3\xA4");
-  EXPECT_EQ(textOf(string, 0x0600), "(no text)");
-  EXPECT_EQ(textOf(string, 0x08000100), "j\xC3\xA4");
-  EXPECT_EQ(textOf(string, 0x0100), "(no text)");
-  CFRelease(string);
-}
-
-TEST(CFSTR, EqualTextsAreOneObject) {
-  EXPECT_EQ(CFSTR("main"), CFSTR("main"));
-  EXPECT_NE(CFSTR("main"), CFSTR("Main"));
-  EXPECT_EQ(textOf(CFSTR("VSTPluginMain")), "VSTPluginMain");
-}
-
-TEST(CFSTR, RetainAndReleaseLeaveItAlone) {
-  const CFStringRef constant = CFSTR("a constant");
-  for (int i = 0; i < 3; ++i) CFRelease(constant);
-  EXPECT_EQ(CFRetain(constant), constant);
-  EXPECT_EQ(CFGetRetainCount(constant), std::numeric_limits<CFIndex>::max());
-  EXPECT_EQ(textOf(constant), "a constant");
-}
-
-TEST(CFRetain, CountsReferences) {
-  const CFStringRef string = makeUtf8("counted");
-  EXPECT_EQ(CFGetRetainCount(string), 1);
-  EXPECT_EQ(CFRetain(string), string);
-  EXPECT_EQ(CFGetRetainCount(string), 2);
-  CFRelease(string);
-  EXPECT_EQ(CFGetRetainCount(string), 1);
-  EXPECT_EQ(textOf(string), "counted");
-  CFRelease(string);
-}
-
-TEST(CFRetain, CountsFromManyThreads) {
-  const CFStringRef string = makeUtf8("shared");
-  std::vector<std::thread> threads;
-  for (int i = 0; i < 4; ++i) {
-    threads.emplace_back([string] {
-      for (int turn = 0; turn < 20000; ++turn) {
-        CFRetain(string);
-        CFRetain(string);
-        CFRelease(string);
-      }
-    });
-  }
-  for (std::thread& thread : threads) thread.join();
-  EXPECT_EQ(CFGetRetainCount(string), 80001);
-  for (int i = 0; i < 80001; ++i) CFRelease(string);
-}
-
-TEST(CFURLCreateWithFileSystemPath, AnEmptyPathGivesNullAndTheReason) {
-  CaptureStderr();
-  EXPECT_EQ(CFURLCreateWithFileSystemPath(nullptr, CFSTR(""), 0, 0), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: the path is empty\n");
-}
-
-TEST(CFURLCreateWithFileSystemPath, AnotherPathStyleGivesNullAndTheReason) {
-  CaptureStderr();
-  EXPECT_EQ(CFURLCreateWithFileSystemPath(nullptr, CFSTR("C:\\a"), 2, 0), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: not a POSIX path: C:\\a\n");
-}
-
-TEST(CFURLCreateWithFileSystemPath, ARelativePathNeedsACurrentDirectory) {
-  const TemporaryFolder folder;
-  const CurrentDirectory inside(folder.makeFolder("gone"));
-  std::filesystem::remove(folder.path("gone"));
-  CaptureStderr();
-  EXPECT_EQ(CFURLCreateWithFileSystemPath(nullptr, CFSTR("a.so"), 0, 0), nullptr);
-  EXPECT_EQ(GetCapturedStderr(), "vsttorture: a.so: no current directory: No such file or directory\n");
-  const CFURLRef absolute = CFURLCreateWithFileSystemPath(nullptr, CFSTR("/a.so"), 0, 0);
-  ASSERT_NE(absolute, nullptr);
-  CFRelease(absolute);
-}
-
-TEST(CFURLCreateWithFileSystemPath, DoesNotKeepTheString) {
-  const CFStringRef path = makeUtf8("/opt/plug-in.so");
-  const CFURLRef url = CFURLCreateWithFileSystemPath(nullptr, path, 0, 0);
-  EXPECT_EQ(CFGetRetainCount(path), 1);
-  EXPECT_EQ(CFGetRetainCount(url), 1);
-  CFRelease(path);
-  CFRelease(url);
-}
-
-class CFLocaleCopyCurrentTest : public testing::Test {
- protected:
-  CFLocaleCopyCurrentTest() {
-    unsetenv("LC_ALL");
-    unsetenv("LC_MESSAGES");
-    unsetenv("LANG");
-  }
-  static std::string identifier() {
-    const CFLocaleRef locale = CFLocaleCopyCurrent();
-    const std::string text = textOf(CFLocaleGetIdentifier(locale), 0x0600);
-    CFRelease(locale);
-    return text;
-  }
+struct Environment {
+  const char* name;
+  const char* lcAll;  // Null: not set.
+  const char* lcMessages;
+  const char* lang;
+  const char* identifier;
 };
+class CFLocaleCopyCurrentTest : public testing::TestWithParam<Environment> {};
 
-TEST_F(CFLocaleCopyCurrentTest, FollowsTheEnvironment) {
-  EXPECT_EQ(identifier(), "en_US_POSIX");
-  setenv("LANG", "pt_BR.UTF-8", 1);
-  EXPECT_EQ(identifier(), "pt_BR");
-  setenv("LC_MESSAGES", "ja_JP.UTF-8", 1);
-  EXPECT_EQ(identifier(), "ja_JP");
-  setenv("LC_ALL", "de", 1);
-  EXPECT_EQ(identifier(), "de");
+// Keeps one of its two locales for ever; the leak check of the sanitizer build looks on.
+TEST_P(CFLocaleCopyCurrentTest, TakesTheFirstVariableThatIsSet) {
+  const auto set = [](const char* variable, const char* value) {
+    value == nullptr ? unsetenv(variable) : setenv(variable, value, 1);
+  };
+  set("LC_ALL", GetParam().lcAll);
+  set("LC_MESSAGES", GetParam().lcMessages);
+  set("LANG", GetParam().lang);
+  const CFLocaleRef locale = CFLocaleCopyCurrent();
+  CFRelease(locale);
+  EXPECT_EQ(textOf(CFLocaleGetIdentifier(CFLocaleCopyCurrent())), GetParam().identifier);
 }
 
-TEST_F(CFLocaleCopyCurrentTest, GivesEachCallerAReferenceToOneObject) {
-  setenv("LANG", "fr_FR", 1);
-  const CFLocaleRef first = CFLocaleCopyCurrent();
-  const CFIndex count = CFGetRetainCount(first);
-  const CFLocaleRef second = CFLocaleCopyCurrent();
-  EXPECT_EQ(second, first);
-  EXPECT_EQ(CFGetRetainCount(first), count + 1);
-  CFRelease(second);
-  EXPECT_EQ(CFGetRetainCount(first), count);
-  CFRelease(first);
-}
-
-// A caller may keep its locale for ever; the leak check of the sanitizer build looks on.
-TEST_F(CFLocaleCopyCurrentTest, ALocaleThatIsNeverReleasedIsNoLeak) {
-  for (const char* language : {"it_IT", "es_ES", "it_IT"}) {
-    setenv("LANG", language, 1);
-    EXPECT_EQ(textOf(CFLocaleGetIdentifier(CFLocaleCopyCurrent())), language);
-  }
-}
-
-TEST(SystemEntryPointName, IsMain) { EXPECT_EQ(systemEntryPointName(), CFSTR("main")); }
+INSTANTIATE_TEST_SUITE_P(
+    Environments, CFLocaleCopyCurrentTest,
+    testing::Values(Environment{"NothingSet", nullptr, nullptr, nullptr, "en_US_POSIX"},
+                    Environment{"AllEmpty", "", "", "", "en_US_POSIX"},
+                    Environment{"LangAlone", nullptr, nullptr, "ja_JP.UTF-8", "ja_JP"},
+                    Environment{"MessagesBeforeLang", nullptr, "fr_FR", "ja_JP", "fr_FR"},
+                    Environment{"AllBeforeMessages", "it_IT", "fr_FR", "ja_JP", "it_IT"},
+                    Environment{"EmptyAllIsSkipped", "", "fr_FR", "ja_JP", "fr_FR"},
+                    Environment{"EmptyMessagesIsSkipped", nullptr, "", "ja_JP", "ja_JP"},
+                    Environment{"TheCLocaleIsNotSkipped", "C", "fr_FR", "ja_JP", "en_US_POSIX"},
+                    Environment{"CWithCodeset", nullptr, nullptr, "C.UTF-8", "en_US_POSIX"},
+                    Environment{"Posix", nullptr, nullptr, "POSIX", "en_US_POSIX"},
+                    Environment{"LanguageOnly", nullptr, nullptr, "de", "de"},
+                    Environment{"Modifier", nullptr, nullptr, "de_DE@euro", "de_DE"},
+                    Environment{"CodesetAndModifier", nullptr, nullptr, "sr_RS.UTF-8@latin", "sr_RS"},
+                    Environment{"CodesetOnly", nullptr, nullptr, ".UTF-8", "en_US_POSIX"},
+                    Environment{"LowerCaseCIsALanguage", nullptr, nullptr, "c", "c"},
+                    Environment{"Utf8Letters", nullptr, nullptr, "j\xC3\xA4", "j\xC3\xA4"},
+                    Environment{"NotUtf8", nullptr, nullptr, "j\xE4", "en_US_POSIX"}),
+    [](const auto& test) { return test.param.name; });
 
 }  // namespace

@@ -1,18 +1,21 @@
 // SPDX-License-Identifier: MIT
-// Another implementation of platform/core_foundation.h: it records every call and takes its bundles and its
-// locale from the test.
+// Another implementation of platform/core_foundation.h and platform/entry_point_name.h: it records every call,
+// and a test chooses which bundles exist, what they export and which locale the user has.
 //
 //   RecordingCoreFoundation core_foundation;   // a member of the test fixture
 //   core_foundation.addBundle("/b.vst", {{"VSTPluginMain", entry}});
 //   core_foundation.failStep(Step::kLoadExecutable);
 //   EXPECT_THAT(core_foundation.calls(), Contains("CFBundleLoadExecutable(\"/b.vst\") -> false"));
 //
-// The functions of the header work on the latest RecordingCoreFoundation that exists and end the process when
-// there is none. Objects stay in memory after their last release, so that a late use can be told: a bundle
-// that somebody kept from an earlier test finds its symbols among those that the present test gives its path.
+// The functions work on the latest RecordingCoreFoundation that exists and end the process when there is none.
+// Objects stay in memory after their release, so that a later use of them is found. A bundle that was kept from
+// an earlier test has the symbols that the present test gives to its path.
 //
-// Ownership: one per test at a time; its destruction fails the test for misuses that nobody took.
-// Systems:   those where platform/core_foundation.h declares the functions itself.
+// A use that crashes in the real CoreFoundation fails the test when the RecordingCoreFoundation is destroyed: of
+// a null object, of a released one, of one of another kind, and the release of an object that the caller does
+// not own.
+//
+// Systems: those where platform/core_foundation.h declares the functions itself.
 #pragma once
 
 #include <map>
@@ -27,14 +30,14 @@ namespace doubles {
 
 /// A step that a test can make fail.
 enum class Step {
-  kCreateString,    ///< CFStringCreateWithCString answers null.
-  kCreateUrl,       ///< CFURLCreateWithFileSystemPath answers null.
-  kCreateBundle,    ///< CFBundleCreate answers null.
-  kLoadExecutable,  ///< CFBundleLoadExecutable answers false.
-  kGetCString,      ///< CFStringGetCString answers false, although the text lies in the buffer.
+  kCreateString,    ///< CFStringCreateWithCString returns null.
+  kCreateUrl,       ///< CFURLCreateWithFileSystemPath returns null.
+  kCreateBundle,    ///< CFBundleCreate returns null.
+  kLoadExecutable,  ///< CFBundleLoadExecutable returns false.
+  kGetCString,      ///< CFStringGetCString returns false, although the text is in the buffer.
 };
 
-/// What a bundle's symbol stands for: any function, or any address.
+/// What a bundle exports under a name: any function, or any address.
 class SymbolAddress {
  public:
   template <typename Result, typename... Arguments>
@@ -49,8 +52,6 @@ class SymbolAddress {
 /// Names and addresses of what a bundle's executable exports.
 using SymbolTable = std::map<std::string, SymbolAddress>;
 
-struct CoreFoundationWorld;
-
 class RecordingCoreFoundation {
  public:
   RecordingCoreFoundation();
@@ -58,12 +59,11 @@ class RecordingCoreFoundation {
   RecordingCoreFoundation(const RecordingCoreFoundation&) = delete;
   RecordingCoreFoundation& operator=(const RecordingCoreFoundation&) = delete;
 
-  // ---- The world as the program finds it ----
+  // ---- What the program finds ----
 
-  /// There is a bundle at `path` with an executable that exports these symbols. Replaces an earlier one
-  /// there.
+  /// Puts a bundle at `path`, whose executable exports these symbols. Replaces an earlier one there.
   void addBundle(const std::string& path, SymbolTable symbols);
-  /// There is a bundle at `path`, but it cannot be loaded.
+  /// Puts a bundle at `path` that cannot be loaded.
   void addBundleWithoutExecutable(const std::string& path);
 
   /// Makes a step fail from now on, or work again.
@@ -73,15 +73,12 @@ class RecordingCoreFoundation {
   /// The identifier of the user's locale; "en_US" until set.
   void setLocale(const std::string& identifier);
 
-  /// What systemEntryPointName() answers: a name ("main" until set), or null. Asking it is not recorded.
+  /// What systemEntryPointName() returns: a name ("main" until set), or null. Its calls are not recorded.
   void setSystemEntryPointName(std::optional<std::string> name);
-
-  /// Forgets calls, bundles, failures and objects; the state is as after construction.
-  void reset();
 
   // ---- What the program did ----
 
-  /// Every call in order, with arguments and answer:
+  /// Every call in order, with arguments and result:
   ///   CFStringCreateWithCString("/b.vst", UTF-8) -> string
   ///   CFURLCreateWithFileSystemPath("/b.vst", POSIX, file) -> URL
   ///   CFRelease(string "/b.vst")
@@ -92,29 +89,21 @@ class RecordingCoreFoundation {
   ///   CFLocaleCopyCurrent() -> locale
   ///   CFLocaleGetIdentifier("de_CH") -> string
   ///   CFStringGetCString("de_CH", 255 bytes, ASCII) -> true
-  ///   CFGetRetainCount(bundle "/b.vst") -> 1
-  /// Failures answer null or false. An allocator other than the default one is shown as a last argument.
+  /// Failures show null or false. An allocator other than the default one is shown as a last argument.
   /// CFSTR is not a call.
-  std::vector<std::string> calls() const;
-  /// Only the functions' names, or only the calls of one function.
-  std::vector<std::string> functionsCalled() const;
+  const std::vector<std::string>& calls() const;
+  /// Only the calls of one function.
   std::vector<std::string> callsOf(const std::string& function) const;
   void forgetCalls();
 
-  /// The objects made and not yet released for the last time, in order of creation: bundle "/b.vst".
-  /// Constants, and what a live object lends, do not count.
+  /// The objects made and not released, in order of creation, such as: bundle "/b.vst". Without constants and the
+  /// identifiers of locales.
   std::vector<std::string> aliveObjects() const;
 
-  /// What real CoreFoundation would answer with a crash, since the start or the last taking: a null object, a
-  /// released one, or one of another kind.
-  std::vector<std::string> takeMisuses();
-
-  /// For the functions of the header: the state of the latest RecordingCoreFoundation that exists.
-  static CoreFoundationWorld& currentWorld();
+  struct State;  ///< Of the functions; defined with them.
 
  private:
-  std::unique_ptr<CoreFoundationWorld> world;
-  RecordingCoreFoundation* const previous;
+  std::unique_ptr<State> state;
 };
 
 }  // namespace doubles
