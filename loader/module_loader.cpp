@@ -39,8 +39,8 @@ VSTPluginLoader::~VSTPluginLoader() {
 void* VSTPluginLoader::getMainEntry() {
   if (void* entry = CFBundleGetFunctionPointerForName(bundle, CFSTR("VSTPluginMain"))) return entry;
   if (void* entry = CFBundleGetFunctionPointerForName(bundle, CFSTR("main_macho"))) return entry;
-  CFStringRef systemsOwn = systemEntryPointName();
-  return systemsOwn == nullptr ? nullptr : CFBundleGetFunctionPointerForName(bundle, systemsOwn);
+  CFStringRef systemName = systemEntryPointName();
+  return systemName == nullptr ? nullptr : CFBundleGetFunctionPointerForName(bundle, systemName);
 }
 
 bool VSTPluginLoader::findLoadedDLL(const VST_DLL_Info& identity, NiduCOM::i_ptr<VSTPluginLoader>& out) {
@@ -53,7 +53,8 @@ bool VSTPluginLoader::findLoadedDLL(const VST_DLL_Info& identity, NiduCOM::i_ptr
 NiduCOM::i_ptr<VSTPluginLoader> VSTPluginLoader::demandLoadedPlugin(const VST_DLL_Info& identity) {
   NiduCOM::i_ptr<VSTPluginLoader> result;
   if (findLoadedDLL(identity, result)) return result;
-  // On purpose: counted, not adopted. The reference of the construction stays out for ever.
+  // On purpose: takes a second reference, although the constructor's could be adopted. That one is never
+  // given back, so the loader and its plug-in's code stay until the process ends.
   result.reset(new VSTPluginLoader(identity), NiduCOM::AddRef::kTake);
   fLoadedDLLs.insert(result);
   return result;

@@ -27,29 +27,29 @@ struct compareVSTLoaderRefs {
 
 class VSTPluginLoader {
  public:
-  /// Loads the bundle at the identity's path. Throws the int -1 where that fails.
+  /// Loads the bundle at the identity's path. Throws the int -1 when that fails.
   explicit VSTPluginLoader(const VST_DLL_Info& identity);
-  /// Unloads the bundle. Never reached in this program, where the first reference is kept.
+  /// Unloads the bundle. Never runs in this program, because the constructor's reference is never given back.
   ~VSTPluginLoader();
   VSTPluginLoader(const VSTPluginLoader&) = delete;
   VSTPluginLoader& operator=(const VSTPluginLoader&) = delete;
 
-  /// The function that creates instances: "VSTPluginMain", else "main_macho", else the name that this
-  /// system's oldest plug-ins use, if it has one. Null where the module exports none of them.
+  /// The function that creates instances: "VSTPluginMain", else "main_macho", else systemEntryPointName().
+  /// Null when the module exports none of them.
   void* getMainEntry();
 
-  /// Looks into the cache. On a hit `out` holds the loader; on a miss it is left as it is.
-  /// On purpose: the search positions by path and then only the name decides, so the next loader in path
-  /// order is a hit when its name is the same.
+  /// Searches the cache. On a hit it assigns the loader to `out`; on a miss `out` is unchanged.
+  /// On purpose: the search finds the first loader whose path is not less than the identity's, and then
+  /// compares only the names. So the loader of a later path is a hit when its name is the same.
   static bool findLoadedDLL(const VST_DLL_Info& identity, NiduCOM::i_ptr<VSTPluginLoader>& out);
 
-  /// The loader for this bundle: from the cache, else newly made and cached. Throws the int -1 where the
+  /// The loader for this bundle: from the cache, else newly made and cached. Throws the int -1 when the
   /// bundle does not load.
   static NiduCOM::i_ptr<VSTPluginLoader> demandLoadedPlugin(const VST_DLL_Info& identity);
 
   CFBundleRef bundle = nullptr;  ///< Owned: one reference.
-  VST_DLL_Info info;             ///< What this loader was made for.
-  std::uint32_t refCount = 1;
+  VST_DLL_Info info;             ///< The identity that this loader was made for.
+  std::uint32_t refCount = 1;    ///< See support/counted_handle.h.
 
   /// Every bundle loaded so far. Empty before main runs.
   static sorted_vector_set<NiduCOM::i_ptr<VSTPluginLoader>, compareVSTLoaderRefs> fLoadedDLLs;

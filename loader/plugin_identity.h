@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: MIT
-// The records that name a plug-in: the bundle it comes in, and the child of a shell that it may be.
+// The records that name a plug-in: its bundle, and the child when the bundle is a shell with several
+// plug-ins.
 //
-// Plain values, copied freely; each owns its strings. putTo and getFrom travel over an INiduStream and let
-// its NiduException pass: fields before the failed operation keep their new values, later ones their old.
+// Plain values, copied freely; each owns its strings. putTo writes a record to an INiduStream and getFrom
+// reads it. When the stream fails, its NiduException reaches the caller; fields that were read before the
+// failure have their new values, the others their old ones.
 #pragma once
 
 #include <cstdint>
@@ -16,14 +18,14 @@ struct VST_loadID {
   void putTo(INiduStream* stream) const;
   void getFrom(INiduStream* stream);
 
-  bool hasChildID = false;   ///< True when a certain child of a shell is wanted.
+  bool hasChildID = false;   ///< True when one child of a shell is wanted.
   std::int32_t childID = 0;  ///< Meaningful only with hasChildID.
 };
 
 /// A VST_loadID with a name to show. Ordered by child, with "no child" first (see operator<).
 struct VST_ChildSpec : VST_loadID {
   VST_ChildSpec() = default;
-  /// A certain child, also for id 0.
+  /// The child with this identifier; 0 is one like any other.
   explicit VST_ChildSpec(int id) : VST_loadID{true, id} {}
   explicit VST_ChildSpec(const VST_loadID& loadID) : VST_loadID(loadID) {}
 
@@ -31,11 +33,11 @@ struct VST_ChildSpec : VST_loadID {
   void putTo(INiduStream* stream) const;
   void getFrom(INiduStream* stream);
 
-  std::string childName;  ///< Empty until whoever enumerates the children fills it in.
+  std::string childName;  ///< Empty until the children of the shell are enumerated.
 };
 
-/// By signed child identifier; a spec without a child comes before every spec with one.
-/// On purpose: the name takes no part, so a set holds one entry for each child and one without a child.
+/// Orders by signed child identifier; a spec without a child comes before every spec with one.
+/// On purpose: the name is not compared, so a set holds one entry for each child and one without a child.
 bool operator<(const VST_ChildSpec& a, const VST_ChildSpec& b);
 
 /// One bundle on disk.
@@ -45,12 +47,12 @@ class VST_DLL_Info {
   VST_DLL_Info(std::string bundlePath, const char* name);
 
   /// Order of values: string path, string effectName, int32 of dllTag's low 32 bits.
-  /// On purpose: the 64-bit dllTag travels as 32 bits and is read back sign-extended.
+  /// On purpose: the 64-bit dllTag is written as 32 bits and read back sign-extended.
   virtual void putTo(INiduStream* stream) const;
   virtual void getFrom(INiduStream* stream);
 
   std::string path;         ///< UTF-8, as given on the command line.
-  std::int64_t dllTag = 0;  ///< Carried along, never interpreted.
+  std::int64_t dllTag = 0;  ///< Copied and streamed, never interpreted.
   std::string effectName;   ///< The driver passes "test".
 };
 
@@ -61,7 +63,7 @@ class VST_Class_Spec : public VST_DLL_Info {
 
   /// Order of values: the bundle part, the child part.
   void putTo(INiduStream* stream) const override;
-  /// On purpose: the inherited one reads the bundle part only and leaves the child part as it is.
+  /// On purpose: the inherited overload reads the bundle part only and leaves the child part unchanged.
   using VST_DLL_Info::getFrom;
   /// Reads both parts. The version is ignored.
   virtual void getFrom(INiduStream* stream, int version);

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
 // A stream of typed values, through which identity records are stored and sent.
 //
-// The records fix the order of the values; how a value is encoded is the stream's own business. This program
-// holds no implementation.
+// The records decide the order of the values, the stream decides how a value is encoded. This program has no
+// implementation.
 #pragma once
 
 #include <cstdint>

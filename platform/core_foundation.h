@@ -5,13 +5,13 @@
 // the library platform_core_foundation, so that every caller is one portable source. A test may define all
 // functions below by itself instead and is then linked without that library's objects.
 //
-// Ownership: what a function with Create or Copy in its name returns belongs to the caller, who ends that with
-//            CFRelease. What a function with Get in its name returns lives as long as the object that was asked.
-//            Nothing here takes a further reference, so each object has one owner.
+// Ownership: what a function with Create or Copy in its name returns belongs to the caller, who ends that
+//            with CFRelease. What a function with Get in its name returns lives as long as the object that
+//            was asked. Nothing here takes a further reference, so each object has one owner.
 // Failures:  null or false. A load that fails, at whichever step, leaves one line with the reason on
 //            standard error: "vsttorture: ...".
-// Threads:   CFSTR and CFLocaleCopyCurrent may be used on any thread. Any other object is used by one thread at
-//            a time.
+// Threads:   CFSTR and CFLocaleCopyCurrent may be used on any thread. Any other object is used by one thread
+//            at a time.
 #pragma once
 
 #if defined(__APPLE__)
@@ -47,8 +47,8 @@ constexpr CFURLPathStyle kCFURLPOSIXPathStyle = 0;
 /// Destroys `object`, which must not be null. Leaves constants alone.
 void CFRelease(CFTypeRef object);
 
-/// The constant string with the text of a literal; equal texts give the same object. It is owned by nobody and
-/// never destroyed.
+/// The constant string with the text of a literal; equal texts give the same object. It is owned by nobody
+/// and never destroyed.
 #define CFSTR(literal) __CFStringMakeConstantString("" literal "")
 
 /// What CFSTR calls; not called by name.
@@ -62,9 +62,9 @@ CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, const char* text
 /// has characters that `encoding` lacks; the buffer's content is then unspecified.
 Boolean CFStringGetCString(CFStringRef string, char* buffer, CFIndex bufferSize, CFStringEncoding encoding);
 
-/// Makes the URL of `path`. A relative path is made absolute with the directory that is current now; slashes at
-/// the end of the path are ignored, and so is `isDirectory`. Null, with a line on standard error, for an empty
-/// path, a path style other than POSIX, or when there is no current directory.
+/// Makes the URL of `path`. A relative path is made absolute with the directory that is current now; slashes
+/// at the end of the path are ignored, and so is `isDirectory`. Null, with a line on standard error, for an
+/// empty path, a path style other than POSIX, or when there is no current directory.
 CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef path, CFURLPathStyle style,
                                        Boolean isDirectory);
 
@@ -72,21 +72,21 @@ CFURLRef CFURLCreateWithFileSystemPath(CFAllocatorRef allocator, CFStringRef pat
 /// error, when nothing is there or when it is neither file nor directory.
 CFBundleRef CFBundleCreate(CFAllocatorRef allocator, CFURLRef url);
 
-/// Loads the bundle's code and runs its static constructors; what they throw reaches the caller. True when the
-/// code is loaded, also when it was loaded before. False, with a line on standard error, when the bundle has
-/// no executable, or one that this program cannot load.
+/// Loads the bundle's code and runs its static constructors; what they throw reaches the caller. True when
+/// the code is loaded, also when it was loaded before. False, with a line on standard error, when the bundle
+/// has no executable, or one that this program cannot load.
 ///
 /// A regular file is its own executable. In a folder ProM.vst, the regular files ProM, ProM.so and libProM.so
-/// are looked for in Contents/x86_64-linux (or the name of another architecture), Contents/Linux, Contents and
-/// the folder itself, in this order; the first one found is the executable.
+/// are looked for in Contents/x86_64-linux (or the name of another architecture), Contents/Linux, Contents
+/// and the folder itself, in this order; the first one found is the executable.
 Boolean CFBundleLoadExecutable(CFBundleRef bundle);
 
 /// The address of the function `name` in the bundle's own executable; the libraries that it needs are not
 /// searched. Null when there is none or the executable is not loaded.
 void* CFBundleGetFunctionPointerForName(CFBundleRef bundle, CFStringRef name);
 
-/// Unloads the bundle's code; pointers into it become invalid. Does nothing when none is loaded. CFRelease of a
-/// bundle does this too.
+/// Unloads the bundle's code; pointers into it become invalid. Does nothing when none is loaded. CFRelease of
+/// a bundle does this too.
 void CFBundleUnloadExecutable(CFBundleRef bundle);
 
 /// The user's locale. Never null.

@@ -50,9 +50,8 @@ kern_return_t semaphore_destroy(task_t task, semaphore_t semaphore);
 /// semaphore was destroyed meanwhile, KERN_INVALID_ARGUMENT for a null semaphore.
 kern_return_t semaphore_wait(semaphore_t semaphore);
 
-/// Gives one token: to the thread that has waited longest, or to a later wait. Does not wait for other threads
-/// beyond a short lock.
-/// KERN_INVALID_ARGUMENT for a null semaphore.
+/// Gives one token: to the thread that has waited longest, or to a later wait. Does not wait for other
+/// threads beyond a short lock. KERN_INVALID_ARGUMENT for a null semaphore.
 kern_return_t semaphore_signal(semaphore_t semaphore);
 
 }  // extern "C"

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The atomic addition under the lock's counter.
+// The atomic addition for the counter of the lock.
 #pragma once
 
 #include <cstdint>

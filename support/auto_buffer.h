@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: MIT
-// An owned block of bytes: preset, bank and chunk data are put together in one, parameter values saved in
-// one.
+// An owned block of bytes, for preset, bank and chunk data and for saved parameter values.
 #pragma once
 
 #include <cstddef>
@@ -20,10 +19,11 @@ class AutoBuffer {
   AutoBuffer(const AutoBuffer&) = delete;
   AutoBuffer& operator=(const AutoBuffer&) = delete;
 
-  /// Allocates `sizeInBytes` bytes, tells their number in `sizeOut` and gives the block to the caller, who
-  /// frees it with free(). Throws the int -1 when there is no memory, and for a negative size.
+  /// Allocates `sizeInBytes` bytes and stores their number in `sizeOut`. The caller owns the block and frees
+  /// it with free(). Throws the int -1 when there is no memory, and for a negative size; `sizeOut` is then
+  /// unchanged.
   static Byte* NewBuffer(int sizeInBytes, std::int32_t& sizeOut) {
-    // NOLINTNEXTLINE(clang-analyzer-optin.portability.UnixAPI): an empty block is as good as any
+    // NOLINTNEXTLINE(clang-analyzer-optin.portability.UnixAPI): a block of 0 bytes is allowed
     void* made = sizeInBytes < 0 ? nullptr : std::malloc(static_cast<std::size_t>(sizeInBytes));
     nidu_FailNULL(made);
     sizeOut = sizeInBytes;

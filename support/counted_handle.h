@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Counted handles to objects that carry their own count.
+// Handles that share an object, which contains its own reference count.
 //
 // Threads: one. Counts are plain integers.
 #pragma once
@@ -8,10 +8,10 @@
 
 namespace NiduCOM {
 
-/// How a handle takes a pointer over.
+/// What reset() does to the count of the object that it is given.
 enum class AddRef : int {
-  kTake = 0,   ///< Counts a new reference.
-  kAdopt = 1,  ///< Any value but 0: adopts a reference that the caller owns already.
+  kTake = 0,   ///< Adds one: the handle takes a new reference.
+  kAdopt = 1,  ///< Nothing: the handle takes over a reference of the caller's. So does every value but 0.
 };
 
 namespace RefCount {
@@ -40,8 +40,8 @@ class i_ptr {
     if (pointer != nullptr) RefCount::Release(pointer);
   }
 
-  /// Holds `p` from now on. The new reference is taken before the old one is given up, so a handle may be
-  /// reset to what it holds.
+  /// Holds `p` from now on. The new reference is taken before the old one is given back, so it is safe to
+  /// reset a handle to the pointer that it holds.
   void reset(T* p, AddRef tag) {
     T* old = pointer;
     pointer = p;

@@ -1,15 +1,16 @@
 // SPDX-License-Identifier: MIT
-// The two things this program throws, and the checks that throw them.
+// The two things that this program throws, and the checks that throw them.
 //
-// A needed resource that cannot be had is the plain int -1. A failed stream operation is a NiduException, a
-// fixed-size record. Nothing is printed here: the driver catches both in one place.
+// - The int -1: a resource could not be obtained.
+// - NiduException, a record of fixed size: a stream operation failed.
+// Nothing is printed here; the driver catches both in one place.
 #pragma once
 
 #include <cstdint>
 #include <new>
 #include <stdexcept>
 
-/// What went wrong in a stream operation. Thrown and caught by value; travels as one block.
+/// What went wrong in a stream operation. Thrown by value, and copied as one block of bytes.
 struct NiduException {
   char textA[50];          ///< First text of the description, zero-terminated.
   char textB[50];          ///< Second text, zero-terminated.
@@ -23,12 +24,12 @@ struct NiduException {
 ///
 /// Made on the stack for a single operation and passed to it by pointer; the stream sets the error code (and
 /// may fill the texts) when it fails. Call doCheck() right after the operation. If the operation itself
-/// throws, the slot's destructor keeps quiet, since an exception is under way already.
+/// throws, the slot's destructor does not throw, because an exception is already propagating.
 class AutoNiduException {
  public:
   /// Texts empty, error code 0, mode 1.
   AutoNiduException();
-  /// Checks once more.
+  /// Calls doCheck(), so it may throw.
   ~AutoNiduException() noexcept(false);
   AutoNiduException(const AutoNiduException&) = delete;
   AutoNiduException& operator=(const AutoNiduException&) = delete;
@@ -42,7 +43,7 @@ class AutoNiduException {
 /// Throws the int -1 when `p` is null.
 void nidu_FailNULL(void* p);
 
-/// Runs `allocate`, which grows a container, and throws the int -1 where the memory for it cannot be had.
+/// Runs `allocate`, which grows a container, and throws the int -1 when there is no memory for it.
 template <class Allocate>
 void allocateOrFail(Allocate allocate) {
   try {

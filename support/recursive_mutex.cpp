@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The recursive lock: an atomic counter, and a semaphore for those who come too late.
+// The recursive lock: an atomic counter of threads, and a semaphore for those that have to wait.
 #include "support/recursive_mutex.h"
 
 #include "support/atomic_add.h"
@@ -20,13 +20,13 @@ void NiduCoreRecursiveMutex::lock() const {
 
 void NiduCoreRecursiveMutex::unlock() const {
   const NiduThreadID me = NiduThreadID::CurrentThread();
-  // On purpose: who does not hold the lock changes nothing and is not told.
+  // On purpose: an unlock by a thread that does not hold the lock is ignored.
   if (!owner.IsEqual(me)) return;
   if (recursionDepth > 0) {
     --recursionDepth;
     return;
   }
-  // Nobody's before it is free: once the count is down, the owner is the next thread's to write.
+  // Cleared before the count goes down: from then on, the next thread may store itself as the owner.
   owner = NiduThreadID();
   const std::int32_t previous = AtomicAdd32Implementation(&lockCount, -1);
   if (previous - 1 > 0) semaphore.signal();

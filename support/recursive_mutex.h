@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: MIT
 // A lock that its owner may take again, cheap while nobody else wants it.
 //
-// The first lock costs one atomic addition, each further one by the owner none. Only threads that have to
-// wait, and those that let them go on, call the kernel. Waiting threads get the lock in order of arrival.
+// The first lock costs one atomic addition, each further one by the owner none. Only a thread that has to
+// wait, and the one that wakes it, call the kernel. Waiting threads get the lock in order of arrival.
 //
-// Failures: none is reported. If the semaphore could not be created, threads that ought to wait go on.
-// Threads:  all operations. A const owner can lock, so the state is mutable.
+// Failures: none is reported. If the semaphore could not be created, threads that should wait do not.
+// Threads:  any thread may call any operation. A const object can be locked, so the state is mutable.
 #pragma once
 
 #include <cstdint>
@@ -24,11 +24,11 @@ class NiduCoreRecursiveMutex {
   /// Takes the lock, sleeping while another thread holds it. Each lock needs an unlock().
   void lock() const;
 
-  /// Undoes one lock(); the last one lets the next thread go on. Ignored when the calling thread does not
-  /// hold the lock.
+  /// Undoes one lock(); the last one passes the lock to the next thread. Ignored when the calling thread does
+  /// not hold the lock.
   void unlock() const;
 
-  // The state of the lock, open to inspection. Nobody else changes it.
+  // The state of the lock, public so that tests can look at it. Only lock() and unlock() change it.
   mutable std::int32_t lockCount = 0;       // threads that hold or wait for the lock; changed only atomically
   mutable NiduSemaphore semaphore;          // where waiting threads sleep
   mutable std::int32_t recursionDepth = 0;  // locks of the owner beyond its first; only the owner looks at it

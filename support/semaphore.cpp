@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A counting semaphore on those of the Mach kernel.
+// A counting semaphore, made of one of the Mach kernel.
 #include "support/semaphore.h"
 
 #include "platform/mach_semaphore.h"
@@ -9,8 +9,8 @@ struct NiduSemaphore::Implementation {
 };
 
 NiduSemaphore::NiduSemaphore() : implementation(std::make_unique<Implementation>()) {
-  // On purpose: the result is not looked at. Without a semaphore the program runs on, as it has one thread
-  // of its own that never has to wait.
+  // On purpose: the result is not checked. The program has one thread of its own, which never waits, so it
+  // works without a semaphore.
   semaphore_create(mach_task_self(), &implementation->semaphore, SYNC_POLICY_FIFO, 0);
 }
 

@@ -7,7 +7,7 @@
 #include <vector>
 
 /// Unique elements in ascending order under `Less`. Two elements are the same key when neither is less than
-/// the other. Keys of another type are looked up where `Less` compares an element with them.
+/// the other. lower_bound() also takes a key of another type, if `Less` can compare an element with it.
 template <class Element, class Less, class Allocator = std::allocator<Element>>
 class sorted_vector_set {
  public:
@@ -41,8 +41,8 @@ class sorted_vector_set {
     return p != end() && !less(key, *p) ? p : end();
   }
 
-  /// Adds a copy in its place. Where the key is there already, nothing is added and the result is that
-  /// element with false.
+  /// Inserts a copy in its place and returns its position and true. If an element with this key is there
+  /// already, nothing is inserted and the result is its position and false.
   std::pair<iterator, bool> insert(const Element& value) {
     const iterator p = lower_bound(value);
     if (p != end() && !less(value, *p)) return {p, false};

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A text with three integers, as the description of a plug-in keeps its texts.
+// A text with three integers: the form of the texts in the description of a plug-in.
 #pragma once
 
 #include <cstdint>

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: MIT
 // The identity of a thread as a value that can also be "no thread".
 //
-// Threads: one thread may assign while others compare. They read the old value or the new one, and nothing
-//          else is ordered by that.
+// Threads: one thread may assign while others compare. They read the old value or the new one; the access
+//          orders no other memory access.
 //
-// All in the header: the lock compares identities twice for each parameter value.
+// Everything is inline, because the lock compares identities twice for each parameter value.
 #pragma once
 
 #include <atomic>
@@ -30,7 +30,7 @@ class NiduThreadID {
     return current;
   }
 
-  /// True when both name the same thread or both name none. A thread's value may come back for another
+  /// True when both name the same thread or both name none. The system may reuse a thread's value for another
   /// thread once the first has ended.
   [[nodiscard]] bool IsEqual(NiduThreadID const& other) const;
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
-// The record through which host and plug-in instance know each other.
+// The record that stands for a plug-in instance, shared by the plug-in and its host.
 //
-// A plug-in may have allocated less than the whole record: some own no memory behind processReplacing. Read
+// A plug-in may have allocated less than the whole record: in some it ends behind processReplacing. Read
 // single fields through the pointer; never copy, compare or clear an AEffect.
 #pragma once
 
@@ -38,14 +38,14 @@ struct AEffect {
   VstInt32 numInputs;
   VstInt32 numOutputs;
   VstInt32 flags;         ///< VstAEffectFlags
-  VstIntPtr resvd1;       ///< The host's word.
-  VstIntPtr resvd2;       ///< The host's word; this host stores the wrapper's address here.
+  VstIntPtr resvd1;       ///< For the host's use; not used here.
+  VstIntPtr resvd2;       ///< For the host's use; this host stores the wrapper's address.
   VstInt32 initialDelay;  ///< Latency in samples.
   VstInt32 realQualities;
   VstInt32 offQualities;
   float ioRatio;
-  void* object;  ///< The plug-in's own.
-  void* user;    ///< The plug-in's own.
+  void* object;  ///< For the plug-in's use.
+  void* user;    ///< For the plug-in's use.
   VstInt32 uniqueID;
   VstInt32 version;  ///< In the plug-in's own format.
   AEffectProcessProc processReplacing;

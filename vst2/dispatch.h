@@ -1,16 +1,16 @@
 // SPDX-License-Identifier: MIT
-// The one door through which a request leaves the host.
+// The function through which the host makes every request of a plug-in.
 #pragma once
 
 #include "vst2/aeffect.h"
 #include "vst2/effect_opcodes.h"
 
-/// Makes one request of the plug-in and returns its answer unchanged. Whatever the plug-in throws passes
-/// through.
+/// Makes one request of the plug-in and returns its answer unchanged. What the plug-in throws
+/// reaches the caller.
 inline VstIntPtr dispatch(AEffect& effect, VstEffectOpcode opcode, VstInt32 index = 0, VstIntPtr value = 0,
                           void* ptr = nullptr, float opt = 0.0f) {
   return effect.dispatcher(&effect, opcode, index, value, ptr, opt);
 }
 
-/// A text that the plug-in only reads, as the interface's untyped pointer.
+/// A text that the plug-in only reads, as the untyped pointer that the interface demands.
 inline void* textArgument(const char* text) { return const_cast<char*>(text); }

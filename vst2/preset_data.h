@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: MIT
 // Preset and bank data: the big-endian layout of fxp and fxb files.
 //
-// The content that follows each record (parameter values, programs, or a size and a chunk) is reached through
-// the offsets below and not through sizeof, which depends on how a build packs records.
+// What follows each record (parameter values, programs, or a size and a chunk) is found by the offsets below
+// and not by sizeof, which depends on how a build packs records.
 #pragma once
 
 #include <cstddef>
@@ -15,7 +15,7 @@ constexpr VstInt32 kPresetParameterBankMagic = fourCharacterCode('F', 'x', 'B', 
 constexpr VstInt32 kPresetChunkProgramMagic = fourCharacterCode('F', 'P', 'C', 'h');
 constexpr VstInt32 kPresetChunkBankMagic = fourCharacterCode('F', 'B', 'C', 'h');
 
-/// The same in the other byte order.
+/// The same numbers in the other byte order.
 constexpr VstInt32 kReversedParameterBankMagic = fourCharacterCode('k', 'B', 'x', 'F');
 constexpr VstInt32 kReversedChunkProgramMagic = fourCharacterCode('h', 'C', 'P', 'F');
 constexpr VstInt32 kReversedChunkBankMagic = fourCharacterCode('h', 'C', 'B', 'F');

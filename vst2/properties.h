@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
 // The records that a plug-in fills to describe a pin or a parameter.
 //
-// Clear a record before every query: plug-ins fill it in part, and some write to it and then answer 0.
+// Clear a record before every query: plug-ins may fill only a part of it, or fill it and then answer 0.
 #pragma once
 
 #include "vst2/basic_types.h"

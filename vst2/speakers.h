@@ -53,7 +53,7 @@ struct VstSpeakerProperties {
   char future[28];
 };
 
-/// Variable in length: 8 entries are declared, numChannels may ask for more.
+/// Variable in length: 8 speakers are declared, but numChannels may be larger.
 struct VstSpeakerArrangement {
   VstInt32 type;  ///< VstSpeakerArrangementType
   VstInt32 numChannels;

@@ -18,8 +18,8 @@ namespace {
 
 unsigned char byteAt(std::string_view bytes, std::size_t i) { return static_cast<unsigned char>(bytes[i]); }
 
-// The well-formed sequences of UTF-8 by their first byte. The bounds of the second byte exclude overlong forms,
-// surrogates and everything above U+10FFFF; further bytes are 80..BF.
+// The well-formed sequences of UTF-8 by their first byte. The bounds of the second byte exclude overlong
+// forms, surrogates and everything above U+10FFFF; further bytes are 80..BF.
 struct SequenceForm {
   unsigned char lowestFirst, highestFirst, length, lowestSecond, highestSecond;
 };

@@ -14,8 +14,8 @@
 
 namespace core_foundation {
 
-/// The base of every object, at its front, so that a CFTypeRef of any kind can be released. No function of the
-/// header adds a reference: an object has one owner, and its release deletes the object.
+/// The base of every object, at its front, so that a CFTypeRef of any kind can be released. No function of
+/// the header adds a reference: an object has one owner, and its release deletes the object.
 class Object {
  public:
   /// kConstant: owned by nobody, and left alone by CFRelease.

@@ -11,8 +11,8 @@ namespace core_foundation {
 const char* architectureOfProgram();
 
 /// Why the file at `path` cannot be a shared object for this program, for people to read: "PATH is for i386,
-/// this program is for x86_64", or "PATH is a module for macOS, not a shared object for Linux". Nothing when its
-/// first bytes give no reason, or when it is not a readable regular file. Never waits for a pipe.
+/// this program is for x86_64", or "PATH is a module for macOS, not a shared object for Linux". Nothing when
+/// its first bytes give no reason, or when it is not a readable regular file. Never waits for a pipe.
 std::optional<std::string> whyNotForThisProgram(const std::string& path);
 
 }  // namespace core_foundation

@@ -2,16 +2,16 @@
 // Mach semaphores on futexes.
 //
 // A signal hands its token directly to a waiter: it takes the first waiter out of the queue and writes the
-// outcome into a word on that waiter's stack. With a plain POSIX semaphore the signalling thread could take its
-// token back at once, thousands of times in a row, while the waiter starves.
+// outcome into a word on that waiter's stack. With a plain POSIX semaphore the signalling thread could take
+// its token back at once, thousands of times in a row, while the waiter starves.
 //
 // Lifetimes:
-// - One lock guards the queues of all semaphores, and it outlives them. So a thread that received the last token
-//   may destroy the semaphore while the signalling thread has not yet returned from semaphore_signal(), and an
-//   interrupted waiter may look at its outcome after the semaphore is gone.
-// - As soon as an outcome is written, the waiter may return, and its word on the stack may be reused. The wake
-//   that follows passes only the word's address to the kernel. If another futex is at that address by then, it
-//   is woken without cause, which every user of a futex has to expect anyway.
+// - One lock guards the queues of all semaphores, and it outlives them. So a thread that received the last
+//   token may destroy the semaphore while the signalling thread has not yet returned from semaphore_signal(),
+//   and an interrupted waiter may look at its outcome after the semaphore is gone.
+// - As soon as an outcome is written, the waiter may return, and its word on the stack may be reused. The
+//   wake that follows passes only the word's address to the kernel. If another futex is at that address by
+//   then, it is woken without cause, which every user of a futex has to expect anyway.
 #include "platform/mach_semaphore.h"
 
 #include <atomic>
@@ -30,8 +30,8 @@ constexpr task_t kThisTask = 1;
 
 enum Outcome : std::uint32_t { kStillWaiting, kTokenReceived, kSemaphoreDestroyed };
 
-/// One sleeping thread; lives on its stack. `outcome` changes once, under the lock, by the thread that takes the
-/// waiter out of the queue.
+/// One sleeping thread; lives on its stack. `outcome` changes once, under the lock, by the thread that takes
+/// the waiter out of the queue.
 struct Waiter {
   std::atomic<std::uint32_t> outcome{kStillWaiting};
   Waiter* next = nullptr;
@@ -39,15 +39,15 @@ struct Waiter {
 
 std::mutex queuesLock;
 
-/// Sleeps while `word` holds kStillWaiting. False when a signal handler ended the sleep; after true the word may
-/// hold any outcome.
+/// Sleeps while `word` holds kStillWaiting. False when a signal handler ended the sleep; after true the word
+/// may hold any outcome.
 bool sleepOn(const std::atomic<std::uint32_t>& word) {
   const long result = syscall(SYS_futex, &word, FUTEX_WAIT_PRIVATE, kStillWaiting, nullptr, nullptr, 0);
   return result == 0 || errno != EINTR;
 }
 
-/// Ends the wait of a waiter that was taken out of its queue. The waiter may no longer exist when this returns.
-/// Call it with the lock held, then wake() with the result; the wake needs no lock.
+/// Ends the wait of a waiter that was taken out of its queue. The waiter may no longer exist when this
+/// returns. Call it with the lock held, then wake() with the result; the wake needs no lock.
 const void* settle(Waiter& waiter, Outcome outcome) {
   waiter.outcome.store(outcome, std::memory_order_release);
   return &waiter.outcome;
