@@ -171,8 +171,8 @@ TEST_F(MachSemaphore, AHandlerThatRestartsCallsDoesNotAbortTheWait) {
 std::atomic<bool> handlerEntered;
 std::atomic<bool> tokenGiven;
 
-// Keeps the interrupted thread in the handler until the token was given, at most 100 ms: a sanitizer may run a
-// handler later than the system does, while the thread holds a lock that the giving of the token needs.
+// Keeps the interrupted thread in the handler until the token was given, at most 100 ms: a sanitizer may run
+// a handler later than the system does, while the thread holds a lock that the giving of the token needs.
 void awaitToken(int) {
   handlerEntered = true;
   const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(100);

@@ -63,7 +63,8 @@ class CFBundle : public testing::Test {
     return loaded;
   }
 
-  // What a load that must fail writes to standard error: one line, returned without its beginning and its end.
+  // What a load that must fail writes to standard error: one line, returned without its beginning and its
+  // end.
   static std::string refusalOf(const std::string& path) {
     testing::internal::CaptureStderr();
     EXPECT_FALSE(loads(path)) << path;

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: MIT
-// No container is used while memory is recorded: its own memory would come out of what is recorded.
+// No container is used while calls are recorded: its memory would be recorded, too.
 #include "tests/shared/counted_memory.h"
 
+#include <cstddef>
 #include <cstdlib>
 #include <cstring>
 
@@ -14,64 +15,49 @@ void __wrap_free(void* block);
 
 namespace {
 
-struct Event {
-  enum class Kind { kMade, kFailed, kFreed, kFreedOther };
-  Kind kind;
+struct Call {
+  bool isMalloc;
   std::size_t sizeInBytes;
-  void* block;  // Null once freed: the address may come again.
+  void* block;  // Of a malloc: null when it failed and once the block is freed. Of a free: null for "other".
+  bool failed;
 };
 
 constexpr int kRoom = 1000;
-Event recorded[kRoom];
+Call recorded[kRoom];
 int recordedCount = 0;
 bool watching = false;
 bool exhausted = false;
 
-void record(Event::Kind kind, std::size_t sizeInBytes, void* block) {
+void record(const Call& call) {
   if (recordedCount == kRoom) std::abort();
-  recorded[recordedCount++] = {kind, sizeInBytes, block};
+  recorded[recordedCount++] = call;
 }
 
-Event* madeAs(void* block) {
-  for (int i = 0; i < recordedCount; ++i) {
-    if (recorded[i].kind == Event::Kind::kMade && recorded[i].block == block) return &recorded[i];
-  }
-  return nullptr;
-}
-
-std::string described(const Event& event) {
-  const std::string size = std::to_string(event.sizeInBytes);
-  switch (event.kind) {
-    case Event::Kind::kMade:
-      return "malloc " + size;
-    case Event::Kind::kFailed:
-      return "malloc " + size + " failed";
-    case Event::Kind::kFreed:
-      return "free " + size;
-    case Event::Kind::kFreedOther:
-      return "free other";
-  }
-  return "";
+std::string described(const Call& call) {
+  const std::string size = std::to_string(call.sizeInBytes);
+  if (call.isMalloc) return "malloc " + size + (call.failed ? " failed" : "");
+  return "free " + (call.block == nullptr ? "other" : size);
 }
 
 }  // namespace
 
 void* __wrap_malloc(std::size_t sizeInBytes) {
-  void* const block = watching && exhausted ? nullptr : __real_malloc(sizeInBytes);
-  if (watching && block != nullptr) std::memset(block, '#', sizeInBytes);
-  if (watching) record(block == nullptr ? Event::Kind::kFailed : Event::Kind::kMade, sizeInBytes, block);
+  if (!watching) return __real_malloc(sizeInBytes);
+  void* const block = exhausted ? nullptr : __real_malloc(sizeInBytes);
+  if (block != nullptr) std::memset(block, '#', sizeInBytes);
+  record({true, sizeInBytes, block, block == nullptr});
   return block;
 }
 
 void __wrap_free(void* block) {
   if (watching && block != nullptr) {
-    Event* const made = madeAs(block);
-    if (made != nullptr) {
-      made->block = nullptr;
-      record(Event::Kind::kFreed, made->sizeInBytes, nullptr);
-    } else {
-      record(Event::Kind::kFreedOther, 0, nullptr);
+    Call call{false, 0, nullptr, false};
+    for (int i = 0; i < recordedCount; ++i) {
+      if (!recorded[i].isMalloc || recorded[i].block != block) continue;
+      call = {false, recorded[i].sizeInBytes, block, false};
+      recorded[i].block = nullptr;  // The address may come again.
     }
+    record(call);
   }
   __real_free(block);
 }
@@ -92,12 +78,4 @@ std::vector<std::string> MemoryWatch::events() const {
   for (int i = 0; i < recordedCount; ++i) all.push_back(described(recorded[i]));
   watching = true;
   return all;
-}
-
-int MemoryWatch::blocksAlive() const {
-  int alive = 0;
-  for (int i = 0; i < recordedCount; ++i) {
-    if (recorded[i].kind == Event::Kind::kMade && recorded[i].block != nullptr) ++alive;
-  }
-  return alive;
 }

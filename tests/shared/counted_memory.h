@@ -1,16 +1,15 @@
 // SPDX-License-Identifier: MIT
-// The malloc and free of a test program, as the linker hands them over (--wrap): they record what passes
-// through and fail as told.
+// The malloc and free of a test program, which the linker leads here (--wrap): they record each call and fail
+// when a test says so.
 //
 //   const MemoryWatch watch;
 //   buffer.setSize(64);
 //   EXPECT_THAT(watch.events(), ElementsAre("malloc 64"));
 //
-// A block made under a watch is filled with #. One watch at a time, on one thread; without one, memory is as
-// ever.
+// A block made under a watch is filled with '#'. One watch at a time, on one thread; without a watch, malloc
+// and free are the system's.
 #pragma once
 
-#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -21,13 +20,10 @@ class MemoryWatch {
   MemoryWatch(const MemoryWatch&) = delete;
   MemoryWatch& operator=(const MemoryWatch&) = delete;
 
-  /// Every malloc from now on answers null.
+  /// Every malloc from now on returns null.
   void exhaust();
 
   /// What happened so far, in order: "malloc 64", "malloc 64 failed", "free 64", and "free other" for a block
-  /// that was not made under this watch. Freeing null is not shown.
+  /// that is not of this watch, or no longer. Freeing null is not shown.
   [[nodiscard]] std::vector<std::string> events() const;
-
-  /// How many of the blocks made under this watch are not freed yet.
-  [[nodiscard]] int blocksAlive() const;
 };

@@ -1,19 +1,19 @@
 // SPDX-License-Identifier: MIT
-// Another implementation of platform/core_foundation.h and platform/entry_point_name.h: it records every call,
-// and a test chooses which bundles exist, what they export and which locale the user has.
+// Another implementation of platform/core_foundation.h and platform/entry_point_name.h: it records every
+// call, and a test chooses which bundles exist, what they export and which locale the user has.
 //
 //   RecordingCoreFoundation core_foundation;   // a member of the test fixture
 //   core_foundation.addBundle("/b.vst", {{"VSTPluginMain", entry}});
 //   core_foundation.failStep(Step::kLoadExecutable);
 //   EXPECT_THAT(core_foundation.calls(), Contains("CFBundleLoadExecutable(\"/b.vst\") -> false"));
 //
-// The functions work on the latest RecordingCoreFoundation that exists and end the process when there is none.
-// Objects stay in memory after their release, so that a later use of them is found. A bundle that was kept from
-// an earlier test has the symbols that the present test gives to its path.
+// The functions work on the latest RecordingCoreFoundation that exists and end the process when there is
+// none. Objects stay in memory after their release, so that a later use of them is found. A bundle that was
+// kept from an earlier test has the symbols that the present test gives to its path.
 //
-// A use that crashes in the real CoreFoundation fails the test when the RecordingCoreFoundation is destroyed: of
-// a null object, of a released one, of one of another kind, and the release of an object that the caller does
-// not own.
+// A use that crashes in the real CoreFoundation fails the test when the RecordingCoreFoundation is destroyed:
+// of a null object, of a released one, of one of another kind, and the release of an object that the caller
+// does not own.
 //
 // Systems: those where platform/core_foundation.h declares the functions itself.
 #pragma once
@@ -96,8 +96,8 @@ class RecordingCoreFoundation {
   std::vector<std::string> callsOf(const std::string& function) const;
   void forgetCalls();
 
-  /// The objects made and not released, in order of creation, such as: bundle "/b.vst". Without constants and the
-  /// identifiers of locales.
+  /// The objects made and not released, in order of creation, such as: bundle "/b.vst". Without constants and
+  /// the identifiers of locales.
   std::vector<std::string> aliveObjects() const;
 
   struct State;  ///< Of the functions; defined with them.

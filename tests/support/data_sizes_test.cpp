@@ -1,14 +1,17 @@
 // SPDX-License-Identifier: MIT
-// Sizes of data whose counts come from a plug-in.
+// Sizes of data whose element counts come from a plug-in.
 #include <cstdint>
 #include <string>
 
 #include "gtest/gtest.h"
 #include "support/data_sizes.h"
+#include "tests/shared/thrown.h"
 
 namespace {
 
-struct FittingSize {
+constexpr int kThrows = -1;
+
+struct Size {
   std::string name;
   std::int64_t fixed;
   std::int32_t count;
@@ -16,52 +19,30 @@ struct FittingSize {
   int expected;
 };
 
-class SizeOrFail : public testing::TestWithParam<FittingSize> {};
+class SizeOrFail : public testing::TestWithParam<Size> {};
 
-TEST_P(SizeOrFail, IsTheFixedPartAndAllElements) {
-  EXPECT_EQ(sizeOrFail(GetParam().fixed, GetParam().count, GetParam().each), GetParam().expected);
+TEST_P(SizeOrFail, IsTheFixedPartAndAllElementsOrThrowsMinusOneAboveAnInt) {
+  int size = 0;
+  const auto thrown =
+      thrownInt([&] { size = sizeOrFail(GetParam().fixed, GetParam().count, GetParam().each); });
+  EXPECT_EQ(thrown.value_or(size), GetParam().expected);
+  EXPECT_EQ(thrown.has_value(), GetParam().expected == kThrows);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Fitting, SizeOrFail,
-    testing::Values(FittingSize{"NoElements", 56, 0, 4, 56}, FittingSize{"ThreeParameters", 56, 3, 4, 68},
-                    FittingSize{"FourProgramsOfTwoParameters", 156, 4, 64, 412},
-                    FittingSize{"NothingAtAll", 0, 0, 0, 0},
-                    FittingSize{"ElementsWithoutSize", 7, 2147483647, 0, 7},
-                    FittingSize{"NoElementsOfAHugeSize", 7, 0, 4294967295, 7},
-                    FittingSize{"TheLargestWithABigFixedPart", 2147483647, 0, 1, 2147483647},
-                    FittingSize{"TheLargestWithOneElement", 60, 1, 2147483587, 2147483647},
-                    FittingSize{"TheLargestChunk", 60, 2147483587, 1, 2147483647},
-                    FittingSize{"TheMostParameters", 56, 536870897, 4, 2147483644},
-                    FittingSize{"TheMostEmptyPrograms", 156, 38347919, 56, 2147483620}),
-    [](const auto& instance) { return instance.param.name; });
-
-struct ExcessiveSize {
-  std::string name;
-  std::int64_t fixed;
-  std::int32_t count;
-  std::int64_t each;
-};
-
-class SizeOrFailBeyondAnInt : public testing::TestWithParam<ExcessiveSize> {};
-
-TEST_P(SizeOrFailBeyondAnInt, ThrowsMinusOne) {
-  try {
-    sizeOrFail(GetParam().fixed, GetParam().count, GetParam().each);
-    FAIL() << "nothing thrown";
-  } catch (int thrown) {
-    EXPECT_EQ(thrown, -1);
-  }
-}
-
-INSTANTIATE_TEST_SUITE_P(Excessive, SizeOrFailBeyondAnInt,
-                         testing::Values(ExcessiveSize{"OneByteTooManyInTheFixedPart", 2147483648, 0, 0},
-                                         ExcessiveSize{"OneByteTooManyInTheChunk", 60, 2147483588, 1},
-                                         ExcessiveSize{"OneParameterTooMany", 56, 536870898, 4},
-                                         ExcessiveSize{"OneProgramTooMany", 156, 38347920, 56},
-                                         ExcessiveSize{"AllParametersThereAre", 56, 2147483647, 4},
-                                         ExcessiveSize{"ProductAbove32Bits", 156, 2147483647, 2147483647},
-                                         ExcessiveSize{"ElementsAbove32Bits", 0, 1, 4294967295}),
+INSTANTIATE_TEST_SUITE_P(Sizes, SizeOrFail,
+                         testing::Values(Size{"NothingAtAll", 0, 0, 0, 0}, Size{"NoElements", 56, 0, 4, 56},
+                                         Size{"ThreeParameters", 56, 3, 4, 68},
+                                         Size{"ElementsWithoutSize", 7, 2147483647, 0, 7},
+                                         Size{"NoElementsOfAHugeSize", 7, 0, 4294967295, 7},
+                                         Size{"TheLargestFixedPart", 2147483647, 0, 1, 2147483647},
+                                         Size{"TheLargestElement", 60, 1, 2147483587, 2147483647},
+                                         Size{"TheLargestChunk", 60, 2147483587, 1, 2147483647},
+                                         Size{"TheMostParameters", 56, 536870897, 4, 2147483644},
+                                         Size{"OneByteTooManyInTheFixedPart", 2147483648, 0, 0, kThrows},
+                                         Size{"OneByteTooManyInTheChunk", 60, 2147483588, 1, kThrows},
+                                         Size{"OneParameterTooMany", 56, 536870898, 4, kThrows},
+                                         Size{"ProductAbove32Bits", 156, 2147483647, 2147483647, kThrows},
+                                         Size{"ElementAbove32Bits", 0, 1, 4294967295, kThrows}),
                          [](const auto& instance) { return instance.param.name; });
 
 }  // namespace

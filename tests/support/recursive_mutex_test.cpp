@@ -1,24 +1,27 @@
 // SPDX-License-Identifier: MIT
-// The recursive lock, one or two threads at a time.
+// The recursive lock between real threads.
 #include <functional>
-#include <thread>
+#include <memory>
 #include <type_traits>
+#include <vector>
 
 #include <signal.h>
 
+#include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "support/atomic_add.h"
 #include "support/recursive_mutex.h"
 #include "tests/shared/observed_thread.h"
+#include "tests/support/start_together.h"
 
 namespace {
 
 static_assert(!std::is_copy_constructible_v<NiduCoreRecursiveMutex>);
 static_assert(!std::is_copy_assignable_v<NiduCoreRecursiveMutex>);
 
-class NiduCoreRecursiveMutexState : public testing::Test {
+class NiduCoreRecursiveMutexTest : public testing::Test {
  protected:
-  /// The counter, read in a way that is safe while other threads lock.
+  // The counter, read in a way that is safe while other threads lock.
   std::int32_t lockCount() { return AtomicAdd32Implementation(&mutex.lockCount, 0); }
   bool isOwnedByThisThread() const { return mutex.owner.IsEqual(NiduThreadID::CurrentThread()); }
   void expectFree() {
@@ -26,71 +29,19 @@ class NiduCoreRecursiveMutexState : public testing::Test {
     EXPECT_EQ(mutex.recursionDepth, 0);
     EXPECT_TRUE(mutex.owner.IsEqual(NiduThreadID()));
   }
-  static void onAnotherThread(const std::function<void()>& body) { std::thread(body).join(); }
-
   const NiduCoreRecursiveMutex mutex;
 };
 
-TEST_F(NiduCoreRecursiveMutexState, IsFreeAtFirst) { expectFree(); }
-
-TEST_F(NiduCoreRecursiveMutexState, FieldsStandInTheirOrder) {
+TEST_F(NiduCoreRecursiveMutexTest, StartsFreeWithItsFieldsInOrder) {
+  expectFree();
   const void* const fields[] = {&mutex.lockCount, &mutex.semaphore, &mutex.recursionDepth, &mutex.owner};
-  for (int field = 1; field < 4; ++field) {
-    EXPECT_TRUE(std::less<>()(fields[field - 1], fields[field])) << "field " << field;
-  }
+  for (int field = 1; field < 4; ++field) EXPECT_TRUE(std::less<>()(fields[field - 1], fields[field]));
 }
 
-TEST_F(NiduCoreRecursiveMutexState, RecursionCountsInItsDepthAlone) {
-  for (int depth = 0; depth < 3; ++depth) {
-    mutex.lock();
-    EXPECT_EQ(lockCount(), 1);
-    EXPECT_EQ(mutex.recursionDepth, depth);
-    EXPECT_TRUE(isOwnedByThisThread());
-  }
-  for (int depth = 2; depth > 0; --depth) {
-    mutex.unlock();
-    EXPECT_EQ(lockCount(), 1);
-    EXPECT_EQ(mutex.recursionDepth, depth - 1);
-    EXPECT_TRUE(isOwnedByThisThread());
-  }
-  mutex.unlock();
-  expectFree();
-}
-
-TEST_F(NiduCoreRecursiveMutexState, AFirstLockStartsWithoutDepth) {
-  mutex.recursionDepth = 5;
-  mutex.lock();
-  EXPECT_EQ(mutex.recursionDepth, 0);
-  mutex.unlock();
-  expectFree();
-}
-
-TEST_F(NiduCoreRecursiveMutexState, AnUnlockOfAFreeLockChangesNothing) {
-  mutex.unlock();
-  expectFree();
-  mutex.lock();
-  EXPECT_EQ(lockCount(), 1);
-  mutex.unlock();
-}
-
-TEST_F(NiduCoreRecursiveMutexState, AnUnlockByAnotherThreadChangesNothing) {
-  mutex.lock();
-  mutex.lock();
-  onAnotherThread([this] { mutex.unlock(); });
-  EXPECT_EQ(lockCount(), 1);
-  EXPECT_EQ(mutex.recursionDepth, 1);
-  EXPECT_TRUE(isOwnedByThisThread());
-  mutex.unlock();
-  mutex.unlock();
-  expectFree();
-}
-
-TEST_F(NiduCoreRecursiveMutexState, ASecondThreadSleepsUntilTheLastUnlockAndThenOwnsTheLockOnce) {
+TEST_F(NiduCoreRecursiveMutexTest, ASecondThreadSleepsUntilTheLastUnlockAndThenOwnsTheLockOnce) {
   std::int32_t depth = -1;
   bool owned = false;
-  mutex.lock();
-  mutex.lock();
-  mutex.lock();
+  for (int lock = 0; lock < 3; ++lock) mutex.lock();
   ObservedThread second([&] {
     mutex.lock();
     depth = mutex.recursionDepth;
@@ -108,24 +59,26 @@ TEST_F(NiduCoreRecursiveMutexState, ASecondThreadSleepsUntilTheLastUnlockAndThen
   expectFree();
 }
 
-TEST_F(NiduCoreRecursiveMutexState, AThreadThatUnlocksAndLocksAgainComesAfterTheOneThatWaits) {
-  for (int round = 0; round < 20; ++round) {
-    bool ran = false;
-    mutex.lock();
-    ObservedThread waiting([&] {
+TEST_F(NiduCoreRecursiveMutexTest, ThreadsGetTheLockInOrderOfArrivalBeforeOneThatUnlocksAndLocksAgain) {
+  std::vector<int> order;
+  std::vector<std::unique_ptr<ObservedThread>> threads;
+  mutex.lock();
+  for (int thread = 0; thread < 5; ++thread) {
+    threads.push_back(std::make_unique<ObservedThread>([&, thread] {
       mutex.lock();
-      ran = true;
+      order.push_back(thread);
       mutex.unlock();
-    });
-    ASSERT_TRUE(waiting.isSeenAsleep());
-    mutex.unlock();
-    mutex.lock();
-    EXPECT_TRUE(ran) << "round " << round;
-    mutex.unlock();
+    }));
+    ASSERT_TRUE(threads.back()->isSeenAsleep());
   }
+  mutex.unlock();
+  mutex.lock();
+  order.push_back(5);
+  mutex.unlock();
+  EXPECT_THAT(order, testing::ElementsAre(0, 1, 2, 3, 4, 5));
 }
 
-TEST_F(NiduCoreRecursiveMutexState, AnInterruptedThreadGoesOnWaiting) {
+TEST_F(NiduCoreRecursiveMutexTest, AThreadThatASignalHandlerInterruptsGoesOnWaiting) {
   installInterruptHandlers();
   bool held = true;
   bool sawItHeld = true;
@@ -140,7 +93,6 @@ TEST_F(NiduCoreRecursiveMutexState, AnInterruptedThreadGoesOnWaiting) {
     waiting.interrupt(SIGUSR1);
   }
   ASSERT_TRUE(waiting.isSeenAsleep());
-  EXPECT_TRUE(isOwnedByThisThread());
   held = false;
   mutex.unlock();
   waiting.join();
@@ -148,11 +100,31 @@ TEST_F(NiduCoreRecursiveMutexState, AnInterruptedThreadGoesOnWaiting) {
   expectFree();
 }
 
+TEST_F(NiduCoreRecursiveMutexTest, LosesNoIncrementOfEightThreadsSomeOfWhichUnlockWhatTheyDoNotHold) {
+  int sum = 0;
+  int inside = 0;
+  int meetings = 0;
+  runTogether(8, [&](int thread) {
+    for (int i = 0; i < 5000; ++i) {
+      if (thread % 2 == 0) mutex.unlock();
+      mutex.lock();
+      if (++inside != 1) ++meetings;
+      mutex.lock();
+      ++sum;
+      mutex.unlock();
+      --inside;
+      mutex.unlock();
+    }
+  });
+  EXPECT_EQ(sum, 40000);
+  EXPECT_EQ(meetings, 0);
+  expectFree();
+}
+
 TEST(NiduCoreRecursiveMutex, MayBeDestroyedWhileLocked) {
   NiduCoreRecursiveMutex mutex;
   mutex.lock();
-  mutex.lock();
-  EXPECT_EQ(mutex.recursionDepth, 1);
+  EXPECT_EQ(mutex.lockCount, 1);
 }
 
 }  // namespace

@@ -7,35 +7,23 @@
 
 namespace {
 
-TEST(NiduThreadID, TwoNullValuesAreEqual) {
-  const NiduThreadID one;
-  const NiduThreadID other;
-  EXPECT_TRUE(one.IsEqual(other));
-}
-
-TEST(NiduThreadID, ANullAndANonNullValueAreNotEqual) {
+TEST(NiduThreadID, NullEqualsOnlyNull) {
   const NiduThreadID null;
   const NiduThreadID current = NiduThreadID::CurrentThread();
+  EXPECT_TRUE(null.IsEqual(NiduThreadID()));
   EXPECT_FALSE(null.IsEqual(current));
   EXPECT_FALSE(current.IsEqual(null));
 }
 
-TEST(NiduThreadID, AThreadIsEqualToItself) {
-  EXPECT_TRUE(NiduThreadID::CurrentThread().IsEqual(NiduThreadID::CurrentThread()));
-}
-
-TEST(NiduThreadID, TwoThreadsThatBothLiveAreNotEqual) {
+TEST(NiduThreadID, AThreadEqualsItselfAndNoOtherThatLives) {
   const NiduThreadID mine = NiduThreadID::CurrentThread();
-  std::thread([&] {
-    EXPECT_FALSE(mine.IsEqual(NiduThreadID::CurrentThread()));
-    EXPECT_FALSE(NiduThreadID::CurrentThread().IsEqual(mine));
-  }).join();
+  EXPECT_TRUE(mine.IsEqual(NiduThreadID::CurrentThread()));
+  std::thread([&] { EXPECT_FALSE(mine.IsEqual(NiduThreadID::CurrentThread())); }).join();
 }
 
-TEST(NiduThreadID, AssignmentAndCopyTakeTheValueOver) {
+TEST(NiduThreadID, CopiesAndAssignmentsHaveTheValueOfTheOriginal) {
   NiduThreadID value;
   value = NiduThreadID::CurrentThread();
-  EXPECT_TRUE(value.IsEqual(NiduThreadID::CurrentThread()));
   const NiduThreadID copy(value);
   value = NiduThreadID();
   EXPECT_TRUE(value.IsEqual(NiduThreadID()));
