@@ -10,6 +10,7 @@
 #include "gtest/gtest.h"
 #include "loader/module_loader.h"
 #include "tests/loader/loader_fixture.h"
+#include "tests/shared/thrown.h"
 
 namespace {
 
@@ -17,57 +18,36 @@ using doubles::Step;
 using testing::ElementsAre;
 using testing::ElementsAreArray;
 using testing::IsEmpty;
-using testing::SizeIs;
 
 using Calls = std::vector<std::string>;
 
-class VSTPluginLoaderLoad : public LoaderFixture {};
-class VSTPluginLoaderEntry : public LoaderFixture {};
-class VSTPluginLoaderEnd : public LoaderFixture {};
+class VSTPluginLoaderTest : public LoaderFixture {
+ protected:
+  VSTPluginLoaderTest() { core_foundation.addBundle("/b.vst", {}); }
+};
 
-int anEntry() { return 1; }
-int anotherEntry() { return 2; }
-int aThirdEntry() { return 3; }
-
-TEST_F(VSTPluginLoaderLoad, AsksForEachStepInOrderAndReleasesStringAndUrlAtOnce) {
-  core_foundation.addBundle("/b.vst", {});
-  const VSTPluginLoader loader(test("/b.vst"));
+TEST_F(VSTPluginLoaderTest, AsksForEachStepInOrderAndReleasesStringAndUrlAtOnce) {
+  const VSTPluginLoader loader(VST_DLL_Info(std::string("/b.vst\0.more", 12), "test"));
   EXPECT_THAT(core_foundation.calls(),
               ElementsAre("CFStringCreateWithCString(\"/b.vst\", UTF-8) -> string",
                           "CFURLCreateWithFileSystemPath(\"/b.vst\", POSIX, file) -> URL",
                           "CFRelease(string \"/b.vst\")", "CFBundleCreate(\"/b.vst\") -> bundle",
                           "CFRelease(URL \"/b.vst\")", "CFBundleLoadExecutable(\"/b.vst\") -> true"));
   EXPECT_THAT(core_foundation.aliveObjects(), ElementsAre("bundle \"/b.vst\""));
-  EXPECT_NE(loader.bundle, nullptr);
-}
-
-TEST_F(VSTPluginLoaderLoad, CountsOneReferenceAndCachesNothing) {
-  core_foundation.addBundle("/b.vst", {});
-  const VSTPluginLoader loader(test("/b.vst"));
-  EXPECT_EQ(loader.refCount, 1u);
   EXPECT_THAT(cachedPaths(), IsEmpty());
 }
 
-TEST_F(VSTPluginLoaderLoad, KeepsACopyOfTheIdentity) {
-  core_foundation.addBundle("/b.vst", {});
+TEST_F(VSTPluginLoaderTest, HoldsTheBundleACopyOfTheIdentityAndACountOfOneInThisOrder) {
   VST_DLL_Info identity("/b.vst", "Reverb");
   identity.dllTag = 0x123456789ABCDEF0;
   const VSTPluginLoader loader(identity);
   identity = VST_DLL_Info("/gone.vst", "gone");
+  EXPECT_NE(loader.bundle, nullptr);
   EXPECT_EQ(loader.info.path, "/b.vst");
   EXPECT_EQ(loader.info.effectName, "Reverb");
   EXPECT_EQ(loader.info.dllTag, 0x123456789ABCDEF0);
-}
+  EXPECT_EQ(loader.refCount, 1u);
 
-TEST_F(VSTPluginLoaderLoad, HandsThePathOverUpToItsFirstZeroByte) {
-  core_foundation.addBundle("/\xC3\xA9.vst", {});
-  const VSTPluginLoader loader(test(std::string("/\xC3\xA9.vst\0.more", 13)));
-  EXPECT_EQ(core_foundation.calls().front(), "CFStringCreateWithCString(\"/\xC3\xA9.vst\", UTF-8) -> string");
-}
-
-TEST_F(VSTPluginLoaderLoad, IsNotPolymorphicAndKeepsItsFieldsInOrder) {
-  core_foundation.addBundle("/b.vst", {});
-  const VSTPluginLoader loader(test("/b.vst"));
   EXPECT_FALSE(std::is_polymorphic_v<VSTPluginLoader>);
   EXPECT_EQ(static_cast<const void*>(&loader.bundle), static_cast<const void*>(&loader));
   EXPECT_EQ(reinterpret_cast<const char*>(&loader.info) - reinterpret_cast<const char*>(&loader),
@@ -75,155 +55,124 @@ TEST_F(VSTPluginLoaderLoad, IsNotPolymorphicAndKeepsItsFieldsInOrder) {
   EXPECT_LT(static_cast<const void*>(&loader.info), static_cast<const void*>(&loader.refCount));
 }
 
-struct FailingStep {
-  const char* name;
-  std::optional<Step> step;  // None: the bundle itself has no executable.
-  Calls calls;
-  Calls alive;
-};
-
-class VSTPluginLoaderFailure : public LoaderFixture, public testing::WithParamInterface<FailingStep> {
- protected:
-  void SetUp() override {
-    LoaderFixture::SetUp();
-    if (GetParam().step) {
-      core_foundation.addBundle("/b.vst", {{"VSTPluginMain", anEntry}});
-      core_foundation.failStep(*GetParam().step);
-    } else {
-      core_foundation.addBundleWithoutExecutable("/b.vst");
-    }
-  }
-};
-
-TEST_P(VSTPluginLoaderFailure, ThrowsMinusOneAndCachesNothing) {
-  EXPECT_EQ(intThrownBy([] { VSTPluginLoader::demandLoadedPlugin(test("/b.vst")); }), -1);
-  EXPECT_THAT(cachedPaths(), IsEmpty());
-  EXPECT_THAT(core_foundation.calls(), ElementsAreArray(GetParam().calls));
-  EXPECT_THAT(core_foundation.aliveObjects(), ElementsAreArray(GetParam().alive));
-}
-
-TEST_P(VSTPluginLoaderFailure, ThrowsMinusOneFromTheConstructor) {
-  EXPECT_EQ(intThrownBy([] { const VSTPluginLoader loader(test("/b.vst")); }), -1);
-  EXPECT_THAT(core_foundation.calls(), ElementsAreArray(GetParam().calls));
-  EXPECT_THAT(core_foundation.aliveObjects(), ElementsAreArray(GetParam().alive));
-}
-
-TEST_P(VSTPluginLoaderFailure, IsForgottenOnTheNextDemand) {
-  EXPECT_EQ(intThrownBy([] { VSTPluginLoader::demandLoadedPlugin(test("/b.vst")); }), -1);
-  if (GetParam().step) core_foundation.mendStep(*GetParam().step);
-  core_foundation.addBundle("/b.vst", {});
-  const auto loader = VSTPluginLoader::demandLoadedPlugin(test("/b.vst"));
-  EXPECT_EQ(loader->info.path, "/b.vst");
-  EXPECT_THAT(cachedPaths(), ElementsAre("/b.vst"));
-}
-
-const Calls kStringFails = {"CFStringCreateWithCString(\"/b.vst\", UTF-8) -> null"};
-const Calls kUrlFails = {"CFStringCreateWithCString(\"/b.vst\", UTF-8) -> string",
-                         "CFURLCreateWithFileSystemPath(\"/b.vst\", POSIX, file) -> null",
-                         "CFRelease(string \"/b.vst\")"};
-const Calls kBundleFails = {"CFStringCreateWithCString(\"/b.vst\", UTF-8) -> string",
-                            "CFURLCreateWithFileSystemPath(\"/b.vst\", POSIX, file) -> URL",
-                            "CFRelease(string \"/b.vst\")", "CFBundleCreate(\"/b.vst\") -> null",
-                            "CFRelease(URL \"/b.vst\")"};
-const Calls kLoadFails = {"CFStringCreateWithCString(\"/b.vst\", UTF-8) -> string",
-                          "CFURLCreateWithFileSystemPath(\"/b.vst\", POSIX, file) -> URL",
-                          "CFRelease(string \"/b.vst\")",
-                          "CFBundleCreate(\"/b.vst\") -> bundle",
-                          "CFRelease(URL \"/b.vst\")",
-                          "CFBundleLoadExecutable(\"/b.vst\") -> false"};
-
-// The bundle whose executable does not load is kept: neither unloaded nor released.
-INSTANTIATE_TEST_SUITE_P(
-    Steps, VSTPluginLoaderFailure,
-    testing::Values(FailingStep{"String", Step::kCreateString, kStringFails, {}},
-                    FailingStep{"Url", Step::kCreateUrl, kUrlFails, {}},
-                    FailingStep{"Bundle", Step::kCreateBundle, kBundleFails, {}},
-                    FailingStep{"Load", Step::kLoadExecutable, kLoadFails, {"bundle \"/b.vst\""}},
-                    FailingStep{"NoExecutable", std::nullopt, kLoadFails, {"bundle \"/b.vst\""}}),
-    [](const auto& tested) { return std::string(tested.param.name); });
-
-TEST_F(VSTPluginLoaderLoad, APathWhereNothingIsThrowsMinusOneAndCachesNothing) {
-  EXPECT_EQ(intThrownBy([] { VSTPluginLoader::demandLoadedPlugin(test("/nowhere.vst")); }), -1);
-  EXPECT_THAT(cachedPaths(), IsEmpty());
-  EXPECT_THAT(core_foundation.aliveObjects(), IsEmpty());
-}
-
-struct Exports {
-  const char* name;
-  std::vector<std::string> names;
-  std::optional<std::string> systemName;
-  std::vector<std::string> asked;
-  int (*chosen)();
-};
-
-class VSTPluginLoaderMainEntry : public LoaderFixture, public testing::WithParamInterface<Exports> {};
-
-TEST_P(VSTPluginLoaderMainEntry, IsTheFirstOfTheNamesInOrder) {
-  doubles::SymbolTable symbols;
-  for (const std::string& name : GetParam().names) {
-    int (*const function)() = name == "VSTPluginMain" ? anEntry
-                              : name == "main_macho"  ? anotherEntry
-                                                      : aThirdEntry;
-    symbols.emplace(name, function);
-  }
-  core_foundation.addBundle("/b.vst", symbols);
-  core_foundation.setSystemEntryPointName(GetParam().systemName);
-  VSTPluginLoader loader(test("/b.vst"));
-  core_foundation.forgetCalls();
-
-  EXPECT_EQ(loader.getMainEntry(), reinterpret_cast<void*>(GetParam().chosen));
-  Calls expected;
-  for (const std::string& name : GetParam().asked) {
-    const bool found = &name == &GetParam().asked.back() && GetParam().chosen != nullptr;
-    expected.push_back("CFBundleGetFunctionPointerForName(\"/b.vst\", \"" + name + "\") -> " +
-                       (found ? "function" : "null"));
-  }
-  EXPECT_THAT(core_foundation.calls(), ElementsAreArray(expected));
-}
-
-const std::vector<std::string> kFirst = {"VSTPluginMain"};
-const std::vector<std::string> kTwo = {"VSTPluginMain", "main_macho"};
-const std::vector<std::string> kThree = {"VSTPluginMain", "main_macho", "main"};
-
-INSTANTIATE_TEST_SUITE_P(
-    Exports, VSTPluginLoaderMainEntry,
-    testing::Values(
-        Exports{"VSTPluginMainOnly", {"VSTPluginMain"}, "main", kFirst, anEntry},
-        Exports{"VSTPluginMainWins", {"main", "main_macho", "VSTPluginMain"}, "main", kFirst, anEntry},
-        Exports{"MainMachoOnly", {"main_macho"}, "main", kTwo, anotherEntry},
-        Exports{"MainMachoBeforeTheSystems", {"main", "main_macho"}, "main", kTwo, anotherEntry},
-        Exports{"TheSystemsLast", {"main"}, "main", kThree, aThirdEntry},
-        Exports{"NoNameOfTheSystem", {"main"}, std::nullopt, kTwo, nullptr},
-        Exports{"MainMachoWhereTheSystemHasNone", {"main_macho"}, std::nullopt, kTwo, anotherEntry},
-        Exports{"None", {"vstpluginmain", "other"}, "main", kThree, nullptr}),
-    [](const auto& tested) { return std::string(tested.param.name); });
-
-TEST_F(VSTPluginLoaderEntry, IsAskedForAnewEachTime) {
-  core_foundation.addBundle("/b.vst", {{"VSTPluginMain", anEntry}});
-  VSTPluginLoader loader(test("/b.vst"));
-  EXPECT_EQ(loader.getMainEntry(), loader.getMainEntry());
-  EXPECT_THAT(core_foundation.callsOf("CFBundleGetFunctionPointerForName"), SizeIs(2));
-}
-
-TEST_F(VSTPluginLoaderEnd, UnloadsTheBundleAndThenReleasesIt) {
-  core_foundation.addBundle("/b.vst", {});
+TEST_F(VSTPluginLoaderTest, ItsDestructorUnloadsTheBundleAndThenReleasesIt) {
   {
-    const VSTPluginLoader loader(test("/b.vst"));
+    const VSTPluginLoader loader(VST_DLL_Info("/b.vst", "test"));
     core_foundation.forgetCalls();
   }
   EXPECT_THAT(core_foundation.calls(),
               ElementsAre("CFBundleUnloadExecutable(\"/b.vst\")", "CFRelease(bundle \"/b.vst\")"));
-  EXPECT_THAT(core_foundation.aliveObjects(), IsEmpty());
 }
 
-TEST_F(VSTPluginLoaderEnd, DoesNothingWithoutABundle) {
-  core_foundation.addBundle("/b.vst", {});
+TEST_F(VSTPluginLoaderTest, ItsDestructorDoesNothingWithoutABundle) {
   {
-    VSTPluginLoader loader(test("/b.vst"));
+    VSTPluginLoader loader(VST_DLL_Info("/b.vst", "test"));
     loader.bundle = nullptr;
     core_foundation.forgetCalls();
   }
   EXPECT_THAT(core_foundation.calls(), IsEmpty());
 }
+
+struct FailingStep {
+  const char* name;
+  Step step;
+  Calls calls;
+  Calls alive;
+};
+
+class VSTPluginLoaderFailure : public VSTPluginLoaderTest, public testing::WithParamInterface<FailingStep> {};
+
+TEST_P(VSTPluginLoaderFailure, ThrowsMinusOneCachesNothingAndIsForgottenOnTheNextDemand) {
+  core_foundation.failStep(GetParam().step);
+  EXPECT_EQ(thrownInt([] { demand("/b.vst"); }), -1);
+  EXPECT_THAT(cachedPaths(), IsEmpty());
+  EXPECT_THAT(core_foundation.calls(), ElementsAreArray(GetParam().calls));
+  EXPECT_THAT(core_foundation.aliveObjects(), ElementsAreArray(GetParam().alive));
+
+  core_foundation.mendStep(GetParam().step);
+  EXPECT_EQ(demand("/b.vst")->info.path, "/b.vst");
+  EXPECT_THAT(cachedPaths(), ElementsAre("/b.vst"));
+}
+
+const std::string kString = "CFStringCreateWithCString(\"/b.vst\", UTF-8) -> ";
+const std::string kUrl = "CFURLCreateWithFileSystemPath(\"/b.vst\", POSIX, file) -> ";
+const std::string kStringReleased = "CFRelease(string \"/b.vst\")";
+const std::string kBundle = "CFBundleCreate(\"/b.vst\") -> ";
+const std::string kUrlReleased = "CFRelease(URL \"/b.vst\")";
+const std::string kLoad = "CFBundleLoadExecutable(\"/b.vst\") -> ";
+
+// The bundle whose executable does not load is kept: neither unloaded nor released.
+INSTANTIATE_TEST_SUITE_P(
+    Steps, VSTPluginLoaderFailure,
+    testing::Values(
+        FailingStep{"String", Step::kCreateString, {kString + "null"}, {}},
+        FailingStep{"Url", Step::kCreateUrl, {kString + "string", kUrl + "null", kStringReleased}, {}},
+        FailingStep{"Bundle",
+                    Step::kCreateBundle,
+                    {kString + "string", kUrl + "URL", kStringReleased, kBundle + "null", kUrlReleased},
+                    {}},
+        FailingStep{"Load",
+                    Step::kLoadExecutable,
+                    {kString + "string", kUrl + "URL", kStringReleased, kBundle + "bundle", kUrlReleased,
+                     kLoad + "false"},
+                    {"bundle \"/b.vst\""}}),
+    [](const auto& tested) { return tested.param.name; });
+
+struct Exports {
+  const char* name;
+  std::vector<std::string> names;
+  std::optional<std::string> systemName;
+  std::string asked;  // The names that are asked for; the last one is found unless `found` is "".
+  std::string found;
+};
+
+class VSTPluginLoaderMainEntry : public LoaderFixture, public testing::WithParamInterface<Exports> {};
+
+TEST_P(VSTPluginLoaderMainEntry, IsTheFirstOfTheNamesInOrder) {
+  static int addresses[3];
+  doubles::SymbolTable symbols;
+  for (const std::string& name : GetParam().names)
+    symbols.emplace(name, static_cast<void*>(&addresses[name == "main" ? 0 : name == "main_macho" ? 1 : 2]));
+  core_foundation.addBundle("/b.vst", symbols);
+  core_foundation.setSystemEntryPointName(GetParam().systemName);
+  VSTPluginLoader loader(VST_DLL_Info("/b.vst", "test"));
+  core_foundation.forgetCalls();
+
+  const auto found = symbols.find(GetParam().found);
+  EXPECT_EQ(loader.getMainEntry(), found == symbols.end() ? nullptr : found->second.get());
+  std::string asked;
+  for (const std::string& call : core_foundation.calls())
+    asked += call.substr(sizeof "CFBundleGetFunctionPointerForName(\"/b.vst\", " - 1) + "; ";
+  EXPECT_EQ(asked, GetParam().asked);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Exports, VSTPluginLoaderMainEntry,
+    testing::Values(Exports{"VSTPluginMainWins",
+                            {"main", "main_macho", "VSTPluginMain"},
+                            "main",
+                            "\"VSTPluginMain\") -> function; ",
+                            "VSTPluginMain"},
+                    Exports{"MainMachoBeforeTheSystems",
+                            {"main", "main_macho"},
+                            "main",
+                            "\"VSTPluginMain\") -> null; \"main_macho\") -> function; ",
+                            "main_macho"},
+                    Exports{"TheSystemsLast",
+                            {"main"},
+                            "main",
+                            "\"VSTPluginMain\") -> null; \"main_macho\") -> null; \"main\") -> function; ",
+                            "main"},
+                    Exports{"NoNameOfTheSystem",
+                            {"main"},
+                            std::nullopt,
+                            "\"VSTPluginMain\") -> null; \"main_macho\") -> null; ",
+                            ""},
+                    Exports{"None",
+                            {"vstpluginmain"},
+                            "main",
+                            "\"VSTPluginMain\") -> null; \"main_macho\") -> null; \"main\") -> null; ",
+                            ""}),
+    [](const auto& tested) { return tested.param.name; });
 
 }  // namespace
