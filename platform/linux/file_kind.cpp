@@ -4,10 +4,8 @@
 
 #include <cstddef>
 #include <cstdio>
-#include <filesystem>
 #include <memory>
 #include <string_view>
-#include <system_error>
 
 #include <elf.h>
 
@@ -52,10 +50,8 @@ constexpr Format kOtherFormats[] = {
     {"#!", "a script"},
 };
 
-// The first bytes of the regular file at `path`, at most kNeededInBytes; empty when it cannot be read.
+// The first bytes of the file at `path`, at most kNeededInBytes; empty when it cannot be read.
 std::string beginningOf(const std::string& path) {
-  std::error_code error;
-  if (!std::filesystem::is_regular_file(path, error)) return {};
   const std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rbe"), &std::fclose);
   char bytes[kNeededInBytes];
   return file ? std::string(bytes, std::fread(bytes, 1, sizeof bytes, file.get())) : std::string();
