@@ -47,8 +47,8 @@ constexpr CFURLPathStyle kCFURLPOSIXPathStyle = 0;
 /// Destroys `object`, which must not be null. Leaves constants alone.
 void CFRelease(CFTypeRef object);
 
-/// The constant string with the text of a literal; equal texts give the same object. It is owned by nobody
-/// and never destroyed.
+/// The constant string with the text of a literal; equal texts give the same object. It has no owner and is
+/// never destroyed.
 #define CFSTR(literal) __CFStringMakeConstantString("" literal "")
 
 /// What CFSTR calls; not called by name.

@@ -5,5 +5,5 @@
 #include "platform/core_foundation.h"
 
 /// The name to look for after those that all systems share: "main" on Linux, null (no such name) on macOS. A
-/// constant string, owned by nobody.
+/// constant string.
 CFStringRef systemEntryPointName();

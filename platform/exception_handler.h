@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The system's handler for exceptions that nobody caught, and the pool and delegate that belong to it.
+// The system's handler for uncaught exceptions, and the pool and delegate that belong to it.
 //
 // - On macOS: Foundation's NSAutoreleasePool and NSExceptionHandler. The handler asks its Objective-C++
 //   delegate whether to display an exception (no), to log it (yes), and to handle it (the process exits).

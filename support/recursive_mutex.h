@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A lock that its owner may take again, cheap while nobody else wants it.
+// A lock that its owner may take again; cheap while no other thread wants it.
 //
 // The first lock costs one atomic addition, each further one by the owner none. Only a thread that has to
 // wait, and the one that wakes it, call the kernel. Waiting threads get the lock in order of arrival.

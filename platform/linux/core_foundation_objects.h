@@ -18,7 +18,7 @@ namespace core_foundation {
 /// the header adds a reference: an object has one owner, and its release deletes the object.
 class Object {
  public:
-  /// kConstant: owned by nobody, and left alone by CFRelease.
+  /// kConstant: has no owner; CFRelease does nothing to it.
   enum class Lifetime { kOwned, kConstant };
 
   Object(const Object&) = delete;

@@ -21,7 +21,8 @@ namespace {
 std::string currentIdentifier() {
   std::string_view locale;
   for (const char* variable : {"LC_ALL", "LC_MESSAGES", "LANG"}) {
-    const char* const value = std::getenv(variable);  // NOLINT(concurrency-mt-unsafe): nobody here sets any
+    const char* const value =
+        std::getenv(variable);  // NOLINT(concurrency-mt-unsafe): the program never sets any
     if (value != nullptr) locale = value;
     if (!locale.empty()) break;
   }

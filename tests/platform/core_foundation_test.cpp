@@ -139,7 +139,7 @@ struct Environment {
 };
 class CFLocaleCopyCurrentTest : public testing::TestWithParam<Environment> {};
 
-// Keeps one of its two locales for ever; the leak check of the sanitizer build looks on.
+// Never releases one of its two locales: the leak check of the sanitizer build must not report it.
 TEST_P(CFLocaleCopyCurrentTest, TakesTheFirstVariableThatIsSet) {
   const auto set = [](const char* variable, const char* value) {
     value == nullptr ? unsetenv(variable) : setenv(variable, value, 1);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// Threads under observation, by what /proc says of them.
+// Threads whose state is read from /proc.
 #include "tests/shared/observed_thread.h"
 
 #include <array>

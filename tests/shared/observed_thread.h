@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: MIT
-// A thread that runs one body, and can be seen asleep on a futex and be interrupted there.
+// A thread that runs one function. A test can see that it sleeps on a futex, and interrupt it there.
 //
-// Sleeping for a while in a test proves nothing about who waits; asking the kernel does.
+// A test that only sleeps for a while cannot know that another thread waits by then; the kernel does.
 #pragma once
 
 #include <atomic>
@@ -9,7 +9,7 @@
 #include <string>
 #include <thread>
 
-/// Signal handlers for interrupt(): SIGUSR1 cuts a sleep short, SIGUSR2 (SA_RESTART) lets it go on.
+/// Installs handlers for interrupt(): SIGUSR1 ends a sleep, SIGUSR2 (SA_RESTART) lets it go on.
 void installInterruptHandlers();
 
 class ObservedThread {

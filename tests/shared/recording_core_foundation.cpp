@@ -19,7 +19,7 @@ using doubles::SymbolTable;
 namespace {
 
 enum class Kind { kString, kUrl, kBundle, kLocale };
-enum class Owner { kCaller, kSomebodyElse, kNobodyAnyMore };
+enum class Owner { kCaller, kOther, kReleased };
 
 // One object behind the opaque pointers of CoreFoundation.
 struct Object {
@@ -71,7 +71,7 @@ struct RecordingCoreFoundation::State {
     const char* problem = nullptr;
     if (object == nullptr) {
       problem = " of ";
-    } else if (object->owner == Owner::kNobodyAnyMore) {
+    } else if (object->owner == Owner::kReleased) {
       problem = " of a released ";
     } else if (kind && object->kind != *kind) {
       problem = " of a ";
@@ -178,19 +178,18 @@ void CFRelease(CFTypeRef object) {
   world().record("CFRelease", described(argument(object)));
   Object* const used = world().use("CFRelease", object);
   if (used == nullptr) return;
-  if (used->owner == Owner::kSomebodyElse) {
-    world().misuses.push_back("CFRelease of somebody else's " + described(used));
+  if (used->owner == Owner::kOther) {
+    world().misuses.push_back("CFRelease of another owner's " + described(used));
     return;
   }
-  used->owner = Owner::kNobodyAnyMore;
-  if (used->identifier != nullptr) used->identifier->owner = Owner::kNobodyAnyMore;
+  used->owner = Owner::kReleased;
+  if (used->identifier != nullptr) used->identifier->owner = Owner::kReleased;
 }
 
 CFStringRef __CFStringMakeConstantString(const char* text) {
   static auto& constants = *new std::map<std::string, Object>;
   return referenceTo<CFStringRef>(
-      &constants.try_emplace(text, Object{Kind::kString, text, Owner::kSomebodyElse, false, nullptr})
-           .first->second);
+      &constants.try_emplace(text, Object{Kind::kString, text, Owner::kOther, false, nullptr}).first->second);
 }
 
 CFStringRef CFStringCreateWithCString(CFAllocatorRef allocator, const char* text, CFStringEncoding encoding) {
@@ -271,7 +270,7 @@ void CFBundleUnloadExecutable(CFBundleRef bundle) {
 
 CFLocaleRef CFLocaleCopyCurrent() {
   Object* const locale = world().made(make(Kind::kLocale, world().locale));
-  locale->identifier = make(Kind::kString, world().locale, Owner::kSomebodyElse);
+  locale->identifier = make(Kind::kString, world().locale, Owner::kOther);
   world().record("CFLocaleCopyCurrent", "", "locale");
   return referenceTo<CFLocaleRef>(locale);
 }

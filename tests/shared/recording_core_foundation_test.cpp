@@ -100,7 +100,7 @@ INSTANTIATE_TEST_SUITE_P(
                            [] { CFBundleCreate(nullptr, reinterpret_cast<CFURLRef>(makeString("path"))); },
                            "CFBundleCreate of a string \"path\""},
                     Misuse{"AnotherOwner", [] { CFRelease(CFLocaleGetIdentifier(CFLocaleCopyCurrent())); },
-                           "CFRelease of somebody else's string \"en_US\""}),
+                           "CFRelease of another owner's string \"en_US\""}),
     [](const auto& test) { return test.param.name; });
 
 TEST(RecordingCoreFoundation, RecordsInTheLatestOneThatExists) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The stream in memory: values in a queue, and trouble on demand.
+// The stream in memory: values in a queue.
 #include "tests/shared/recording_stream.h"
 
 #include <algorithm>
@@ -10,7 +10,7 @@
 namespace doubles {
 namespace {
 
-// What is no longer as in a slot that was made for one operation.
+// The fields that differ from those of a fresh error slot.
 std::string useOf(const NiduException& slot) {
   std::string use;
   if (slot.textA[0] != '\0' || slot.textB[0] != '\0' || slot.textC[0] != '\0') use += " text";

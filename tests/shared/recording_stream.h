@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// A stream of typed values in memory: it keeps what is written and gives it back, and it records each
+// A stream of typed values in memory: what is written to it can be read from it, and it records each
 // operation.
 //
 //   RecordingStream stream;
@@ -8,9 +8,9 @@
 //   stream.failAt(2, error);                    // ... and the second operation from here on fails
 //   EXPECT_THROW(other.getFrom(&stream), NiduException);
 //
-// Every operation leaves dirt in its error slot that is no error, so that a slot used twice shows.
-// A read operation that fails or throws leaves garbage where its value should be: "garbage", true,
-// 0x5A5A5A5A. Reading what is not there, or a value of another type, fails the test.
+// Every operation writes a text and a mode, but no error, into its error slot, so that a second use of the
+// slot is found. A read operation that fails returns a wrong value: "garbage", true, 0x5A5A5A5A. Reading when
+// no value is left, or a value of another type, fails the test.
 #pragma once
 
 #include <cstdint>
@@ -22,7 +22,7 @@
 
 namespace doubles {
 
-/// What the stream throws when it is told to throw itself.
+/// What the stream throws after throwAt().
 struct StreamBroke {
   int operation;  ///< Which one it was, from 1.
 };
@@ -53,8 +53,8 @@ class RecordingStream : public INiduStream {
   const std::vector<std::string>& operations() const { return done; }
   void forgetOperations() { done.clear(); }
 
-  /// What was wrong with the error slots as they came: the operation's number, and an old error, text or
-  /// mode.
+  /// The error slots that were not fresh: the number of the operation, and whether text, error or mode was
+  /// set.
   const std::vector<std::string>& usedSlots() const { return used; }
 
   void writeString(AutoNiduException* error, const char* text) override;

@@ -9,7 +9,7 @@
 
 namespace {
 
-// A buffer full of '#', between two bytes that nobody may change.
+// A buffer full of '#', between two bytes that must not change.
 template <std::size_t kSize>
 struct Guarded {
   Guarded() { std::memset(this, '#', sizeof *this); }
