@@ -18,7 +18,7 @@ FOLDERS = ("driver", "describe", "host", "loader", "support", "platform", "vst2"
 # What a source may include in angle brackets: headers that macOS has and that need no other library of C++ than the
 # one of macOS 10.13.
 HEADERS = set("""
-    algorithm array atomic cctype cerrno climits cmath csignal cstdarg cstddef cstdint cstdio cstdlib cstring ctime
+    algorithm array atomic cctype cerrno climits cmath csignal cstdarg cstddef cstdint cstdio cstdlib cstring cwchar ctime
     exception functional initializer_list iterator limits map memory mutex new numeric optional random set stdexcept
     string string_view thread tuple type_traits typeinfo unordered_map utility vector
     fcntl.h poll.h pthread.h sys/mman.h sys/stat.h sys/types.h unistd.h

@@ -21,7 +21,7 @@ struct Size {
 
 class SizeOrFail : public testing::TestWithParam<Size> {};
 
-TEST_P(SizeOrFail, IsTheFixedPartAndAllElementsOrThrowsMinusOneAboveAnInt) {
+TEST_P(SizeOrFail, IsTheFixedPartAndAllElementsOrThrowsMinusOneOutsideAnInt) {
   int size = 0;
   const auto thrown =
       thrownInt([&] { size = sizeOrFail(GetParam().fixed, GetParam().count, GetParam().each); });
@@ -42,7 +42,11 @@ INSTANTIATE_TEST_SUITE_P(Sizes, SizeOrFail,
                                          Size{"OneByteTooManyInTheChunk", 60, 2147483588, 1, kThrows},
                                          Size{"OneParameterTooMany", 56, 536870898, 4, kThrows},
                                          Size{"ProductAbove32Bits", 156, 2147483647, 2147483647, kThrows},
-                                         Size{"ElementAbove32Bits", 0, 1, 4294967295, kThrows}),
+                                         Size{"ElementAbove32Bits", 0, 1, 4294967295, kThrows},
+                                         Size{"NegativeCount", 64, -2, 4, 56},
+                                         Size{"NothingLeft", 56, -14, 4, 0},
+                                         Size{"LessThanNothing", 56, -15, 4, kThrows},
+                                         Size{"NegativeElement", 156, 40, -4, kThrows}),
                          [](const auto& instance) { return instance.param.name; });
 
 }  // namespace
