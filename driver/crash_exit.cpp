@@ -10,6 +10,7 @@
 
 #include "driver/last_words.h"
 #include "driver/safety_nets.h"
+#include "flight_recorder/flight_recorder.h"
 
 bool gExpectedEnd = false;
 int gCrashCode = 0;
@@ -78,6 +79,7 @@ void exitAfterCrash() {
 
 void atExitFunction() {
   if (gExpectedEnd || !isReportingProcess()) return;
+  noteUnexpectedExit();
   if (isEnabled(SafetyNet::kClosedReport)) closeReport();
   printUnexpectedExit();
 }

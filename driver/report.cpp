@@ -5,6 +5,7 @@
 #include <cwchar>
 
 #include "driver/last_words.h"
+#include "flight_recorder/flight_recorder.h"
 
 int gStep = 0;
 const char* gCurTest = nullptr;
@@ -48,6 +49,7 @@ void printTotal(int count) {
 
 void printStep(const char* text) {
   ++gStep;
+  noteStep(gStep, text);
   char line[kLineSize];
   std::snprintf(line, sizeof line, "%d, %s\n", gStep, text);
   printLine(line);

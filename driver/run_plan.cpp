@@ -44,6 +44,13 @@ void torturePlugin(const NiduCOM::i_ptr<VSTPluginLoader>& loader, const VST_load
   for (int i = 0; i < kRandomTests; ++i) runOneTest(testNumberFor(std::rand()), wrapper.get());
 }
 
+void torturePluginWith(const std::vector<int>& tests, const VST_Class_Spec& classSpec, VSTWrapper& wrapper) {
+  printTotal(1 + static_cast<int>(tests.size()));
+  announceDescription();
+  const KelVSTInfoCache::VSTInfo description(&wrapper, classSpec);
+  for (const int testNumber : tests) runOneTest(testNumber, &wrapper);
+}
+
 void tortureShell(const VSTPluginLoader& loader, VSTWrapper& wrapper) {
   printTotal(kAnnouncedForShell);
   announceDescription();

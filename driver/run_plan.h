@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <vector>
 
 #include "host/vst_wrapper.h"
 #include "loader/module_loader.h"
@@ -15,6 +16,9 @@
 /// On purpose: announces 64 steps and prints 65.
 void torturePlugin(const NiduCOM::i_ptr<VSTPluginLoader>& loader, const VST_loadID& loadID,
                    const VST_Class_Spec& classSpec, std::unique_ptr<VSTWrapper>& wrapper);
+
+/// A plan of one's own: description, then these tests in their order. Announces as many steps as it prints.
+void torturePluginWith(const std::vector<int>& tests, const VST_Class_Spec& classSpec, VSTWrapper& wrapper);
 
 /// The plan of a shell, which only contains other plug-ins: one description. Catches nothing.
 /// On purpose: announces 51 steps and prints 1.

@@ -3,6 +3,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "loader/plugin_identity.h"
 
@@ -10,3 +11,7 @@
 /// lines. True when every phase ran to its end, false after a failure line. `isShellPlugin` receives whether
 /// the plug-in is a shell. Crashes the process on purpose when the plug-in yields no instance.
 bool RunVSTTortureTest(const std::string& path, const VST_loadID& loadID, bool& isShellPlugin);
+
+/// The same with other tests: those of the list, in its order, on the first instance. A shell is run as ever.
+bool runListedTests(const std::string& path, const VST_loadID& loadID, const std::vector<int>& tests,
+                    bool& isShellPlugin);

@@ -5,9 +5,11 @@
 //          the instance, so the answers are the same for all instances, also while an entry point runs.
 #include <cstring>
 
+#include "flight_recorder/flight_recorder.h"
 #include "host/host_answers.h"
 #include "host/host_identity.h"
 #include "host/vst_wrapper.h"
+#include "platform/thread_number.h"
 #include "vst2/host_opcodes.h"
 
 namespace {
@@ -23,7 +25,9 @@ VstIntPtr vendorService(const char* name) {
 
 }  // namespace
 
-VstIntPtr VSTWrapper::masterCallback(AEffect*, VstInt32 opcode, VstInt32, VstIntPtr, void* ptr, float) {
+VstIntPtr VSTWrapper::masterCallback(AEffect*, VstInt32 opcode, VstInt32 index, VstIntPtr value, void* ptr,
+                                     float) {
+  noteHostRequest(opcode, index, value, currentThreadNumber());
   char* text = static_cast<char*>(ptr);
   switch (opcode) {
     case audioMasterVersion:

@@ -7,6 +7,7 @@
 
 #include <mutex>
 
+#include "flight_recorder/flight_recorder.h"
 #include "host/vst_wrapper.h"
 
 /// Takes the lock when the first value is read or set, and releases it when destroyed. Without any value it
@@ -38,7 +39,9 @@ class LockedValues {
       // On purpose: a value equal to the present one is never sent.
       if (ask(index) == value) return;
       const ParamBeingSet being(paramBeingSet, index);
+      RequestUnderWay request(kFlightSetParameter, index, value);
       effect->setParameter(effect, index, value);
+      request.returned();
     } catch (...) {  // The parameter keeps the value that the plug-in left it with.
     }
   }
@@ -64,7 +67,9 @@ class LockedValues {
   /// Asks the plug-in for a value. The volatile variable rounds it to 32 bits: where floats are returned in a
   /// wider register, the answer could otherwise differ from the value that the plug-in was given.
   [[nodiscard]] float ask(VstInt32 index) const {
+    RequestUnderWay request(kFlightGetParameter, index);
     const volatile float value = effect->getParameter(effect, index);
+    request.returned();
     return value;
   }
 

@@ -2,6 +2,7 @@
 // VSTWrapper: creation, destruction and basic queries.
 #include <exception>
 
+#include "flight_recorder/flight_recorder.h"
 #include "host/vst_wrapper.h"
 #include "support/text_buffer.h"
 #include "vst2/dispatch.h"
@@ -17,7 +18,10 @@ constexpr std::uint32_t kExtensionToken = 0xBEEF0000u;
 /// The instance, or null when the entry point throws.
 AEffect* callEntry(void* entry) {
   try {
-    return reinterpret_cast<PluginEntryProc>(entry)(VSTWrapper::masterCallback);
+    RequestUnderWay request(kFlightEntry);
+    AEffect* const effect = reinterpret_cast<PluginEntryProc>(entry)(VSTWrapper::masterCallback);
+    request.returned();
+    return effect;
   } catch (...) {
     return nullptr;
   }

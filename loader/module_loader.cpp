@@ -3,6 +3,7 @@
 
 #include <cstring>
 
+#include "flight_recorder/flight_recorder.h"
 #include "platform/entry_point_name.h"
 
 sorted_vector_set<NiduCOM::i_ptr<VSTPluginLoader>, compareVSTLoaderRefs> VSTPluginLoader::fLoadedDLLs;
@@ -27,7 +28,10 @@ VSTPluginLoader::VSTPluginLoader(const VST_DLL_Info& identity) : info(identity) 
   CFRelease(url);
   if (bundle == nullptr) throw -1;
   // On purpose: a bundle whose executable does not load is not released.
-  if (!CFBundleLoadExecutable(bundle)) throw -1;
+  RequestUnderWay request(kFlightLoad);
+  const bool isLoaded = CFBundleLoadExecutable(bundle);
+  request.returned();
+  if (!isLoaded) throw -1;
 }
 
 VSTPluginLoader::~VSTPluginLoader() {

@@ -11,10 +11,15 @@
 // Threads:   make and release on the main thread. An exception is handled on the thread that it occurs on.
 #pragma once
 
+#include <csignal>
+
 /// What the delegate calls.
 struct ExceptionDelegateActions {
   void (*installSignalGuard)();  ///< Called once, at the end of its initialisation.
-  void (*exitProcess)();         ///< Called to handle an exception. Does not return.
+  /// Called before anything else is done about a system exception, with the arguments of a signal handler.
+  /// Never called on macOS.
+  void (*recordFault)(int signal, siginfo_t* info, void* context);
+  void (*exitProcess)();  ///< Called to handle an exception. Does not return.
 };
 
 struct AutoreleasePool;

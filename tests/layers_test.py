@@ -1,7 +1,8 @@
 # SPDX-License-Identifier: MIT
 """Holds the program's sources against the map of its folders.
 
-A folder may include itself and those below it; vst2/ may be included by host/ and above. Only platform/ asks
+A folder may include itself and those below it; vst2/ may be included by host/ and above, flight_recorder/ by those
+that make requests, report or load. Only platform/ asks
 which operating system it is on, or includes a header that neither C++ nor POSIX has.
 
 Tested on the program's own tree, and on small trees with one fault each.
@@ -11,8 +12,10 @@ import re
 import tempfile
 import unittest
 
-LAYERS = ["driver", "describe", "host", "loader", "support", "platform"]
-USERS_OF_VST2 = ["driver", "describe", "host", "vst2"]
+LAYERS = ["worker", "driver", "describe", "host", "loader", "support", "platform"]
+USERS_OF_VST2 = ["worker", "driver", "describe", "host", "vst2"]
+USERS_OF_FLIGHT_RECORDER = ["worker", "driver", "host", "loader", "vst2", "flight_recorder"]
+FOLDERS = [*LAYERS, "vst2", "flight_recorder"]
 SUFFIXES = {".h", ".cpp", ".mm"}
 
 POSIX_HEADERS = set("""
@@ -51,6 +54,8 @@ def without_comments(text):
 def may_include(folder, other):
     if other == "vst2":
         return folder in USERS_OF_VST2
+    if other == "flight_recorder":
+        return folder in USERS_OF_FLIGHT_RECORDER
     return folder in LAYERS and other in LAYERS and LAYERS.index(other) >= LAYERS.index(folder)
 
 
@@ -93,7 +98,7 @@ def sources(folder):
 def faults(root):
     """All faults of the tree, each "folder/file:line: what"."""
     found = []
-    for folder in [*LAYERS, "vst2"]:
+    for folder in FOLDERS:
         for path in sources(root / folder):
             for number, line in enumerate(without_comments(path.read_text()).split("\n"), 1):
                 found += [f"{path.relative_to(root)}:{number}: {fault}"
@@ -108,7 +113,7 @@ class TheProgram(unittest.TestCase):
         self.assertEqual(faults(self.ROOT), [])
 
     def test_every_folder_of_the_map_has_sources_that_were_read(self):
-        for folder in [*LAYERS, "vst2"]:
+        for folder in FOLDERS:
             self.assertTrue(list(sources(self.ROOT / folder)), folder)
 
 
@@ -128,13 +133,15 @@ class Faults(unittest.TestCase):
 
     def test_each_folder_may_include_itself_and_those_below(self):
         below = {
-            "driver": "driver describe host loader support platform vst2",
+            "worker": "worker driver describe host loader support platform vst2 flight_recorder",
+            "driver": "driver describe host loader support platform vst2 flight_recorder",
             "describe": "describe host loader support platform vst2",
-            "host": "host loader support platform vst2",
-            "loader": "loader support platform",
+            "host": "host loader support platform vst2 flight_recorder",
+            "loader": "loader support platform flight_recorder",
             "support": "support platform",
             "platform": "platform",
-            "vst2": "vst2",
+            "vst2": "vst2 flight_recorder",
+            "flight_recorder": "flight_recorder",
         }
         for folder in below:
             for other in below:

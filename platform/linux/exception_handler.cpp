@@ -26,10 +26,12 @@ constexpr SystemException kSystemExceptions[] = {
 
 // The delegate's; null while there is no delegate.
 std::atomic<void (*)()> exitProcess{nullptr};
+std::atomic<void (*)(int, siginfo_t*, void*)> recordFault{nullptr};
 
 // Runs as a signal handler: calls nothing that is unsafe there.
-void handleSystemException(int signal) {
+void handleSystemException(int signal, siginfo_t* info, void* context) {
   if (void (*const exitNow)() = exitProcess) {
+    recordFault.load()(signal, info, context);
     for (const SystemException& exception : kSystemExceptions) {
       if (exception.signal != signal) continue;
       [[maybe_unused]] const ssize_t written =
@@ -49,11 +51,12 @@ AutoreleasePool* makeAutoreleasePool() { return new AutoreleasePool(); }
 void releaseAutoreleasePool(AutoreleasePool* pool) { delete pool; }
 
 ExceptionDelegate* makeExceptionDelegate(const ExceptionDelegateActions& actions) {
+  recordFault = actions.recordFault;
   exitProcess = actions.exitProcess;
   for (const SystemException& exception : kSystemExceptions) {
     struct sigaction action = {};
-    action.sa_handler = handleSystemException;
-    action.sa_flags = SA_ONSTACK | SA_NODEFER;
+    action.sa_sigaction = handleSystemException;
+    action.sa_flags = SA_SIGINFO | SA_ONSTACK | SA_NODEFER;
     sigaction(exception.signal, &action, nullptr);
   }
   actions.installSignalGuard();

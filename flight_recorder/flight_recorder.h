@@ -1,0 +1,115 @@
+// SPDX-License-Identifier: MIT
+// Writes the flight record: what is under way, stored before it begins.
+//
+//   RequestUnderWay request(opcode, index, value, opt);
+//   const VstIntPtr answer = effect.dispatcher(...);
+//   request.returned();
+//
+// Every program that loads plug-ins does these stores. They go to a static record that nobody sees, until
+// observeRun() is given one that somebody does. No lock, no clock, and no question whether anybody reads
+// along.
+//
+// Threads: requests, steps, phases and verdicts on the main thread; noteHostRequest() on any; noteFault() in
+//          signal handlers of any thread.
+#pragma once
+
+#include <atomic>
+#include <string_view>
+
+#include "flight_recorder/flight_record.h"
+
+/// Where the stores go. Volatile, so that each is made, and in its place: the process may be killed at any
+/// instruction.
+extern std::atomic<volatile FlightRecord*> gFlightRecord;
+
+inline volatile FlightRecord& flightRecord() { return *gFlightRecord.load(std::memory_order_relaxed); }
+
+/// Starts the record over and makes all further stores go there. `record` must live as long as the process.
+void observeRun(FlightRecord& record, std::uint32_t process);
+
+/// From now on nothing is stored in the observed record. For processes that the plug-in has forked: they
+/// share it.
+void forgetObservedRun();
+
+/// A request to the plug-in, from just before it is made until it is left by a return or an exception.
+class RequestUnderWay {
+ public:
+  /// Loading, or a call of the entry point.
+  explicit RequestUnderWay(FlightRequestKind kind) { begin(flightRecord(), kind); }
+  /// The value of a parameter is asked for.
+  RequestUnderWay(FlightRequestKind kind, std::int32_t index) {
+    volatile FlightRecord& record = flightRecord();
+    record.request.index = index;
+    begin(record, kind);
+  }
+  /// The value of a parameter is set.
+  RequestUnderWay(FlightRequestKind kind, std::int32_t index, float newValue) {
+    volatile FlightRecord& record = flightRecord();
+    record.request.index = index;
+    record.request.opt = newValue;
+    begin(record, kind);
+  }
+  /// The dispatcher is called.
+  RequestUnderWay(std::int32_t opcode, std::int32_t index, std::int64_t value, float opt) {
+    volatile FlightRecord& record = flightRecord();
+    record.request.opcode = opcode;
+    record.request.index = index;
+    record.request.value = value;
+    record.request.opt = opt;
+    begin(record, kFlightDispatcher);
+  }
+  ~RequestUnderWay() {
+    if (!hasReturned) noteThrown();
+  }
+  RequestUnderWay(const RequestUnderWay&) = delete;
+  RequestUnderWay& operator=(const RequestUnderWay&) = delete;
+
+  void returned() {
+    flightRecord().request.state = kFlightReturned;
+    hasReturned = true;
+  }
+
+ private:
+  static void begin(volatile FlightRecord& record, FlightRequestKind kind) {
+    record.request.kind = kind;
+    record.requestsMade = record.requestsMade + 1;
+    record.request.state = kFlightUnderWay;
+  }
+  static void noteThrown();
+
+  bool hasReturned = false;
+};
+
+/// The plug-in asks its host for something, on any thread.
+void noteHostRequest(std::int32_t opcode, std::int32_t index, std::int64_t value, std::uint32_t thread);
+
+/// Takes the time.
+void noteStep(int number, const char* text);
+
+inline void notePhase(FlightPhase phase) { flightRecord().phase = phase; }
+inline void noteVerdict(FlightVerdict verdict) { flightRecord().verdict = verdict; }
+void noteFailure(int code);
+
+/// The bundle as named on the command line.
+void noteBundle(std::string_view path);
+
+/// exit() has been called in the middle of the run. Later stores no longer reach the record, so that it stays
+/// as it was at that moment although other threads may go on; a fault that follows still does.
+void noteUnexpectedExit();
+
+/// Stores the signal and answers true for the first fault of an observed run. Other stores no longer reach
+/// the record from then on. Safe in a signal handler, like the two below.
+bool noteFault(int signal);
+
+struct FaultDetails {
+  std::int32_t code;  ///< As in FlightFault, like all that follow.
+  std::uint32_t thread;
+  std::uint32_t sender;
+  std::uint64_t address;
+  std::uint64_t programCounter;
+};
+
+/// For the one caller that noteFault() answered with true.
+void noteFaultDetails(const FaultDetails& details);
+/// The same: the image that holds the program counter.
+void noteFaultModule(const char* path, std::uint64_t address);
