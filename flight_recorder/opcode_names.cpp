@@ -1,0 +1,98 @@
+// SPDX-License-Identifier: MIT
+#include "flight_recorder/opcode_names.h"
+
+#include <cstddef>
+#include <iterator>
+
+namespace {
+
+/// In the order of their numbers.
+constexpr const char* kNames[] = {
+    "effOpen",
+    "effClose",
+    "effSetProgram",
+    "effGetProgram",
+    "effSetProgramName",
+    "effGetProgramName",
+    "effGetParamLabel",
+    "effGetParamDisplay",
+    "effGetParamName",
+    "effGetVu",
+    "effSetSampleRate",
+    "effSetBlockSize",
+    "effMainsChanged",
+    "effEditGetRect",
+    "effEditOpen",
+    "effEditClose",
+    "effEditDraw",
+    "effEditMouse",
+    "effEditKey",
+    "effEditIdle",
+    "effEditTop",
+    "effEditSleep",
+    "effIdentify",
+    "effGetChunk",
+    "effSetChunk",
+    "effProcessEvents",
+    "effCanBeAutomated",
+    "effString2Parameter",
+    "effGetNumProgramCategories",
+    "effGetProgramNameIndexed",
+    "effCopyProgram",
+    "effConnectInput",
+    "effConnectOutput",
+    "effGetInputProperties",
+    "effGetOutputProperties",
+    "effGetPlugCategory",
+    "effGetCurrentPosition",
+    "effGetDestinationBuffer",
+    "effOfflineNotify",
+    "effOfflinePrepare",
+    "effOfflineRun",
+    "effProcessVarIo",
+    "effSetSpeakerArrangement",
+    "effSetBlockSizeAndSampleRate",
+    "effSetBypass",
+    "effGetEffectName",
+    "effGetErrorText",
+    "effGetVendorString",
+    "effGetProductString",
+    "effGetVendorVersion",
+    "effVendorSpecific",
+    "effCanDo",
+    "effGetTailSize",
+    "effIdle",
+    "effGetIcon",
+    "effSetViewPosition",
+    "effGetParameterProperties",
+    "effKeysRequired",
+    "effGetVstVersion",
+    "effEditKeyDown",
+    "effEditKeyUp",
+    "effSetEditKnobMode",
+    "effGetMidiProgramName",
+    "effGetCurrentMidiProgram",
+    "effGetMidiProgramCategory",
+    "effHasMidiProgramsChanged",
+    "effGetMidiKeyName",
+    "effBeginSetProgram",
+    "effEndSetProgram",
+    "effGetSpeakerArrangement",
+    "effShellGetNextPlugin",
+    "effStartProcess",
+    "effStopProcess",
+    "effSetTotalSampleToProcess",
+    "effSetPanLaw",
+    "effBeginLoadBank",
+    "effBeginLoadProgram",
+    "effSetProcessPrecision",
+    "effGetNumMidiInputChannels",
+    "effGetNumMidiOutputChannels",
+};
+static_assert(std::size(kNames) == 80);
+
+}  // namespace
+
+const char* effectOpcodeName(std::int32_t opcode) {
+  return opcode >= 0 && static_cast<std::size_t>(opcode) < std::size(kNames) ? kNames[opcode] : nullptr;
+}
