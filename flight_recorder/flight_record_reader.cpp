@@ -207,14 +207,8 @@ std::string dispatcherText(const ReportedRequest& request) {
 
 std::string stepOf(const FlightReport& report) {
   if (report.step != 0) return "step " + std::to_string(report.step) + ", " + report.stepText;
-  switch (report.phase) {
-    case kFlightNotStarted:
-      return "not started";
-    case kFlightLoading:
-      return "loading";
-    default:
-      return "creation";
-  }
+  if (report.request.kind == kFlightLoad && report.verdict != kFlightNoInstance) return "loading";
+  return report.phase == kFlightNotStarted ? "not started" : "creation";
 }
 
 std::string verdictText(const FlightReport& report) {
@@ -309,6 +303,8 @@ std::string sentenceOf(const FlightReport& report) {
   }
   if (const std::string verdict = verdictText(report); !verdict.empty()) sentence += ", " + verdict;
   if (report.unexpectedExit) sentence += ", exit() was called";
-  if (report.fault.signal != 0) sentence += ", " + faultText(report);
+  // Without an instance the program crashes on purpose.
+  const bool isMeant = report.verdict == kFlightNoInstance;
+  if (report.fault.signal != 0 && !isMeant) sentence += ", " + faultText(report);
   return sentence;
 }

@@ -218,6 +218,8 @@ TEST(SentenceOf, TellsTheEndsWithoutAFault) {
   EXPECT_EQ(sentence(bytes.set32(36, 0).set32(24, 1).set32(76, 1)), "loading: loading the module under way");
   EXPECT_EQ(sentence(bytes.set32(24, 2).set32(76, 2).set32(48, 1)),
             "creation: the entry point under way, exit() was called");
+  EXPECT_EQ(sentence(bytes.set32(72, 2).set32(48, 0).set32(28, 5).set32(224, 11)),
+            "creation: no request under way, no instance");
 }
 
 TEST(TextOfARequest, NamesArgumentsThatAreNotZero) {
