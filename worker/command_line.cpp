@@ -38,7 +38,7 @@ bool readNumber(std::string_view text, std::uint64_t most, std::uint64_t& number
   for (const char c : text) {
     if (c < '0' || c > '9') return false;
     const auto digit = static_cast<std::uint64_t>(c - '0');
-    if (number > (most - digit) / 10) return false;
+    if (digit > most || number > (most - digit) / 10) return false;
     number = number * 10 + digit;
   }
   return !text.empty();
