@@ -54,7 +54,8 @@ def main():
     parser.add_argument("--plugins", required=True)
     parser.add_argument("modules", nargs="*")
     arguments = parser.parse_args()
-    arguments.plugins = os.path.abspath(arguments.plugins)
+    for name in ("program", "worker", "plugins"):
+        setattr(arguments, name, os.path.abspath(getattr(arguments, name)))
 
     modules = arguments.modules
     if not modules:
