@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 /* The null plug-in: answers every request with 0 in constant time, so that a run on it costs what its host
- * costs. The environment variables NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS set its counts. */
+ * costs. The environment variables NULL_PLUGIN_PARAMETERS and NULL_PLUGIN_PROGRAMS set its counts;
+ * NULL_PLUGIN_SEED seeds the random numbers, so that the host draws the same tests in each run. */
 #include <stdint.h>
 #include <stdlib.h>
 
@@ -35,6 +36,7 @@ __attribute__((visibility("default"))) AEffect* VSTPluginMain(HostCallback* host
   effect->dispatcher = answerNothing;
   effect->setParameter = ignoreValue;
   effect->getParameter = noValue;
+  if (getenv("NULL_PLUGIN_SEED") != NULL) srand((unsigned)countFrom("NULL_PLUGIN_SEED"));
   effect->numParams = countFrom("NULL_PLUGIN_PARAMETERS");
   effect->numPrograms = countFrom("NULL_PLUGIN_PROGRAMS");
   return effect;
