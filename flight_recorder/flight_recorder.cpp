@@ -2,13 +2,13 @@
 #include "flight_recorder/flight_recorder.h"
 
 #include <algorithm>
+#include <atomic>
 #include <cstring>
 #include <ctime>
 
-namespace {
+#include <sys/mman.h>
 
-/// Takes the stores of a run that nobody observes, and those that come when a record is to stay as it is.
-FlightRecord unseenRecord = {};
+namespace {
 
 std::atomic<volatile FlightRecord*> observedRecord{nullptr};
 std::atomic<bool> isFaultNoted{false};
@@ -32,11 +32,18 @@ void storePath(volatile char (&field)[size], std::string_view path) {
   storeText(field, path.substr(path.size() - std::min(path.size(), size - 1)));
 }
 
+/// Puts memory that nobody sees in the place of the record, for all stores that still come. One system call, so
+/// that no thread ever stores into nothing.
+void leaveRecordAsItIs() {
+  mmap(&gFlightRecordPage, sizeof gFlightRecordPage, PROT_READ | PROT_WRITE,
+       MAP_PRIVATE | MAP_ANON | MAP_FIXED, -1, 0);
+}
+
 }  // namespace
 
-std::atomic<volatile FlightRecord*> gFlightRecord{&unseenRecord};
+FlightRecordPage gFlightRecordPage = {};
 
-void observeRun(FlightRecord& record, std::uint32_t process) {
+void observeRun(FlightRecord& observed, std::uint32_t process) {
   FlightRecord fresh = {};
   std::memcpy(fresh.magic, kFlightRecordMagic, sizeof fresh.magic);
   fresh.version = kFlightRecordVersion;
@@ -44,15 +51,13 @@ void observeRun(FlightRecord& record, std::uint32_t process) {
   fresh.process = process;
   fresh.pointerSize = sizeof(void*);
   fresh.startTime = nowInNanoseconds();
-  record = fresh;
+  observed = fresh;
   isFaultNoted = false;
-  observedRecord = &record;
-  gFlightRecord = &record;
+  observedRecord = &observed;
 }
 
 void forgetObservedRun() {
-  observedRecord = nullptr;
-  gFlightRecord = &unseenRecord;
+  if (observedRecord.exchange(nullptr) != nullptr) leaveRecordAsItIs();
 }
 
 void RequestUnderWay::noteThrown() {
@@ -93,13 +98,13 @@ void noteBundle(std::string_view path) { storePath(flightRecord().bundlePath, pa
 
 void noteUnexpectedExit() {
   flightRecord().unexpectedExit = 1;
-  gFlightRecord = &unseenRecord;
+  if (observedRecord != nullptr) leaveRecordAsItIs();
 }
 
 bool noteFault(int signal) {
   volatile FlightRecord* record = observedRecord;
   if (record == nullptr || isFaultNoted.exchange(true)) return false;
-  gFlightRecord = &unseenRecord;
+  leaveRecordAsItIs();
   record->fault.signal = signal;
   return true;
 }

@@ -5,27 +5,37 @@
 //   const VstIntPtr answer = effect.dispatcher(...);
 //   request.returned();
 //
-// Every program that loads plug-ins does these stores. They go to a static record that nobody sees, until
-// observeRun() is given one that somebody does. No lock, no clock, and no question whether anybody reads
-// along.
+// Every program that loads plug-ins does these stores. They go to a static record that nobody sees, unless
+// a file is mapped in its place (flight_recorder/record_file.h). No lock, no clock, and no question whether
+// anybody reads along.
 //
 // Threads: requests, steps, phases and verdicts on the main thread; noteHostRequest() on any; noteFault() in
 //          signal handlers of any thread.
 #pragma once
 
-#include <atomic>
 #include <string_view>
 
 #include "flight_recorder/flight_record.h"
 
-/// Where the stores go. Volatile, so that each is made, and in its place: the process may be killed at any
-/// instruction.
-extern std::atomic<volatile FlightRecord*> gFlightRecord;
+#ifdef __aarch64__
+constexpr std::size_t kLargestPageInBytes = 16384;
+#else
+constexpr std::size_t kLargestPageInBytes = 4096;
+#endif
 
-inline volatile FlightRecord& flightRecord() { return *gFlightRecord.load(std::memory_order_relaxed); }
+/// The record that all stores go to, in a page of its own, at an address that the compiler knows: a request to a
+/// plug-in that just tells a value is so short that looking up the record would be seen.
+struct alignas(kLargestPageInBytes) FlightRecordPage {
+  FlightRecord record;
+};
+extern FlightRecordPage gFlightRecordPage;
 
-/// Starts the record over and makes all further stores go there. `record` must live as long as the process.
-void observeRun(FlightRecord& record, std::uint32_t process);
+/// Volatile, so that each store is made, and in its place: the process may be killed at any instruction.
+inline volatile FlightRecord& flightRecord() { return gFlightRecordPage.record; }
+
+/// Starts the record over. `observed` is the same memory at another address, for the notes of faults; it must
+/// live as long as the process.
+void observeRun(FlightRecord& observed, std::uint32_t process);
 
 /// From now on nothing is stored in the observed record. For processes that the plug-in has forked: they
 /// share it.

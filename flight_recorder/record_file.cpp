@@ -38,38 +38,35 @@ bool fillWithZeros(int descriptor) {
   return pwrite(descriptor, zeros, sizeof zeros, 0) == static_cast<ssize_t>(sizeof zeros);
 }
 
+void* map(int descriptor, void* place, int flags) {
+  return mmap(place, kFlightRecordSizeInBytes, PROT_READ | PROT_WRITE, MAP_SHARED | flags, descriptor, 0);
+}
+
 }  // namespace
 
-FlightRecord* mapRecordFile(const std::string& path, std::string& whyNot) {
+bool keepRecordIn(const std::string& path, std::string& whyNot) {
   const OpenFile file(path);
   struct stat status = {};
   if (file.descriptor < 0 || fstat(file.descriptor, &status) != 0) {
     whyNot = std::strerror(errno);
-    return nullptr;
+    return false;
   }
   if (!S_ISREG(status.st_mode)) {
     whyNot = "Not a regular file";
-    return nullptr;
+    return false;
   }
   if (status.st_size != 0 && status.st_size != static_cast<off_t>(kFlightRecordSizeInBytes)) {
     whyNot = "The file has " + std::to_string(status.st_size) + " bytes, a record has 4096";
-    return nullptr;
+    return false;
   }
   errno = ENOSPC;
-  if (!fillWithZeros(file.descriptor)) {
+  void* observed = MAP_FAILED;
+  if (!fillWithZeros(file.descriptor) || (observed = map(file.descriptor, nullptr, 0)) == MAP_FAILED ||
+      map(file.descriptor, &gFlightRecordPage, MAP_FIXED) == MAP_FAILED) {
     whyNot = std::strerror(errno);
-    return nullptr;
+    return false;
   }
-  void* memory =
-      mmap(nullptr, kFlightRecordSizeInBytes, PROT_READ | PROT_WRITE, MAP_SHARED, file.descriptor, 0);
-  if (memory == MAP_FAILED) {
-    whyNot = std::strerror(errno);
-    return nullptr;
-  }
-  return static_cast<FlightRecord*>(memory);
-}
-
-void observeThisProcess(FlightRecord& record) {
   pthread_atfork(nullptr, nullptr, forgetObservedRun);
-  observeRun(record, static_cast<std::uint32_t>(getpid()));
+  observeRun(*static_cast<FlightRecord*>(observed), static_cast<std::uint32_t>(getpid()));
+  return true;
 }

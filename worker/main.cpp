@@ -31,10 +31,8 @@ int main(int argc, const char** argv) {
   if (!readCommandLine(argc, argv, options, mistake)) return complain(mistake);
   if (options.wantsHelp) return std::fputs(kWorkerHelp, stdout) < 0 ? kExitWrongUse : 0;
   if (options.wantsVersion) return std::puts("vsttorture-worker " VSTTORTURE_VERSION) < 0 ? kExitWrongUse : 0;
-  if (!options.recordPath.empty()) {
-    FlightRecord* record = mapRecordFile(options.recordPath, mistake);
-    if (record == nullptr) return complain("cannot keep a record in " + options.recordPath + ": " + mistake);
-    observeThisProcess(*record);
+  if (!options.recordPath.empty() && !keepRecordIn(options.recordPath, mistake)) {
+    return complain("cannot keep a record in " + options.recordPath + ": " + mistake);
   }
   if (!limitThisProcess(options, mistake)) return complain(mistake);
 

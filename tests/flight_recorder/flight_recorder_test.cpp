@@ -4,9 +4,12 @@
 #include <vector>
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include "flight_recorder/flight_recorder.h"
+#include "flight_recorder/record_file.h"
 #include "tests/flight_recorder/record_bytes.h"
+#include "tests/shared/temporary_directory.h"
 #include "vst2/dispatch.h"
 
 namespace {
@@ -15,22 +18,24 @@ namespace {
 class FlightRecorder : public testing::Test {
  protected:
   FlightRecorder() {
-    observeRun(record, 77);
+    std::string whyNot;
+    if (!keepRecordIn(path, whyNot)) throw std::runtime_error(whyNot);
     effect.dispatcher = [](AEffect*, VstInt32, VstInt32, VstIntPtr, void*, float) -> VstIntPtr {
-      seen = RecordBytes(current);
+      seen = RecordBytes::ofFile(current);
       if (throws) throw 5;
       return 9;
     };
-    current = &record;
+    current = path;
     throws = false;
   }
   ~FlightRecorder() override { forgetObservedRun(); }
 
-  [[nodiscard]] RecordBytes now() const { return RecordBytes(&record); }
+  [[nodiscard]] RecordBytes now() const { return RecordBytes::ofFile(path); }
 
-  FlightRecord record = {};
+  const TemporaryDirectory folder;
+  const std::string path = (folder.path() / "record").string();
   AEffect effect = {};
-  static inline const FlightRecord* current = nullptr;
+  static inline std::string current;
   static inline RecordBytes seen;
   static inline bool throws = false;
 };
@@ -39,7 +44,7 @@ TEST_F(FlightRecorder, BeginsWithMarkVersionSizesAndProcess) {
   EXPECT_EQ(now().bytes.substr(0, 8), "vstflrec");
   EXPECT_EQ(now().number32(8), 1u);
   EXPECT_EQ(now().number32(12), 4096u);
-  EXPECT_EQ(now().number32(16), 77u);
+  EXPECT_EQ(now().number32(16), static_cast<std::uint32_t>(getpid()));
   EXPECT_EQ(now().number32(20), sizeof(void*));
 }
 

@@ -2,6 +2,16 @@
 #include "tests/flight_recorder/record_bytes.h"
 
 #include <cstring>
+#include <fstream>
+#include <iterator>
+
+RecordBytes RecordBytes::ofFile(const std::string& path) {
+  std::ifstream file(path, std::ios::binary);
+  RecordBytes record;
+  record.bytes.assign(std::istreambuf_iterator<char>(file), {});
+  record.bytes.resize(4096);
+  return record;
+}
 
 RecordBytes RecordBytes::ofARun() {
   RecordBytes record;

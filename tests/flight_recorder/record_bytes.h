@@ -9,7 +9,8 @@ class RecordBytes {
  public:
   /// All zeros: what a file holds before a run has begun.
   RecordBytes() : bytes(4096, '\0') {}
-  explicit RecordBytes(const void* record) : bytes(static_cast<const char*>(record), 4096) {}
+  /// As they are now.
+  static RecordBytes ofFile(const std::string& path);
 
   /// A record that makes sense: process 77, step 5 "testing setting states", effSetBypass (44) value 1 under
   /// way as request 335.
