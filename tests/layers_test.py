@@ -12,9 +12,10 @@ import re
 import tempfile
 import unittest
 
-LAYERS = ["worker", "driver", "describe", "host", "loader", "support", "platform"]
-USERS_OF_VST2 = ["worker", "driver", "describe", "host", "vst2"]
-USERS_OF_FLIGHT_RECORDER = ["worker", "driver", "host", "loader", "vst2", "flight_recorder"]
+LAYERS = ["worker", "describer", "driver", "describe", "host", "loader", "support", "platform"]
+PROGRAMS = ["worker", "describer"]  # Nobody builds on a program, the other one neither.
+USERS_OF_VST2 = ["worker", "describer", "driver", "describe", "host", "vst2"]
+USERS_OF_FLIGHT_RECORDER = ["worker", "describer", "driver", "host", "loader", "vst2", "flight_recorder"]
 FOLDERS = [*LAYERS, "vst2", "flight_recorder"]
 SUFFIXES = {".h", ".cpp", ".mm"}
 
@@ -52,6 +53,8 @@ def without_comments(text):
 
 
 def may_include(folder, other):
+    if other in PROGRAMS:
+        return folder == other
     if other == "vst2":
         return folder in USERS_OF_VST2
     if other == "flight_recorder":

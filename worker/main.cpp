@@ -26,6 +26,7 @@ int complain(const std::string& mistake) {
 }  // namespace
 
 int main(int argc, const char** argv) {
+  initialiseUnwinder();
   WorkerOptions options;
   std::string mistake;
   if (!readCommandLine(argc, argv, options, mistake)) return complain(mistake);

@@ -13,43 +13,9 @@
 #include <utility>
 
 #include "platform/linux/core_foundation_objects.h"
+#include "platform/utf8.h"
 
 namespace {
-
-unsigned char byteAt(std::string_view bytes, std::size_t i) { return static_cast<unsigned char>(bytes[i]); }
-
-// The well-formed sequences of UTF-8 by their first byte. The bounds of the second byte exclude overlong
-// forms, surrogates and everything above U+10FFFF; further bytes are 80..BF.
-struct SequenceForm {
-  unsigned char lowestFirst, highestFirst, length, lowestSecond, highestSecond;
-};
-constexpr SequenceForm kSequenceForms[] = {
-    {0x00, 0x7F, 1, 0x00, 0x00},  //
-    {0xC2, 0xDF, 2, 0x80, 0xBF},  //
-    {0xE0, 0xE0, 3, 0xA0, 0xBF},  //
-    {0xE1, 0xEC, 3, 0x80, 0xBF},  //
-    {0xED, 0xED, 3, 0x80, 0x9F},  //
-    {0xEE, 0xEF, 3, 0x80, 0xBF},  //
-    {0xF0, 0xF0, 4, 0x90, 0xBF},  //
-    {0xF1, 0xF3, 4, 0x80, 0xBF},  //
-    {0xF4, 0xF4, 4, 0x80, 0x8F},
-};
-
-// The length in bytes of the well-formed sequence at the front of `bytes`, or 0.
-std::size_t sequenceLength(std::string_view bytes) {
-  const unsigned char first = byteAt(bytes, 0);
-  for (const SequenceForm& form : kSequenceForms) {
-    if (first < form.lowestFirst || first > form.highestFirst) continue;
-    if (form.length > bytes.size()) return 0;
-    for (std::size_t i = 1; i < form.length; ++i) {
-      const unsigned char lowest = i == 1 ? form.lowestSecond : 0x80;
-      const unsigned char highest = i == 1 ? form.highestSecond : 0xBF;
-      if (byteAt(bytes, i) < lowest || byteAt(bytes, i) > highest) return 0;
-    }
-    return form.length;
-  }
-  return 0;
-}
 
 bool isAscii(std::string_view bytes) {
   return std::all_of(bytes.begin(), bytes.end(), [](char c) { return static_cast<unsigned char>(c) < 0x80; });
@@ -59,7 +25,7 @@ bool isAscii(std::string_view bytes) {
 bool fitsEncoding(std::string_view text, CFStringEncoding encoding) {
   switch (encoding) {
     case kCFStringEncodingUTF8:
-      return core_foundation::isValidUtf8(text);
+      return isValidUtf8(text);
     case kCFStringEncodingASCII:
       return isAscii(text);
     default:
@@ -70,15 +36,6 @@ bool fitsEncoding(std::string_view text, CFStringEncoding encoding) {
 }  // namespace
 
 namespace core_foundation {
-
-bool isValidUtf8(std::string_view bytes) {
-  while (!bytes.empty()) {
-    const std::size_t length = sequenceLength(bytes);
-    if (length == 0) return false;
-    bytes.remove_prefix(length);
-  }
-  return true;
-}
 
 void logFailure(std::string_view reason) {
   constexpr char kHexDigits[] = "0123456789abcdef";

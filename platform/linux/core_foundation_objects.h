@@ -49,9 +49,6 @@ class ConstantTable {
   std::map<std::string, std::unique_ptr<const Constant>> objects;
 };
 
-/// True when `bytes` are whole, shortest-form UTF-8 sequences of U+0000 to U+10FFFF without surrogates.
-bool isValidUtf8(std::string_view bytes);
-
 /// Writes "vsttorture: ", `reason` and a line end to standard error, as one line of valid UTF-8: control
 /// characters become blanks, and in a text that is not UTF-8 every byte above 0x7F becomes \xNN.
 void logFailure(std::string_view reason);

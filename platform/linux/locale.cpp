@@ -6,6 +6,7 @@
 
 #include "platform/core_foundation.h"
 #include "platform/linux/core_foundation_objects.h"
+#include "platform/utf8.h"
 
 // NOLINTBEGIN(bugprone-reserved-identifier,misc-non-private-member-variables-in-classes): the system's own
 // name, and a record that only this file sees
@@ -28,7 +29,7 @@ std::string currentIdentifier() {
   }
   locale = locale.substr(0, locale.find_first_of(".@"));
   const bool namesNoLocale = locale.empty() || locale == "C" || locale == "POSIX";
-  return namesNoLocale || !core_foundation::isValidUtf8(locale) ? "en_US_POSIX" : std::string(locale);
+  return namesNoLocale || !isValidUtf8(locale) ? "en_US_POSIX" : std::string(locale);
 }
 
 }  // namespace
