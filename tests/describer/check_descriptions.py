@@ -20,6 +20,7 @@ import subprocess
 import sys
 
 SKIPPED = 77
+DEBIANS_PYTHON = "/usr/bin/python3"
 LIMIT_IN_SECONDS = 60
 REAL_PLACES = ["/usr/lib/vst/*.so", "/usr/lib/vst/*/*.so", "/usr/lib/lxvst/*.so",
                "/usr/lib/*-linux-gnu/iem-plugin-suite/vst/*.so"]
@@ -106,12 +107,16 @@ def main():
     arguments = parser.parse_args()
     if arguments.read:
         read_module(arguments.read)
+    required = os.environ.get("VSTTORTURE_REAL_PLUGINS") == "required"
 
     try:
         import jsonschema  # pylint: disable=import-outside-toplevel
     except ImportError:
-        print("skipped: this Python has no package jsonschema (Debian: python3-jsonschema)")
-        return SKIPPED
+        # Debian's package belongs to Debian's Python, which need not be the first in the path.
+        if os.path.exists(DEBIANS_PYTHON) and not os.path.samefile(sys.executable, DEBIANS_PYTHON):
+            os.execv(DEBIANS_PYTHON, [DEBIANS_PYTHON, "-B", *sys.argv])
+        print("there is no package jsonschema for this Python (Debian: python3-jsonschema)")
+        return 1 if required else SKIPPED
     with open(arguments.schema, encoding="utf-8") as file:
         schema = json.load(file)
     jsonschema.Draft202012Validator.check_schema(schema)
@@ -121,7 +126,6 @@ def main():
     if arguments.real:
         found = {os.path.realpath(path) for place in REAL_PLACES for path in glob.glob(place)}
         modules = sorted(path for path in found if not path.startswith(tuple(NO_PLUGINS)))
-        required = os.environ.get("VSTTORTURE_REAL_PLUGINS") == "required"
         if not modules and not required:
             print("skipped: none of the packages is installed")
             return SKIPPED
