@@ -22,10 +22,10 @@ import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import explain_plugin  # noqa: E402
-import try_plugin  # noqa: E402
-from program_run import (LIMIT_IN_SECONDS, Child, Seen, differences, environment_of, expected_output,  # noqa: E402
-                         expected_steps, plugin_path, steps_and_tail, take_default_signals, without_noise)
-from rows import ALL_STEPS, KIND_OF, PLACE_OF, STEP_TEXTS, all_rows  # noqa: E402
+from fault_matrix import (command_of, differences, environment_of, limit_of, number_of_steps, run_program,  # noqa: E402
+                          take_default_signals, try_plugin, without_noise)
+from rows import ALL_STEPS, KIND_OF, PLACE_OF, all_rows  # noqa: E402
+from sanitizers import kinds_of  # noqa: E402
 
 # ----- The request at each place: index, value and float, where they are not all 0.
 ARGUMENTS = {
@@ -79,17 +79,15 @@ CRASHES_AT_EXIT = ["crash_in_atexit", "crash_in_every_atexit", "crash_in_static_
 THROW = ["throw_int", "throw_runtime_error", "throw_struct"]
 ON_A_THREAD = ["thread_crash", "thread_throw", "thread_crash_behind_the_run"]
 # The signal that the kind blocks arrives when the guard of another unblocks it.
-LATER_SIGNALS = {"block_signals+raise:SIGTERM+null_store": ("SIGSEGV", PLUGIN),
+LATER_SIGNALS = {"raise_in_atexit:SIGSEGV": ("SIGSEGV", LIBRARY),
+                 "null_chunk": ("SIGSEGV", LIBRARY),  # in the copy that the program makes
+                 "block_signals+raise:SIGTERM+null_store": ("SIGSEGV", PLUGIN),
                  "crash_in_static_destructor+crash_in_atexit+raise:SIGTERM": ("SIGTERM", LIBRARY)}
 # Whole plug-ins: the place at which each of them ends the run, and the signal.
 PLACE_OF_PLUGIN = {"open_crashes": "dispatch:0", "exits_on_open": "dispatch:0", "exits_in_test": "dispatch:52"}
 SIGNAL_OF_PLUGIN = {"open_crashes": ("SIGSEGV", PLUGIN)}
 # Overwrites the guard's own stack: whichever notices first.
 LONG_TEXTS = {"SIGABRT", "SIGSEGV", "SIGBUS", "SIGILL"}
-
-
-def kinds_of(row):
-    return (row.kind or "").split("+")
 
 
 def request_at(place):
@@ -112,15 +110,13 @@ def is_without_instance(row):
     """Whether the program has to crash on purpose."""
     if row.kind is None:
         return row.plugin in ("no_entry", "null_instance", "entry_throws")
-    is_thrown = row.plugin == "faulty" and any(kind in THROW for kind in kinds_of(row))
+    is_thrown = any(kind in THROW for kind in kinds_of(row))
     return row.kind == "no_instance" or is_thrown and PLACE_OF[row.place].thrown in ("no instance",
                                                                                    "no second instance")
 
 
 def expected_signal(row):
     """Its name and place; None where no handler of ours is called, or the row says nothing about it."""
-    if row.plugin == "faulty_own_runtime" and row.kind in THROW:
-        return ("SIGABRT", LIBRARY)  # at once, in the unwinder that meets another one
     if row.kind in LATER_SIGNALS:
         return LATER_SIGNALS[row.kind]
     if row.end.status is not None and row.end.status < 0:
@@ -152,7 +148,7 @@ def signal_differences(row, record, plugins):
         found.append(f"{name} instead of {expected[0]}")
     if expected[1] == WORKER and (os.path.basename(fault.module) != "vsttorture-worker" or fault.address != 0):
         found.append(f"in {fault.module!r} at {fault.address:#x} instead of the worker's own crash")
-    if expected[1] == PLUGIN and (fault.module != plugin_path(row, plugins) or fault.offset == 0):
+    if expected[1] == PLUGIN and (fault.module != command_of(row, "", plugins)[1] or fault.offset == 0):
         found.append(f"in {fault.module!r}+{fault.offset:#x} instead of the plug-in")
     if expected[1] == LIBRARY and not os.path.basename(fault.module).startswith("libc.so"):
         found.append(f"in {fault.module!r} instead of the C library")
@@ -161,7 +157,7 @@ def signal_differences(row, record, plugins):
         found.append(f"thread {fault.thread} of process {record.process}")
     if expected in (("SIGSEGV", PLUGIN), ("SIGSEGV", WORKER)) and fault.code <= 0:
         found.append(f"code {fault.code}")
-    if expected[1] == LIBRARY and (fault.code > 0 or fault.sender != record.process):
+    if expected[1] == LIBRARY and row.kind != "null_chunk" and (fault.code > 0 or fault.sender != record.process):
         found.append(f"code {fault.code} from process {fault.sender}")
     return found
 
@@ -175,14 +171,15 @@ def leads_to(row):
         return "passed"
     if row.kind is None and row.end.verdict == "not loadable":
         return "not loaded"
-    if row.kind is None or row.kind == "no_instance" or row.kind.startswith("long_texts"):
+    if row.kind is None or row.kind in ("no_instance", "null_chunk") or row.kind.startswith("long_texts"):
         return "outside"
-    if row.plugin == "faulty" and (any(kind in THROW for kind in kinds) or "leave_the_thread" in kinds):
+    if any(kind in THROW for kind in kinds) or "leave_the_thread" in kinds:
         return "thrown"
     if row.kind in ("close_stdout", "hang_in_atexit", "hold_stdout_lock"):
         return "passed"  # as far as the plug-in is concerned
     if row.end.status is None or row.end.status < 0 or row.end.verdict.startswith(("crashed", "exited", "killed")):
         is_late = row.kind in KIND_OF and KIND_OF[row.kind].leads_to == "late"
+        is_late = is_late or row.kind.startswith("raise_in_atexit")
         return "late" if is_late else "inside"
     is_gone = kinds[-1] in ("_exit", "quick_exit", "exec") or re.match(r"(_exit|exec|quick_exit)\b", row.kind)
     return "inside" if is_gone else "passed"
@@ -239,16 +236,16 @@ def thrown_verdict(row):
 
 def record_differences(row, record, output, plugins):
     found = []
-    if record.bundle != plugin_path(row, plugins):
+    if record.bundle != command_of(row, "", plugins)[1]:
         found.append(f"bundle {record.bundle}")
-    texts, _ = steps_and_tail(without_noise(row, output) or "", row.end.total)
-    steps, text = expected_steps(row, texts), texts[-1] if texts else ""
+    _, texts = try_plugin.read_steps(without_noise(row, output) or "")
+    steps, text = number_of_steps(row, texts), texts[-1] if texts else ""
     if row.kind == "close_stdout":
         steps, text = 1 if row.end.total == 51 else ALL_STEPS, None  # all of them, unseen
     if row.kind == "close_stdout+null_store":
         text = None
     if row.kind == "hold_stdout_lock":
-        steps, text = steps + 1, STEP_TEXTS[steps]  # the next step waits for the lock
+        steps, text = steps + 1, try_plugin.FIXED_STEPS[steps]  # the next step waits for the lock
     if record.step != steps or len(record.step_times) != steps:
         found.append(f"step {record.step} with {len(record.step_times)} times instead of {steps}")
     if text is not None and record.step_text != text:
@@ -256,28 +253,13 @@ def record_differences(row, record, output, plugins):
     return found + signal_differences(row, record, plugins) + end_differences(row, record)
 
 
-def run_worker(row, worker, plugins, record):
-    """One run as program_run makes it, with a record."""
-    with tempfile.TemporaryDirectory(prefix="fault_matrix.") as home, tempfile.TemporaryFile() as errors:
-        started = time.monotonic()
-        command = [worker, "--record", record, plugin_path(row, plugins)]
-        child = Child(command, home, environment_of(row, home), errors)
-        if row.end.status is None:
-            ended = not child.wait_for_text(expected_output(row), LIMIT_IN_SECONDS)
-        else:
-            ended = child.wait(LIMIT_IN_SECONDS)
-        status = child.finish()
-        errors.seek(0)
-        return Seen(child.output(), errors.read().decode(errors="replace"), status if ended else None,
-                    time.monotonic() - started, os.listdir(home))
-
-
 def check(row, worker, plugins):
     """What is wrong with the row; empty when it holds."""
     with tempfile.TemporaryDirectory(prefix="flight_records.") as folder:
         path = os.path.join(folder, "record")
-        seen = run_worker(row, worker, plugins, path)
-        found = differences(row, seen, try_plugin.judge)
+        _, plugin = command_of(row, worker, plugins)
+        seen = run_program([worker, "--record", path, plugin], limit_of(row), environment_of(row))
+        found = differences(row, seen)
         with open(path, "rb") as file:
             data = file.read()
     try:
