@@ -100,20 +100,23 @@ struct FlightRecord {
   std::uint32_t unexpectedExit;        ///< 1: exit() was called in the middle of the run.
   std::uint32_t unused1[3];
 
-  alignas(64) std::uint64_t requestsMade;
+  alignas(8) std::uint64_t requestsMade;
   FlightRequest request;  ///< The one under way, or the last.
+  unsigned char unused2[24];
 
-  alignas(64) FlightHostRequest hostRequest;  ///< The last one.
+  FlightHostRequest hostRequest;  ///< The last one.
+  unsigned char unused3[32];
 
-  alignas(64) FlightRequest thrown;  ///< The last one that was left by an exception.
+  FlightRequest thrown;  ///< The last one that was left by an exception.
   FlightFault fault;
+  unsigned char unused4[56];
 
-  alignas(64) char stepText[kFlightStepTextSize];
-  alignas(64) std::uint64_t stepTimes[kFlightStepTimes];  ///< Step N began at stepTimes[(N - 1) % 80].
+  char stepText[kFlightStepTextSize];
+  alignas(8) std::uint64_t stepTimes[kFlightStepTimes];  ///< Step N began at stepTimes[(N - 1) % 80].
 
   char modulePath[kFlightPathSize];  ///< Of the image that holds the program counter; its end, if too long.
   char bundlePath[kFlightPathSize];  ///< As given on the command line; its end, if too long.
-  unsigned char unused2[1024];
+  unsigned char unused5[1024];
 };
 
 static_assert(sizeof(FlightRecord) == kFlightRecordSizeInBytes);
@@ -137,7 +140,7 @@ static_assert(offsetof(FlightRecord, stepText) == 320);
 static_assert(offsetof(FlightRecord, stepTimes) == 384);
 static_assert(offsetof(FlightRecord, modulePath) == 1024);
 static_assert(offsetof(FlightRecord, bundlePath) == 2048);
-static_assert(offsetof(FlightRecord, unused2) == 3072);
+static_assert(offsetof(FlightRecord, unused5) == 3072);
 
 static_assert(sizeof(FlightRequest) == 32 && sizeof(FlightHostRequest) == 32 && sizeof(FlightFault) == 40);
 static_assert(offsetof(FlightRequest, state) == 0 && offsetof(FlightRequest, kind) == 4);
