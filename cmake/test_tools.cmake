@@ -1,28 +1,42 @@
 # SPDX-License-Identifier: MIT
-# Decides whether the tests are built: sets BUILD_THE_TESTS.
+# Decides whether the tests are built: sets VSTTORTURE_HAS_TESTS. Finds their tools: Python 3 and GoogleTest.
 #
-# The program itself needs a compiler only, so a machine without the tests' tools still builds it.
-set(VSTTORTURE_TESTS AUTO CACHE STRING "Build the tests: OFF, AUTO (where their tools are found) or ON (insist)")
-set_property(CACHE VSTTORTURE_TESTS PROPERTY STRINGS AUTO ON OFF)
+# The program itself needs a compiler only, so a machine without these tools still builds it.
+option(VSTTORTURE_REQUIRE_TESTS "Stop when the tests' tools are missing; otherwise the tests are left out" OFF)
 set(VSTTORTURE_GOOGLETEST_DIR /usr/src/googletest CACHE PATH "GoogleTest's source folder")
 
-set(BUILD_THE_TESTS OFF)
-if(VSTTORTURE_TESTS)
-  set(missing_test_tools "")
-  if(NOT EXISTS ${VSTTORTURE_GOOGLETEST_DIR}/CMakeLists.txt)
-    list(APPEND missing_test_tools "GoogleTest's sources in ${VSTTORTURE_GOOGLETEST_DIR}")
+# find_test_tools(MISSING): says in MISSING what is missing; empty if nothing is.
+# GoogleTest as installed is used where it suits: it has the compiler's usual word size and no sanitizers. Other
+# builds make it from its sources.
+macro(find_test_tools missing)
+  set(${missing} "")
+  set(VSTTORTURE_GOOGLETEST_IS_INSTALLED OFF)
+  if(NOT VSTTORTURE_SANITIZE)
+    find_package(GTest 1.12 QUIET CONFIG)
+    if(TARGET GTest::gtest AND TARGET GTest::gmock_main)
+      set(VSTTORTURE_GOOGLETEST_IS_INSTALLED ON)
+    endif()
+  endif()
+  if(NOT VSTTORTURE_GOOGLETEST_IS_INSTALLED AND NOT EXISTS ${VSTTORTURE_GOOGLETEST_DIR}/CMakeLists.txt)
+    list(APPEND ${missing} "GoogleTest (Debian: libgmock-dev)")
   endif()
   find_package(Python3 3.7 QUIET COMPONENTS Interpreter)
   if(NOT Python3_Interpreter_FOUND)
-    list(APPEND missing_test_tools "Python 3")
+    list(APPEND ${missing} "Python 3")
   endif()
+  list(JOIN ${missing} " and " ${missing})
+endmacro()
 
-  list(JOIN missing_test_tools " and " missing_test_tools)
+set(VSTTORTURE_HAS_TESTS OFF)
+if(BUILD_TESTING)
+  find_test_tools(missing_test_tools)
   if(NOT missing_test_tools)
-    set(BUILD_THE_TESTS ON)
-  elseif(VSTTORTURE_TESTS STREQUAL "AUTO")
-    message(STATUS "Tests are left out: there is no ${missing_test_tools}")
+    set(VSTTORTURE_HAS_TESTS ON)
+  elseif(VSTTORTURE_REQUIRE_TESTS)
+    message(FATAL_ERROR "The tests cannot be built without ${missing_test_tools}")
   else()
-    message(FATAL_ERROR "Tests are wanted, but there is no ${missing_test_tools}")
+    message(STATUS "The tests are left out: there is no ${missing_test_tools}")
   endif()
+elseif(VSTTORTURE_REQUIRE_TESTS)
+  message(FATAL_ERROR "VSTTORTURE_REQUIRE_TESTS contradicts BUILD_TESTING=OFF")
 endif()

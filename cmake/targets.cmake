@@ -1,25 +1,12 @@
 # SPDX-License-Identifier: MIT
-# What every target of ours is compiled with.
-set(CMAKE_CXX_STANDARD 17)
-set(CMAKE_CXX_STANDARD_REQUIRED ON)
-set(CMAKE_CXX_EXTENSIONS OFF)
-set(CMAKE_C_STANDARD 99)
-set(CMAKE_POSITION_INDEPENDENT_CODE ON)
-
-# Stack protection turns a text that is longer than our buffer into an abort, which is a known end.
-add_library(house_rules INTERFACE)
-target_include_directories(house_rules INTERFACE ${PROJECT_SOURCE_DIR})
-target_compile_options(house_rules INTERFACE
-  -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wformat=2 -Werror
-  $<$<COMPILE_LANGUAGE:CXX>:-Wold-style-cast>
-  -fstack-protector-strong)
+# Functions that make the targets of the program and the sample plug-ins.
 
 # A static library of the program: one folder, its sources listed by name.
 #   add_program_library(loader SOURCES module_loader.cpp USES support)
 function(add_program_library name)
   cmake_parse_arguments(ARG "" "" "SOURCES;USES" ${ARGN})
   add_library(${name} STATIC ${ARG_SOURCES})
-  target_link_libraries(${name} PUBLIC house_rules ${ARG_USES})
+  target_link_libraries(${name} PUBLIC project_options ${ARG_USES} PRIVATE program_hardening)
   if(VSTTORTURE_TIDY)
     set_target_properties(${name} PROPERTIES CXX_CLANG_TIDY "clang-tidy;--quiet;--warnings-as-errors=*")
   endif()
@@ -27,7 +14,7 @@ endfunction()
 
 # Sanitizers and coverage stay out of plug-ins: real ones have none either.
 set(sample_plugin_options -fno-sanitize=all)
-if(CMAKE_CXX_FLAGS MATCHES "--coverage")
+if(VSTTORTURE_COVERAGE)
   list(APPEND sample_plugin_options -fno-profile-arcs -fno-test-coverage)
 endif()
 
@@ -36,7 +23,7 @@ endif()
 function(add_sample_plugin_library name)
   cmake_parse_arguments(ARG "" "" "SOURCES;USES" ${ARGN})
   add_library(${name} STATIC ${ARG_SOURCES})
-  target_link_libraries(${name} PRIVATE house_rules PUBLIC vst2 ${ARG_USES})
+  target_link_libraries(${name} PRIVATE project_options PUBLIC vst2 ${ARG_USES})
   target_compile_options(${name} PRIVATE ${sample_plugin_options})
   set_target_properties(${name} PROPERTIES CXX_VISIBILITY_PRESET hidden VISIBILITY_INLINES_HIDDEN ON)
 endfunction()
@@ -47,7 +34,7 @@ function(add_sample_plugin name)
   cmake_parse_arguments(ARG "" "" "SOURCES;USES" ${ARGN})
   set(exported_names ${PROJECT_SOURCE_DIR}/plugins/base/exported_names.map)
   add_library(${name} MODULE ${ARG_SOURCES})
-  target_link_libraries(${name} PRIVATE house_rules vst2 ${ARG_USES})
+  target_link_libraries(${name} PRIVATE project_options vst2 ${ARG_USES})
   target_compile_options(${name} PRIVATE ${sample_plugin_options})
   target_link_options(${name} PRIVATE -fno-sanitize=all -Wl,--no-undefined
     -Wl,--version-script=${exported_names})
