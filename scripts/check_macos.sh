@@ -7,7 +7,7 @@ cd "$(dirname "$(readlink -f "$0")")/.."
 
 . scripts/build.sh
 
-install_packages cmake ninja-build python3 g++ g++-multilib clang-14 lld-14 llvm-14 libc++-14-dev libc++abi-14-dev \
+need_packages "to check the sources for macOS" cmake ninja-build python3 g++ g++-multilib clang-14 lld-14 llvm-14 libc++-14-dev libc++abi-14-dev \
   gobjc++ libgnustep-base-dev libc6-dev-arm64-cross
 
 status=0

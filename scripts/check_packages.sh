@@ -224,7 +224,7 @@ choose() {
   root=$work/$architecture
 }
 
-install_packages g++ g++-multilib cmake ninja-build mmdebstrap arch-test
+need_packages "to check the packages" g++ g++-multilib cmake ninja-build mmdebstrap arch-test
 mirror=$(mirror)
 if [[ -z $mirror ]]; then
   "${as_root[@]}" apt-get update -qq
