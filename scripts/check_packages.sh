@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: MIT
-# Checks the Debian packages, amd64 out of build/release and i386 out of build/x86: makes each, installs it on a fresh
-# Debian 12 that holds what the package asks for and nothing else, runs the program there, and removes it again.
-# One line for each check; status 1 when one fails. Works as root, else through sudo; all it makes is in a folder of
-# its own, which goes away.
+# Checks the Debian packages, amd64 out of build/release and i386 out of build/x86: makes each, looks at what is in it
+# (lintian, mandoc, readelf), installs it on a fresh Debian 12 that holds what the package asks for and nothing else,
+# runs the program there, and removes it again.
+# One line for each check; status 1 when one fails. Works as root, else through sudo. Apart from the two builds, all it
+# makes is in a folder of its own, which is removed at the end.
 # shellcheck disable=SC2016 # What looks like an expansion in single quotes is apt's or dpkg's own.
 set -euo pipefail
 cd "$(dirname "$(readlink -f "$0")")/.."
@@ -89,11 +90,11 @@ run() {
 check_contents() {
   check "the package says what it is and what it needs" \
     "Package: vsttorture
-Version: 0.1.0
+Version: $version
 Architecture: $architecture
 Section: sound
 Priority: optional
-Depends: libc6 (>= 2.36), libstdc++6 (>= 12), libgcc-s1" \
+Depends: libc6 (>= 2.34), libgcc-s1 (>= $oldest_libgcc), libstdc++6 (>= 9)" \
     "$(dpkg-deb -f "$package" Package Version Architecture Section Priority Depends)"
 
   check "it holds the program, its man page and what makers of hosts read" \
@@ -105,21 +106,53 @@ drwxr-xr-x root/root ./usr/share/doc/
 drwxr-xr-x root/root ./usr/share/doc/vsttorture/
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/PROTOCOL.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/changelog.gz
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/copyright
 drwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/
 -rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/try_plugin.py
 drwxr-xr-x root/root ./usr/share/man/
 drwxr-xr-x root/root ./usr/share/man/man1/
 -rw-r--r-- root/root ./usr/share/man/man1/vsttorture.1.gz" \
     "$(dpkg-deb -c "$package" | awk '{ print $1, $2, $6 }' | sort -k 3)"
+
+  local unpacked=$work/unpacked_$architecture
+  dpkg-deb -x "$package" "$unpacked"
+  check "lintian finds no error and gives no warning" "" \
+    "$(lintian --no-cfg --allow-root --display-level '>=warning' "$package" 2>&1)"
+  check "mandoc finds no fault in the man page" "" \
+    "$(gunzip -c "$unpacked/usr/share/man/man1/vsttorture.1.gz" | mandoc -T lint -W style 2>&1)"
+  check_hardening "$unpacked/usr/bin/vsttorture"
+}
+
+# check_hardening PROGRAM
+check_hardening() {
+  check "it can be loaded at any address" "DYN (Position-Independent Executable file)" \
+    "$(readelf -h "$1" | sed -n 's/^ *Type: *//p')"
+  check "all its symbols are bound before it starts" "BIND_NOW NOW PIE" \
+    "$(readelf -dW "$1" | sed -n 's/.*(FLAGS\(_1\)\?) *\(Flags: \)\?//p' | xargs)"
+  check "its tables are read-only after that, and its stack holds no code" "GNU_STACK RW
+GNU_RELRO R" \
+    "$(readelf -lW "$1" | awk '$1 == "GNU_STACK" || $1 == "GNU_RELRO" { print $1, $7 }')"
+  check "its stack and its calls of the C library are checked" "__snprintf_chk
+__stack_chk_fail" \
+    "$(readelf --dyn-syms -W "$1" | grep -oE '__(snprintf_chk|stack_chk_fail)\b' | sort -u)"
+  check "it opens files of 2 GiB and more" "" "$(narrow_functions "$1")"
+}
+
+# narrow_functions PROGRAM: what it calls that has only 32 bits for the size of a file. None on amd64.
+narrow_functions() {
+  [[ $architecture == i386 ]] || return 0
+  readelf --dyn-syms -W "$1" |
+    grep -oE ' (creat|f?open|openat|f?l?stat|fstatat|mmap|lseek|f?truncate|pread|pwrite|readdir|fseeko|ftello)(@|$)' || true
 }
 
 check_installed() {
-  check "dpkg installs it" "ii  0.1.0" "$(in_root dpkg -i /vsttorture.deb >"$work/log" 2>&1 || cat "$work/log"
+  check "dpkg installs it" "ii  $version" "$(in_root dpkg -i /vsttorture.deb >"$work/log" 2>&1 || cat "$work/log"
     in_root dpkg-query -W -f '${db:Status-Abbrev} ${Version}' vsttorture 2>&1)"
   check "every file is as packed" \
     "usr/bin/vsttorture: OK
 usr/share/doc/vsttorture/PROTOCOL.md: OK
 usr/share/doc/vsttorture/changelog.gz: OK
+usr/share/doc/vsttorture/copyright: OK
 usr/share/doc/vsttorture/examples/try_plugin.py: OK
 usr/share/man/man1/vsttorture.1.gz: OK" \
     "$(in_root md5sum --check /var/lib/dpkg/info/vsttorture.md5sums 2>&1; in_root dpkg --verify vsttorture 2>&1)"
@@ -128,8 +161,8 @@ usr/share/man/man1/vsttorture.1.gz: OK" \
   page=$(gunzip -c "$root/usr/share/man/man1/vsttorture.1.gz")
   changelog=$(gunzip -c "$root/usr/share/doc/vsttorture/changelog.gz")
   check "the man page and the changelog are of this version" \
-    '.TH VSTTORTURE 1 "" "vsttorture 0.1.0" "User Commands"
-vsttorture (0.1.0) bookworm; urgency=medium' "${page%%$'\n'*}
+    "$(head -n 1 docs/vsttorture.1)
+$(head -n 1 docs/changelog)" "${page%%$'\n'*}
 ${changelog%%$'\n'*}"
 
   check "the program is of this architecture" "$elf" \
@@ -207,6 +240,8 @@ steps_to_the_tail_size="total, 64
 5, testing setting states
 6, inspect latency"
 
+version=$(sed -n 's/^project(vsttorture VERSION \([0-9.]*\).*/\1/p' CMakeLists.txt)
+
 # choose ARCHITECTURE: says which of the two packages the functions above are about.
 choose() {
   architecture=$1
@@ -214,17 +249,20 @@ choose() {
     amd64)
       preset=release other_preset=x86 elf=$'ELF64\nAdvanced Micro Devices X86-64'
       other_architecture="is for i386, this program is for x86_64"
+      oldest_libgcc=3.0
       ;;
     i386)
       preset=x86 other_preset=release elf=$'ELF32\nIntel 80386'
       other_architecture="is for x86_64, this program is for i386"
+      oldest_libgcc=4.2
       ;;
   esac
-  package=$work/$preset/vsttorture_0.1.0_$architecture.deb
+  package=$work/$preset/vsttorture_${version}_$architecture.deb
   root=$work/$architecture
 }
 
-need_packages "to check the packages" g++ g++-multilib cmake ninja-build mmdebstrap arch-test
+need_packages "to check the packages" g++ g++-multilib cmake ninja-build dpkg-dev mmdebstrap arch-test lintian mandoc \
+  binutils
 mirror=$(mirror)
 if [[ -z $mirror ]]; then
   "${as_root[@]}" apt-get update -qq

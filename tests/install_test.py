@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: MIT
-"""Tests of `cmake --install`: what lies where, below a staging folder and below prefixes of all kinds.
+"""Tests of `cmake --install`: which files it puts where, below a staging folder and below prefixes of all kinds; and
+that all files that name the version name the same one.
 
     install_test.py BUILD SAMPLE_PLUGIN
 
@@ -7,6 +8,7 @@ The build is the one that is being tested, so each preset installs its own progr
 """
 import os
 import pathlib
+import re
 import stat
 import subprocess
 import sys
@@ -18,12 +20,14 @@ INSTALLED = {
     "bin/vsttorture": 0o755,
     "share/doc/vsttorture/PROTOCOL.md": 0o644,
     "share/doc/vsttorture/changelog": 0o644,
+    "share/doc/vsttorture/copyright": 0o644,
     "share/doc/vsttorture/examples/try_plugin.py": 0o755,
     "share/man/man1/vsttorture.1": 0o644,
 }
 COPIES = {
     "share/doc/vsttorture/PROTOCOL.md": "docs/PROTOCOL.md",
     "share/doc/vsttorture/changelog": "docs/changelog",
+    "share/doc/vsttorture/copyright": "docs/copyright",
     "share/doc/vsttorture/examples/try_plugin.py": "docs/examples/try_plugin.py",
     "share/man/man1/vsttorture.1": "docs/vsttorture.1",
 }
@@ -69,6 +73,19 @@ class Install(unittest.TestCase):
         (self.folder / "share/doc/vsttorture/PROTOCOL.md").write_text("old")
         self.install(self.folder)
         self.check(self.folder, "")
+
+
+class Version(unittest.TestCase):
+    def first(self, pattern, path):
+        return re.search(pattern, pathlib.Path(path).read_text(), re.MULTILINE)[1]
+
+    def test_every_file_that_names_the_version_names_that_of_the_build(self):
+        self.assertEqual({
+            "docs/vsttorture.1": self.first(r'^\.TH VSTTORTURE 1 \S+ "vsttorture ([^"]+)"', SOURCE / "docs/vsttorture.1"),
+            "docs/changelog": self.first(r"\Avsttorture \(([^)]+)\)", SOURCE / "docs/changelog"),
+            "CHANGELOG.md": self.first(r"^## (\S+)", SOURCE / "CHANGELOG.md"),
+        }, dict.fromkeys(["docs/vsttorture.1", "docs/changelog", "CHANGELOG.md"],
+                         self.first(r"^CMAKE_PROJECT_VERSION:STATIC=(.*)$", pathlib.Path(build, "CMakeCache.txt"))))
 
 
 if __name__ == "__main__":
