@@ -18,13 +18,18 @@ FOLDERS = ("worker", "driver", "describe", "host", "loader", "support", "platfor
 # What a source may include in angle brackets: headers that macOS has and that need no other library of C++ than the
 # one of macOS 10.13.
 HEADERS = set("""
-    algorithm array atomic cctype cerrno climits cmath csignal cstdarg cstddef cstdint cstdio cstdlib cstring cwchar ctime
-    exception functional initializer_list iterator limits map memory mutex new numeric optional random set stdexcept
-    string string_view thread tuple type_traits typeinfo unordered_map utility vector
+    algorithm array atomic cctype cerrno climits cmath csignal cstdarg cstddef cstdint cstdio cstdlib cstring ctime
+    cwchar exception functional initializer_list iterator limits map memory mutex new numeric optional random set
+    stdexcept string string_view thread tuple type_traits typeinfo unordered_map utility vector
     fcntl.h poll.h pthread.h sys/mman.h sys/resource.h sys/stat.h sys/types.h unistd.h
     CoreFoundation/CoreFoundation.h ExceptionHandling/NSExceptionHandler.h Foundation/Foundation.h
     libkern/OSAtomic.h mach/mach.h mach/semaphore.h mach/sync_policy.h mach/task.h
     """.split())
+
+PRESETS = "CMakePresets.json"
+PRESET_OLDEST_SYSTEM = next(
+    preset for preset in json.loads((ROOT / PRESETS).read_text())["configurePresets"]
+    if preset["name"] == "mac_settings")["cacheVariables"]["CMAKE_OSX_DEPLOYMENT_TARGET"]
 
 # No source of the program: it compiles where the records of the plug-in interface are laid out as plug-ins expect.
 LAYOUT_CHECK = "tests/vst2/record_layout_check.cpp"
@@ -67,30 +72,39 @@ NEWER_LIBRARY_CONTROL = (
 class Target:
     """The program for one kind of Mac."""
 
-    def __init__(self, triple):
-        self.triple = triple
-        self.name = triple.split("-")[0]
-        self.directory = BUILD / self.name
+    def __init__(self, architecture, source=ROOT, directory=None):
+        self.name = architecture
+        self.source = source
+        self.directory = directory or BUILD / self.name
         self.commands = {}  # the compiler's command of each source, by its path in the project
         self.objects = []
 
-    def configure(self):
-        version = re.search(r"macosx?([\d.]+)$", self.triple).group(1)
+    def configure(self, how="for macOS"):
+        """Everything but the architecture comes from the preset."""
         result = run(["cmake", "--preset", "mac_check", "-B", str(self.directory),
-                      f"-DVSTTORTURE_MAC_TARGET={self.triple}", f"-DCMAKE_OSX_ARCHITECTURES={self.name}",
-                      f"-DCMAKE_OSX_DEPLOYMENT_TARGET={version}"], cwd=ROOT)
+                      f"-DVSTTORTURE_MAC_ARCHITECTURE={self.name}"], cwd=self.source)
         if result.returncode != 0:
-            return report(f"{self.name}: CMake configures the build for macOS", False, result.stdout)
+            return report(f"{self.name}: CMake configures the build {how}", False, result.stdout)
         for entry in json.loads((self.directory / "compile_commands.json").read_text()):
             command = shlex.split(entry["command"])
-            self.commands[entry["file"].removeprefix(f"{ROOT}/")] = command
+            self.commands[entry["file"].removeprefix(f"{self.source}/")] = command
             self.objects.append(command[command.index("-o") + 1])
-        return report(f"{self.name}: CMake configures the build for macOS", True)
+        return report(f"{self.name}: CMake configures the build {how}", True)
 
     def compile(self):
         result = run(["ninja", "-C", str(self.directory), "-k", "0", *self.objects])
-        return report(f"{self.name}: {len(self.commands)} sources compile for {self.triple}",
-                      result.returncode == 0, result.stdout)
+        return report(f"{self.name}: {len(self.commands)} sources compile", result.returncode == 0, result.stdout)
+
+    def oldest_systems(self):
+        """The oldest macOS that each object file is made for."""
+        headers = run(["llvm-objdump-14", "--macho", "--private-headers", *self.objects], cwd=self.directory).stdout
+        return re.findall(r"^ +(?:version|minos) ([\d.]+)$", headers, re.MULTILINE)
+
+    def check_oldest_system(self):
+        oldest = "11.0" if self.name == "arm64" else PRESET_OLDEST_SYSTEM
+        found = self.oldest_systems()
+        report(f"{self.name}: all sources are compiled for macOS {oldest} on", found == [oldest] * len(self.objects),
+               str(found))
 
     def compile_with_fault(self, control, output=None):
         """The compiler's answer to a source with a fault, in it or in a header of it."""
@@ -182,6 +196,24 @@ class Target:
                    surplus == {"_fflush_unlocked"} and not surplus & allowed, str(surplus))
 
 
+def check_preset_control():
+    """A tree that differs in the preset's deployment target alone: its object files differ in just that."""
+    tree = BUILD / "other_deployment_target"
+    run(["rm", "-rf", str(tree)])
+    (tree / "source").mkdir(parents=True)
+    for path in ROOT.iterdir():
+        if path.name not in ("build", PRESETS):
+            (tree / "source" / path.name).symlink_to(path)
+    (tree / "source" / PRESETS).write_text(doctored(
+        PRESETS, f'"CMAKE_OSX_DEPLOYMENT_TARGET": "{PRESET_OLDEST_SYSTEM}"', '"CMAKE_OSX_DEPLOYMENT_TARGET": "10.14"'))
+    target = Target("x86_64", tree / "source", tree / "x86_64")
+    if target.configure("with another deployment target in the preset"):
+        target.objects = [name for name in target.objects if "exceptions.cpp" in name]
+        run(["ninja", "-C", str(target.directory), *target.objects])
+        found = target.oldest_systems()
+        report("x86_64: control: another deployment target in the preset is seen", found == ["10.14"], str(found))
+
+
 def undefined_in(linker_output):
     return set(re.findall(r"undefined symbol: (\S+)", linker_output))
 
@@ -222,9 +254,9 @@ def check_headers():
 
 
 def main():
-    targets = [Target(triple) for triple in
-               ("x86_64-apple-macosx10.13", "i386-apple-macosx10.13", "arm64-apple-macos11")]
+    targets = [Target(architecture) for architecture in ("x86_64", "i386", "arm64")]
     check_headers()
+    check_preset_control()
     for target in targets:
         if not target.configure():
             continue
@@ -232,6 +264,7 @@ def main():
             check_completeness(target.commands)
         if not target.compile():
             continue
+        target.check_oldest_system()
         target.check_layout()
         target.compile_controls()
         if target.name == "i386":

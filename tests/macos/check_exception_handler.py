@@ -1,8 +1,9 @@
 # SPDX-License-Identifier: MIT
-"""Runs the Objective-C++ source of macOS on GNUstep, with a double of macOS's exception handler.
+"""Runs the sources of macOS on GNUstep, with a double of macOS's exception handler.
 
 First the guard alone, whose double tells each thing that is done to it; then the whole program on a plug-in that
-raises an exception of Foundation. The controls are programs with a fault; each has to look different.
+raises an exception of Foundation, and on plug-ins with older entry points. The controls are programs with a fault;
+each has to look different.
 """
 
 import subprocess
@@ -88,6 +89,18 @@ def check_exception():
         report(f"GNUstep: control: {fault} is seen", found == control != wanted, show(found))
 
 
+def check_entry_points():
+    """macOS's plug-ins export VSTPluginMain or main_macho. "main" is a name for Linux alone."""
+    refused = ("unexpected exit", 7)
+    for program, plugin, what, passes in (
+            ("torture", "main_macho_entry", "the entry point main_macho is found", True),
+            ("torture", "older_entry", "the entry point main is not looked for", False),
+            ("torture_with_entry_name_of_linux", "older_entry", "control: with Linux's source it is found", True)):
+        output, errors, status = outcome(program, str(DIRECTORY / "program" / "plugins" / f"{plugin}.so"))
+        passed = output.startswith(STEPS) and "\n65, " in output and status == 0
+        report(f"GNUstep: {what}", passed if passes else (output, status) == refused, show((output, errors, status)))
+
+
 def main():
     steps = (["cmake", "-G", "Ninja", "-S", str(ROOT / "tests" / "macos" / "gnustep"), "-B", str(DIRECTORY),
               "-DCMAKE_BUILD_TYPE=Release"], ["ninja", "-C", str(DIRECTORY)])
@@ -99,6 +112,7 @@ def main():
     report("GNUstep: the program builds with the sources of macOS", True)
     check_guard()
     check_exception()
+    check_entry_points()
     return verdict()
 
 

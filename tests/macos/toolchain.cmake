@@ -2,12 +2,14 @@
 # Builds the program for macOS on a machine that is none, to check its sources: clang, libc++'s headers, the C
 # library's headers of this machine, and stubs of our own in place of an SDK. What comes out of it never runs.
 #
-#   VSTTORTURE_MAC_TARGET    x86_64-apple-macosx10.13, i386-apple-macosx10.13 or arm64-apple-macos11
-#   VSTTORTURE_MAC_LIBRARIES where the stubs to link against stand; tests/macos/stubs/sysroot by default
+#   VSTTORTURE_MAC_ARCHITECTURE x86_64, i386 or arm64
+#   CMAKE_OSX_DEPLOYMENT_TARGET the oldest macOS that the program runs on; the preset sets it
+#   VSTTORTURE_MAC_LIBRARIES    where the stubs to link against stand; tests/macos/stubs/sysroot by default
 set(CMAKE_SYSTEM_NAME Darwin)
 set(CMAKE_TRY_COMPILE_TARGET_TYPE STATIC_LIBRARY)  # there is no system to link a whole program against
-list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES VSTTORTURE_MAC_TARGET)
-string(REGEX MATCH "^[^-]+" CMAKE_SYSTEM_PROCESSOR "${VSTTORTURE_MAC_TARGET}")
+list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES VSTTORTURE_MAC_ARCHITECTURE)
+set(CMAKE_SYSTEM_PROCESSOR ${VSTTORTURE_MAC_ARCHITECTURE})
+set(CMAKE_OSX_ARCHITECTURES ${VSTTORTURE_MAC_ARCHITECTURE} CACHE STRING "")
 
 set(stubs ${CMAKE_CURRENT_LIST_DIR}/stubs)
 set(VSTTORTURE_MAC_LIBRARIES ${stubs}/sysroot CACHE PATH "Stubs of the libraries to link against")
@@ -32,7 +34,8 @@ set(config_site_directory ${CMAKE_CURRENT_BINARY_DIR}/libcxx_config)
 file(CONFIGURE OUTPUT ${config_site_directory}/__config_site CONTENT "${config_site}" @ONLY)
 
 foreach(language C CXX OBJCXX)
-  set(CMAKE_${language}_COMPILER_TARGET ${VSTTORTURE_MAC_TARGET})
+  # Without a version: that comes from the deployment target, as on a Mac. For arm64 clang makes it 11 at least.
+  set(CMAKE_${language}_COMPILER_TARGET ${VSTTORTURE_MAC_ARCHITECTURE}-apple-macosx)
   set(CMAKE_${language}_STANDARD_INCLUDE_DIRECTORIES ${stubs}/include ${c_headers})
   # The compiler's own __nonnull is in the way of glibc's.
   set(CMAKE_${language}_FLAGS_INIT "-U__nonnull -D_GNU_SOURCE")
