@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: MIT
-"""Holds the program's sources against the map of its folders.
+"""Checks what the folders of the program include (docs/ARCHITECTURE.md shows which may include which).
 
 A folder may include itself and those below it; vst2/ may be included by host/ and above, flight_recorder/ by those
 that make requests, report or load. Only platform/ asks
@@ -112,10 +112,10 @@ def faults(root):
 class TheProgram(unittest.TestCase):
     ROOT = pathlib.Path(__file__).resolve().parent.parent
 
-    def test_it_keeps_to_the_map(self):
+    def test_no_folder_includes_what_it_may_not(self):
         self.assertEqual(faults(self.ROOT), [])
 
-    def test_every_folder_of_the_map_has_sources_that_were_read(self):
+    def test_sources_of_every_folder_were_read(self):
         for folder in FOLDERS:
             self.assertTrue(list(sources(self.ROOT / folder)), folder)
 
@@ -156,7 +156,7 @@ class Faults(unittest.TestCase):
                         self.assert_fault(f"{folder}/a.h", text,
                                           f"{folder}/a.h:2: {folder}/ may not include {other}/")
 
-    def test_a_folder_that_is_not_on_the_map_is_a_fault(self):
+    def test_a_folder_outside_the_program_is_a_fault(self):
         self.assert_fault("host/a.cpp", '#include "tests/a.h"', "host/a.cpp:1: host/ may not include tests/")
 
     def test_an_include_without_a_folder_is_a_fault(self):

@@ -13,7 +13,7 @@ import sys
 from checks import BUILD, ROOT, doctored, report, run, verdict
 
 HERE = ROOT / "tests" / "macos"
-FOLDERS = ("worker", "driver", "describe", "host", "loader", "support", "platform", "vst2", "flight_recorder")
+FOLDERS = ("worker", "describer", "driver", "describe", "host", "loader", "support", "platform", "vst2", "flight_recorder")
 
 # What a source may include in angle brackets: headers that macOS has and that need no other library of C++ than the
 # one of macOS 10.13.
@@ -205,13 +205,17 @@ def check_preset_control():
         if path.name not in ("build", PRESETS):
             (tree / "source" / path.name).symlink_to(path)
     (tree / "source" / PRESETS).write_text(doctored(
-        PRESETS, f'"CMAKE_OSX_DEPLOYMENT_TARGET": "{PRESET_OLDEST_SYSTEM}"', '"CMAKE_OSX_DEPLOYMENT_TARGET": "10.14"'))
+        PRESETS, f'"CMAKE_OSX_DEPLOYMENT_TARGET": "{PRESET_OLDEST_SYSTEM}"', '"CMAKE_OSX_DEPLOYMENT_TARGET": "10.11"'))
     target = Target("x86_64", tree / "source", tree / "x86_64")
     if target.configure("with another deployment target in the preset"):
-        target.objects = [name for name in target.objects if "exceptions.cpp" in name]
+        objects = {name.rpartition("/")[2]: name for name in target.objects}
+        target.objects = [objects["recursive_mutex.cpp.o"]]
         run(["ninja", "-C", str(target.directory), *target.objects])
         found = target.oldest_systems()
-        report("x86_64: control: another deployment target in the preset is seen", found == ["10.14"], str(found))
+        report("x86_64: control: another deployment target in the preset is seen", found == ["10.11"], str(found))
+        result = run(["ninja", "-C", str(target.directory), objects["exceptions.cpp.o"]])
+        report("x86_64: control: a function of macOS 10.12 is refused there",
+               "'uncaught_exceptions' is unavailable: introduced in macOS 10.12" in result.stdout, result.stdout)
 
 
 def undefined_in(linker_output):

@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: MIT
-"""Runs the sources of macOS on GNUstep, with a double of macOS's exception handler.
+"""Runs the sources of macOS on GNUstep, with a double of macOS's exception handler; in 32 bits, where there is no
+GNUstep, on a double of Foundation.
 
 First the guard alone, whose double tells each thing that is done to it; then the whole program on a plug-in that
 raises an exception of Foundation, and on plug-ins with older entry points. The controls are programs with a fault;
@@ -10,8 +11,6 @@ import subprocess
 import sys
 
 from checks import BUILD, ROOT, report, run, verdict
-
-DIRECTORY = BUILD / "gnustep"
 
 ARMED = """\
 handler: delegate nidu_VST_Support_ExceptionHandlerDelegate
@@ -46,19 +45,43 @@ handler: handle NobodyCatchesThis, mask 512
 """
 
 
-def outcome(program, *arguments):
-    """Standard output, standard error and status."""
-    result = run([str(DIRECTORY / program), *arguments], stderr=subprocess.PIPE)
-    return result.stdout, result.stderr, result.returncode
+class Build:
+    """The programs of tests/macos/gnustep, in one word size."""
+
+    def __init__(self, name, directory, flags=""):
+        self.name = name
+        self.directory = BUILD / directory
+        self.flags = flags
+
+    def build(self):
+        languages = [f"-DCMAKE_{language}_FLAGS={self.flags}" for language in ("C", "CXX", "OBJCXX")]
+        steps = (["cmake", "-G", "Ninja", "-S", str(ROOT / "tests" / "macos" / "gnustep"), "-B", str(self.directory),
+                  "-DCMAKE_BUILD_TYPE=Release", *languages], ["ninja", "-C", str(self.directory)])
+        for step in steps:
+            result = run(step)
+            if result.returncode != 0:
+                return self.report("the program builds with the sources of macOS", False, result.stdout)
+        return self.report("the program builds with the sources of macOS", True)
+
+    def report(self, what, passed, details=""):
+        return report(f"{self.name}: {what}", passed, details)
+
+    def outcome(self, program, *arguments):
+        """Standard output, standard error and status."""
+        result = run([str(self.directory / program), *arguments], stderr=subprocess.PIPE)
+        return result.stdout, result.stderr, result.returncode
+
+
+BUILDS = (Build("GNUstep", "gnustep"), Build("32-bit", "gnustep_32_bit", "-m32"))
 
 
 def show(found):
     return f"standard output:\n{found[0]}\nstandard error:\n{found[1]}\nstatus {found[2]}"
 
 
-def check_guard():
-    found = outcome("trace")
-    report("GNUstep: the guard arms the handler, answers and lets go in order", found == ("", GUARD, 0), show(found))
+def check_guard(build):
+    found = build.outcome("trace")
+    build.report("the guard arms the handler, answers and lets go in order", found == ("", GUARD, 0), show(found))
     for program, fault, before, after in (
             ("trace_release_order", "delegate released before pool",
              "pool: drained\nhandler: delegate nil\n", "handler: delegate nil\npool: drained\n"),
@@ -66,16 +89,16 @@ def check_guard():
             ("trace_guard_first", "signal guard before the delegate", ARMED,
              "\n".join(ARMED.splitlines()[2:] + ARMED.splitlines()[:2]) + "\n"),
             ("trace_stays_attached", "a delegate that stays attached", "handler: delegate nil\n", "")):
-        found = outcome(program)
-        report(f"GNUstep: control: {fault} is seen", found == ("", GUARD.replace(before, after), 0) != ("", GUARD, 0),
-               show(found))
+        found = build.outcome(program)
+        build.report(f"control: {fault} is seen", found == ("", GUARD.replace(before, after), 0) != ("", GUARD, 0),
+                 show(found))
 
 
-def check_exception():
-    plugin = str(DIRECTORY / "raises_exception.so")
+def check_exception(build):
+    plugin = str(build.directory / "raises_exception.so")
     wanted = (STEPS + "unexpected exit", RAISED, 7)
-    found = outcome("torture", plugin)
-    report("GNUstep: an exception raised in a plug-in is logged, handled and ends with status 7", found == wanted,
+    found = build.outcome("torture", plugin)
+    build.report("an exception raised in a plug-in is logged, handled and ends with status 7", found == wanted,
            show(found))
     caught = STEPS + "!gather info failed, unknown error\n"
     for program, fault, control in (
@@ -85,34 +108,28 @@ def check_exception():
              (caught, RAISED[:RAISED.index("handler: handle")] + "handler: delegate nil\n", 3)),
             ("torture_not_logged", "an exception not logged",
              (wanted[0], RAISED.replace("answered yes", "answered no"), 7))):
-        found = outcome(program, plugin)
-        report(f"GNUstep: control: {fault} is seen", found == control != wanted, show(found))
+        found = build.outcome(program, plugin)
+        build.report(f"control: {fault} is seen", found == control != wanted, show(found))
 
 
-def check_entry_points():
+def check_entry_points(build):
     """macOS's plug-ins export VSTPluginMain or main_macho. "main" is a name for Linux alone."""
     refused = ("unexpected exit", 7)
     for program, plugin, what, passes in (
             ("torture", "main_macho_entry", "the entry point main_macho is found", True),
             ("torture", "older_entry", "the entry point main is not looked for", False),
             ("torture_with_entry_name_of_linux", "older_entry", "control: with Linux's source it is found", True)):
-        output, errors, status = outcome(program, str(DIRECTORY / "program" / "plugins" / f"{plugin}.so"))
+        output, errors, status = build.outcome(program, str(build.directory / "program" / "plugins" / f"{plugin}.so"))
         passed = output.startswith(STEPS) and "\n65, " in output and status == 0
-        report(f"GNUstep: {what}", passed if passes else (output, status) == refused, show((output, errors, status)))
+        build.report(what, passed if passes else (output, status) == refused, show((output, errors, status)))
 
 
 def main():
-    steps = (["cmake", "-G", "Ninja", "-S", str(ROOT / "tests" / "macos" / "gnustep"), "-B", str(DIRECTORY),
-              "-DCMAKE_BUILD_TYPE=Release"], ["ninja", "-C", str(DIRECTORY)])
-    for step in steps:
-        result = run(step)
-        if result.returncode != 0:
-            report("GNUstep: the program builds with the sources of macOS", False, result.stdout)
-            return verdict()
-    report("GNUstep: the program builds with the sources of macOS", True)
-    check_guard()
-    check_exception()
-    check_entry_points()
+    for build in BUILDS:
+        if build.build():
+            check_guard(build)
+            check_exception(build)
+            check_entry_points(build)
     return verdict()
 
 

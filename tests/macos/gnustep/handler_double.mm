@@ -5,6 +5,7 @@
 // Signals whose handlers the program installs are told too (the linker's --wrap=signal).
 #include <csignal>
 #include <cstdio>
+#include <cstring>
 
 #import <ExceptionHandling/NSExceptionHandler.h>
 #import <Foundation/Foundation.h>
