@@ -17,7 +17,7 @@ def run(command, **options):
     environment = {name: value for name, value in os.environ.items() if name != "LIBRARY_PATH"}
     options.setdefault("stderr", subprocess.STDOUT)
     return subprocess.run(command, shell=isinstance(command, str), stdout=subprocess.PIPE, text=True,
-                          errors="replace", env=environment, timeout=300, check=False, **options)
+                          errors="replace", env=environment, timeout=1800, check=False, **options)
 
 
 def report(name, passed, details=""):
