@@ -6,9 +6,11 @@
 include(GNUInstallDirs)
 install(TARGETS vsttorture RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT vsttorture)
 install(FILES docs/vsttorture.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT vsttorture)
-# For makers of hosts. The example keeps its place beside PROTOCOL.md, which points to it.
+# For makers of hosts. The examples are where the links in PROTOCOL.md expect them.
 install(FILES docs/PROTOCOL.md docs/changelog docs/copyright
         DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT vsttorture)
+install(FILES docs/examples/try_plugin.cpp
+        DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)
 install(PROGRAMS docs/examples/try_plugin.py DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)
 
 set(CPACK_GENERATOR DEB)

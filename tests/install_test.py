@@ -21,6 +21,7 @@ INSTALLED = {
     "share/doc/vsttorture/PROTOCOL.md": 0o644,
     "share/doc/vsttorture/changelog": 0o644,
     "share/doc/vsttorture/copyright": 0o644,
+    "share/doc/vsttorture/examples/try_plugin.cpp": 0o644,
     "share/doc/vsttorture/examples/try_plugin.py": 0o755,
     "share/man/man1/vsttorture.1": 0o644,
 }
@@ -28,6 +29,7 @@ COPIES = {
     "share/doc/vsttorture/PROTOCOL.md": "docs/PROTOCOL.md",
     "share/doc/vsttorture/changelog": "docs/changelog",
     "share/doc/vsttorture/copyright": "docs/copyright",
+    "share/doc/vsttorture/examples/try_plugin.cpp": "docs/examples/try_plugin.cpp",
     "share/doc/vsttorture/examples/try_plugin.py": "docs/examples/try_plugin.py",
     "share/man/man1/vsttorture.1": "docs/vsttorture.1",
 }
