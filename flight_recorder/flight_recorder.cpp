@@ -72,6 +72,12 @@ void RequestUnderWay::noteThrown() {
   record.thrown.step = record.step;
 }
 
+void ValuesUnderWay::hasThrown() {
+  RequestUnderWay::noteThrown();
+  flightRecord().request.kind = kFlightGetParameter;
+  flightRecord().request.state = kFlightUnderWay;
+}
+
 void noteHostRequest(std::int32_t opcode, std::int32_t index, std::int64_t value, std::uint32_t thread) {
   volatile FlightHostRequest& request = flightRecord().hostRequest;
   __atomic_store_n(&request.opcode, opcode, __ATOMIC_RELAXED);

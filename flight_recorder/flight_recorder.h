@@ -46,19 +46,6 @@ class RequestUnderWay {
  public:
   /// Loading, or a call of the entry point.
   explicit RequestUnderWay(FlightRequestKind kind) { begin(flightRecord(), kind); }
-  /// The value of a parameter is asked for.
-  RequestUnderWay(FlightRequestKind kind, std::int32_t index) {
-    volatile FlightRecord& record = flightRecord();
-    record.request.index = index;
-    begin(record, kind);
-  }
-  /// The value of a parameter is set.
-  RequestUnderWay(FlightRequestKind kind, std::int32_t index, float newValue) {
-    volatile FlightRecord& record = flightRecord();
-    record.request.index = index;
-    record.request.opt = newValue;
-    begin(record, kind);
-  }
   /// The dispatcher is called.
   RequestUnderWay(std::int32_t opcode, std::int32_t index, std::int64_t value, float opt) {
     volatile FlightRecord& record = flightRecord();
@@ -80,6 +67,8 @@ class RequestUnderWay {
   }
 
  private:
+  friend class ValuesUnderWay;
+
   static void begin(volatile FlightRecord& record, FlightRequestKind kind) {
     record.request.kind = kind;
     record.requestsMade = record.requestsMade + 1;
@@ -88,6 +77,43 @@ class RequestUnderWay {
   static void noteThrown();
 
   bool hasReturned = false;
+};
+
+/// Values of parameters that are read or set in a row: one store for each that is read, since a simple plug-in
+/// answers so fast that more would be seen.
+///
+/// The row is one request that stays under way until its end, also in the few instructions between two values;
+/// its index is always that of the last one. The count of requests is brought up to date at the row's end.
+class ValuesUnderWay {
+ public:
+  /// Just before the first value is read.
+  void begin(std::int32_t index) {
+    flightRecord().request.index = index;
+    flightRecord().request.kind = kFlightGetParameter;
+    flightRecord().request.state = kFlightUnderWay;
+  }
+  void end() {
+    flightRecord().requestsMade = flightRecord().requestsMade + made;
+    flightRecord().request.state = kFlightReturned;
+  }
+
+  /// Just before a value is read, and set.
+  void reads(std::int32_t index) {
+    flightRecord().request.index = index;
+    ++made;
+  }
+  void sets(float newValue) {
+    flightRecord().request.opt = newValue;
+    flightRecord().request.kind = kFlightSetParameter;
+    ++made;
+  }
+  void hasSet() { flightRecord().request.kind = kFlightGetParameter; }
+
+  /// The plug-in has thrown; the row goes on.
+  void hasThrown();
+
+ private:
+  std::uint64_t made = 0;
 };
 
 /// The plug-in asks its host for something, on any thread.

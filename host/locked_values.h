@@ -5,8 +5,6 @@
 // in a row therefore takes the lock once; VSTWrapper::getParameter and setParameter take it for one value.
 #pragma once
 
-#include <mutex>
-
 #include "flight_recorder/flight_recorder.h"
 #include "host/vst_wrapper.h"
 
@@ -16,7 +14,14 @@
 class LockedValues {
  public:
   explicit LockedValues(VSTWrapper& wrapper)
-      : effect(wrapper.effect), paramBeingSet(wrapper.paramBeingSet), hold(wrapper.lock, std::defer_lock) {}
+      : effect(wrapper.effect), lock(wrapper.lock), paramBeingSet(wrapper.paramBeingSet) {}
+  ~LockedValues() {
+    if (!isLocked) return;
+    record.end();
+    lock.unlock();
+  }
+  LockedValues(const LockedValues&) = delete;
+  LockedValues& operator=(const LockedValues&) = delete;
 
   [[nodiscard]] bool has(VstInt32 index) const {
     return effect != nullptr && index >= 0 && index < effect->numParams;
@@ -24,25 +29,27 @@ class LockedValues {
 
   [[nodiscard]] float get(VstInt32 index) {
     if (!has(index)) return 0.0f;
-    takeLock();
+    takeLock(index);
     try {
       return ask(index);
     } catch (...) {
+      record.hasThrown();
       return 0.0f;
     }
   }
 
   void set(VstInt32 index, float value) {
     if (!has(index)) return;
-    takeLock();
+    takeLock(index);
     try {
       // On purpose: a value equal to the present one is never sent.
       if (ask(index) == value) return;
       const ParamBeingSet being(paramBeingSet, index);
-      RequestUnderWay request(kFlightSetParameter, index, value);
+      record.sets(value);
       effect->setParameter(effect, index, value);
-      request.returned();
+      record.hasSet();
     } catch (...) {  // The parameter keeps the value that the plug-in left it with.
+      record.hasThrown();
     }
   }
 
@@ -60,20 +67,24 @@ class LockedValues {
     VstInt32& slot;
   };
 
-  void takeLock() {
-    if (!hold.owns_lock()) hold.lock();
+  void takeLock(VstInt32 index) {
+    if (isLocked) return;
+    lock.lock();
+    isLocked = true;
+    record.begin(index);
   }
 
   /// Asks the plug-in for a value. The volatile variable rounds it to 32 bits: where floats are returned in a
   /// wider register, the answer could otherwise differ from the value that the plug-in was given.
-  [[nodiscard]] float ask(VstInt32 index) const {
-    RequestUnderWay request(kFlightGetParameter, index);
+  [[nodiscard]] float ask(VstInt32 index) {
+    record.reads(index);
     const volatile float value = effect->getParameter(effect, index);
-    request.returned();
     return value;
   }
 
   AEffect* const effect;
+  const NiduCoreRecursiveMutex& lock;
   VstInt32& paramBeingSet;
-  std::unique_lock<const NiduCoreRecursiveMutex> hold;
+  ValuesUnderWay record;
+  bool isLocked = false;
 };

@@ -78,7 +78,7 @@ TEST_F(FlightRecorder, KeepsTheLastRequestThatThrewBesideTheOneUnderWay) {
   EXPECT_EQ(now().number32(220), 6u);
 }
 
-TEST_F(FlightRecorder, HoldsLoadingEntryAndParametersByTheirKinds) {
+TEST_F(FlightRecorder, HoldsLoadingAndTheEntryByTheirKinds) {
   {
     RequestUnderWay request(kFlightLoad);
     EXPECT_EQ(now().number32(76), 1u);
@@ -89,18 +89,38 @@ TEST_F(FlightRecorder, HoldsLoadingEntryAndParametersByTheirKinds) {
     EXPECT_EQ(now().number32(76), 2u);
     request.returned();
   }
-  {
-    RequestUnderWay request(kFlightGetParameter, 3);
-    EXPECT_EQ(now().number32(76), 4u);
-    EXPECT_EQ(now().number32(84), 3u);
-    request.returned();
-  }
-  RequestUnderWay request(kFlightSetParameter, 4, 1.0f);
-  EXPECT_EQ(now().number32(76), 5u);
+}
+
+TEST_F(FlightRecorder, HoldsTheLastOfValuesInARow) {
+  ValuesUnderWay values;
+  values.begin(3);
+  values.reads(3);
+  EXPECT_EQ(now().number32(72), 1u);
+  EXPECT_EQ(now().number32(76), 4u);
+  EXPECT_EQ(now().number32(84), 3u);
+  values.reads(4);
   EXPECT_EQ(now().number32(84), 4u);
+  values.sets(1.0f);
+  EXPECT_EQ(now().number32(76), 5u);
   EXPECT_EQ(now().number32(96), 0x3F800000u);
-  EXPECT_EQ(now().number64(64), 4u);
-  request.returned();
+  values.hasSet();
+  EXPECT_EQ(now().number32(76), 4u);
+  EXPECT_EQ(now().number32(72), 1u);
+  values.end();
+  EXPECT_EQ(now().number32(72), 2u);
+  EXPECT_EQ(now().number64(64), 3u);
+}
+
+TEST_F(FlightRecorder, NotesAValueThatThrewAndGoesOnWithTheRow) {
+  ValuesUnderWay values;
+  values.begin(3);
+  values.reads(3);
+  values.sets(1.0f);
+  values.hasThrown();
+  EXPECT_EQ(now().number32(196), 5u);
+  EXPECT_EQ(now().number32(204), 3u);
+  EXPECT_EQ(now().number32(72), 1u);
+  EXPECT_EQ(now().number32(76), 4u);
 }
 
 TEST_F(FlightRecorder, CountsTheRequestsOfManyThreadsToTheirHost) {
