@@ -14,6 +14,8 @@
 
 #include <unistd.h>
 
+#include "plugins/faulty/settings.h"
+
 namespace sample_plugins {
 
 VstInt32 longTextRequest = kNoRequest;
@@ -150,6 +152,13 @@ constexpr Fault kFaults[] = {
     {"fork_child_crashes", forkChildThatCrashes},
     {"vfork_child_crashes", vforkChildThatCrashes},
     {"exec", becomeAnotherProgram},
+    {"forge_lines", forgeLines},
+    {"forge_lines_in_a_child", forgeLinesInAChild},
+    {"forge_step", forgeStep},
+    {"forge_failure", forgeFailure},
+    {"forge_last_words", forgeLastWords},
+    {"scribble_over_the_record", scribbleOverTheRecord},
+    {"wipe_the_record", wipeTheRecord},
     {"change_locale_and_directory", changeLocaleAndDirectory},
     {"trap_floating_point", trapFloatingPoint},
     {"hang", hang},
@@ -180,8 +189,8 @@ void commitOneFault() {
 }  // namespace
 
 void commitFaults(bool whileLoading) {
-  const char* kinds = std::getenv("FAULT_KIND");
-  if (kinds == nullptr) complain("FAULT_PLACE is set, FAULT_KIND is not");
+  const std::string& kinds = faultSettings().kind;
+  if (kinds.empty()) complain("there is a place for a fault, and no kind of fault");
   std::istringstream stream(kinds);
   while (std::getline(stream, kindUnderWay(), '+')) {
     if (takeLoadSuffix(kindUnderWay()) == whileLoading) commitOneFault();
@@ -193,10 +202,7 @@ void complain(const std::string& problem) {
   _exit(125);
 }
 
-int exitStatus() {
-  const char* text = std::getenv("FAULT_STATUS");
-  return text == nullptr ? 0 : std::atoi(text);
-}
+int exitStatus() { return faultSettings().status; }
 
 void storeToAddressZero() {
   // Both are volatile, the pointer and what it points to: with either one alone, g++ removes the store.

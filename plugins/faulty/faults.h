@@ -99,4 +99,18 @@ void forkChildThatCrashes();
 void vforkChildThatCrashes();
 void becomeAnotherProgram();
 
+// Forgeries: what looks as if it came from the host.
+/// All lines of a run that passes.
+void forgeLines();
+/// The same, from a child; the plug-in waits for its end.
+void forgeLinesInAChild();
+/// The line of step 7, which is due behind the first request of step 6 (effGetTailSize, 52).
+void forgeStep();
+/// The line of a failure in step 6.
+void forgeFailure();
+void forgeLastWords();
+/// These two write over the host's flight record, which it keeps in a file named "record".
+void scribbleOverTheRecord();
+void wipeTheRecord();
+
 }  // namespace sample_plugins

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The well-behaved effect with one fault, chosen by FAULT_KIND and FAULT_PLACE (see faults.h and place.h).
+// The well-behaved effect with one fault, chosen by FAULT_KIND and FAULT_PLACE (see faults.h and place.h),
+// or by a file beside it (see settings.h).
 // Used by end_to_end_tests for every way in which a plug-in can end or disturb its process. The requests that
 // it receives are written to the file named in FAULT_LOG: "request OPCODE", one a line.
 #include <cstdio>

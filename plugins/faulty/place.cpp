@@ -3,12 +3,12 @@
 #include "plugins/faulty/place.h"
 
 #include <array>
-#include <cstdlib>
 #include <optional>
 #include <string>
 #include <utility>
 
 #include "plugins/faulty/faults.h"
+#include "plugins/faulty/settings.h"
 
 namespace sample_plugins {
 namespace {
@@ -59,8 +59,8 @@ Place parsePlace(const std::string& text) {
 
 /// Nothing when no fault is wanted.
 const std::optional<Place>& wantedPlace() {
-  static const char* const text = std::getenv("FAULT_PLACE");
-  static const std::optional<Place> place = text == nullptr ? std::nullopt : std::optional(parsePlace(text));
+  static const std::string& text = faultSettings().place;
+  static const std::optional<Place> place = text.empty() ? std::nullopt : std::optional(parsePlace(text));
   return place;
 }
 

@@ -2,9 +2,8 @@
 // What macOS adds to the threads of POSIX, as far as the program uses it.
 #pragma once
 
-#include_next <pthread.h>
-
 #include <mach/mach.h>
+#include_next <pthread.h>
 
 #ifdef __cplusplus
 extern "C" {
