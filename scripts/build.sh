@@ -101,6 +101,12 @@ need_build_tools() {
   return 1
 }
 
+# need_scan_libraries: what building vsttorture-scan takes in addition.
+need_scan_libraries() {
+  need_tools "to build vsttorture-scan" pkg-config /usr/include/uv.h=libuv1-dev /usr/include/CLI/CLI.hpp=libcli11-dev \
+    /usr/include/fmt/format.h=libfmt-dev /usr/include/nlohmann/json.hpp=nlohmann-json3-dev
+}
+
 # build_folder PRESET: where its build is: below $VSTTORTURE_BUILD, or else build/.
 build_folder() { echo "${VSTTORTURE_BUILD:-$PWD/build}/$1"; }
 

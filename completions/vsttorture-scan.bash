@@ -1,0 +1,32 @@
+# SPDX-License-Identifier: MIT
+# Completion of vsttorture-scan's options, values and paths for bash.
+_vsttorture_scan() {
+  local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
+  case $previous in
+    --sandbox)
+      mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$current")
+      return
+      ;;
+    --skip | --expect | --json)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -f -- "$current")
+      return
+      ;;
+    --workers)
+      compopt -o filenames
+      mapfile -t COMPREPLY < <(compgen -d -- "$current")
+      return
+      ;;
+    -j | --jobs | --step-limit | --limit | --memory | --repeat | --shard)
+      return
+      ;;
+  esac
+  if [[ $current == -* ]]; then
+    mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --skip --expect --shard
+      --sandbox --describe --display --json --quiet --no-progress --workers --help --version" -- "$current")
+  else
+    compopt -o filenames
+    mapfile -t COMPREPLY < <(compgen -f -- "$current")
+  fi
+}
+complete -F _vsttorture_scan vsttorture-scan

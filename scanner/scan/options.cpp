@@ -1,0 +1,115 @@
+// SPDX-License-Identifier: MIT
+#include "scanner/scan/options.h"
+
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+
+#include <CLI/CLI.hpp>
+#include <unistd.h>
+
+namespace scanner {
+namespace {
+
+constexpr const char* kDescription =
+    "Tortures VST 2.x plug-ins, each in a process of its own, and says which of them fail, where and why.\n"
+    "Without a path: the folders in VST_PATH, else those in which hosts look for plug-ins.";
+
+constexpr const char* kFooter =
+    "Status: 0 every plug-in as wanted, 1 not, 2 wrong use, 3 the scan could not go on, 130 interrupted.\n"
+    "vsttorture-scan(1) says what the lists look like; VERDICTS.md says what each verdict means.";
+
+std::string checkShard(const std::string& text) {
+  unsigned part = 0;
+  unsigned parts = 0;
+  char rest = 0;
+  const bool isShard = std::sscanf(text.c_str(), "%u/%u%c", &part, &parts, &rest) == 2;
+  return isShard && part >= 1 && part <= parts ? "" : "is K/N, with K from 1 to N";
+}
+
+std::string checkSeconds(const std::string& text) {
+  char* end = nullptr;
+  const double seconds = std::strtod(text.c_str(), &end);
+  const bool isNumber = !text.empty() && *end == '\0' && std::isfinite(seconds);
+  return isNumber && seconds > 0 ? "" : "\"" + text + "\" is no number of seconds above 0";
+}
+
+unsigned usableProcessors() {
+  const long count = sysconf(_SC_NPROCESSORS_ONLN);
+  return count > 0 ? static_cast<unsigned>(count) : 1;
+}
+
+}  // namespace
+
+std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& status) {
+  ScanOptions options;
+  options.engine.jobs = usableProcessors();
+  Limits& limits = options.engine.limits;
+  std::uint64_t memoryInMiB = limits.memoryInBytes >> 20;
+  std::string shard;
+  std::string sandbox = "auto";
+  bool hidesProgress = false;
+
+  CLI::App app(kDescription, "vsttorture-scan");
+  app.footer(kFooter);
+  app.set_version_flag("--version", "vsttorture-scan " VSTTORTURE_VERSION, "Print the version and end");
+  app.add_option("PATH", options.paths, "Plug-ins, and folders that are searched for plug-ins");
+  app.add_option("-j,--jobs", options.engine.jobs, "How many run at a time")
+      ->check(CLI::Range(1, 1024))
+      ->type_name("N")
+      ->capture_default_str();
+  app.add_option("--step-limit", limits.stepInSeconds, "Seconds that one step may take")
+      ->check(checkSeconds)
+      ->type_name("SECONDS")
+      ->capture_default_str();
+  app.add_option("--limit", limits.runInSeconds, "Seconds that a whole run may take")
+      ->check(checkSeconds)
+      ->type_name("SECONDS")
+      ->capture_default_str();
+  app.add_option("--memory", memoryInMiB, "MiB of memory that a run may use")
+      ->check(CLI::Range(1, 1 << 30))
+      ->type_name("MIB")
+      ->capture_default_str();
+  app.add_option("--repeat", options.repeat,
+                 "Run each plug-in N times, from the second time on with other contents of fresh memory")
+      ->check(CLI::Range(1, 10000))
+      ->type_name("N");
+  app.add_option("--skip", options.skipFile, "Do not run the plug-ins in this list")->type_name("FILE");
+  app.add_option("--expect", options.expectFile, "How each plug-in is expected to end")->type_name("FILE");
+  app.add_option("--shard", shard, "Only part K of N of the plug-ins")->check(checkShard)->type_name("K/N");
+  app.add_option("--sandbox", sandbox, "auto, required or off")
+      ->check(CLI::IsMember({"auto", "required", "off"}))
+      ->type_name("WHEN")
+      ->capture_default_str();
+  app.add_flag("--describe", options.describes, "Add each plug-in's description to its result");
+  app.add_flag("--display", options.engine.keepDisplay, "Let plug-ins see the display (DISPLAY)");
+  app.add_option("--json", options.jsonFile, "Write each event as one line of JSON; - is standard output")
+      ->type_name("FILE");
+  app.add_flag("--quiet", options.isQuiet, "No line for a plug-in that ended as it should");
+  app.add_flag("--no-progress", hidesProgress, "No progress line");
+  app.add_option("--workers", options.workerFolders, "Look for vsttorture-worker in this folder first")
+      ->type_name("FOLDER")
+      ->allow_extra_args(false);  // What follows is a path again.
+
+  try {
+    app.parse(argc, argv);
+  } catch (const CLI::ParseError& error) {
+    const bool isQuestion = error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success);
+    if (isQuestion) {
+      app.exit(error);
+    } else {
+      std::fprintf(stderr, "vsttorture-scan: %s\nvsttorture-scan --help says what there is.\n", error.what());
+    }
+    status = isQuestion ? kScanAsWanted : kScanWrongUse;
+    return std::nullopt;
+  }
+  limits.memoryInBytes = memoryInMiB << 20;
+  if (!shard.empty()) std::sscanf(shard.c_str(), "%u/%u", &options.shard.part, &options.shard.parts);
+  options.engine.sandbox = sandbox == "off"        ? SandboxUse::kOff
+                           : sandbox == "required" ? SandboxUse::kRequired
+                                                   : SandboxUse::kAuto;
+  options.showsProgress = !hidesProgress;
+  return options;
+}
+
+}  // namespace scanner

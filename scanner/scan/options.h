@@ -1,0 +1,41 @@
+// SPDX-License-Identifier: MIT
+// The command line of vsttorture-scan.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "scanner/engine/run_engine.h"
+#include "scanner/plan/run_list.h"
+
+namespace scanner {
+
+/// What the program ends with.
+enum ScanStatus : int {
+  kScanAsWanted = 0,     ///< Every plug-in ended as it should.
+  kScanNotAsWanted = 1,  ///< One or more did not.
+  kScanWrongUse = 2,     ///< Unknown options, no such path, no plug-in found.
+  kScanCannotGoOn = 3,   ///< No worker, no scratch folder, results that could not be written.
+  kScanInterrupted = 130,
+};
+
+struct ScanOptions {
+  std::vector<std::string> paths = {};  ///< Empty: the default places.
+  EngineOptions engine = {};
+  unsigned repeat = 1;
+  std::string skipFile = {};
+  std::string expectFile = {};
+  Shard shard = {};
+  bool describes = false;
+  std::string jsonFile = {};  ///< "-" for standard output.
+  bool isQuiet = false;
+  bool showsProgress = true;
+  std::vector<std::string> workerFolders = {};  ///< Looked into before the usual ones.
+};
+
+/// Reads the command line. Where there is nothing to scan (--help, --version, a mistake) the options are
+/// missing, the text is printed, and `status` is what to end with.
+std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& status);
+
+}  // namespace scanner

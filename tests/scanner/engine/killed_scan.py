@@ -1,0 +1,102 @@
+# SPDX-License-Identifier: MIT
+"""Kills vsttorture-scan with SIGKILL at random moments: nothing of it may be left a second later.
+
+    killed_scan.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--times 15] [--seed N]
+
+Each scan runs plug-ins that pass, that never end, and that leave processes with sessions of their own behind, some of
+them without any environment. A second after the kill there must be no process that has run since with one of their
+names, no scratch folder, and the file of events must end at a whole line. Prints the seed first, so that the same
+moments can be had again.
+"""
+import argparse
+import json
+import os
+import pathlib
+import random
+import shutil
+import subprocess
+import sys
+import tempfile
+import time
+
+SECONDS_TO_CLEAN_UP = 1.0
+LONGEST_LIFE_IN_SECONDS = 0.4
+UNRULY = ["fork", "fork_in_own_session", "fork_twice", "fork_twice_without_environment", "ignore_termination", "burn"]
+
+
+def processes_of(names):
+    """The processes, zombies left out, with one of the texts in their command lines."""
+    found = []
+    for folder in pathlib.Path("/proc").glob("[0-9]*"):
+        try:
+            command = (folder / "cmdline").read_bytes()
+        except OSError:
+            continue  # Gone meanwhile.
+        if int(folder.name) != os.getpid() and any(name.encode() in command for name in names):
+            found.append(f"{folder.name} {command.decode(errors='replace')!r}")
+    return found
+
+
+def problems_after_kill(world, token):
+    problems = [f"still running: {process}" for process in processes_of([token, str(world)])]
+    problems += [f"still there: {path}" for path in (world / "tmp").iterdir()]
+    return problems
+
+
+def kill_once(scan, world, token, draw):
+    """Starts a scan, kills it, and returns what is wrong a second later."""
+    events = world / "events"
+    events.unlink(missing_ok=True)
+    environment = dict(os.environ, TMPDIR=str(world / "tmp"), UNRULY=draw.choice(UNRULY), UNRULY_TOKEN=token)
+    sandbox = draw.choice(["off", "off", "auto"])
+    process = subprocess.Popen(
+        [scan, "-j", "4", "--no-progress", f"--sandbox={sandbox}", "--json", str(events), str(world / "plugins")],
+        env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+    time.sleep(draw.random() * LONGEST_LIFE_IN_SECONDS)
+    process.kill()
+    process.wait()
+    end = time.monotonic() + SECONDS_TO_CLEAN_UP
+    while (problems := problems_after_kill(world, token)) and time.monotonic() < end:
+        time.sleep(0.02)
+    written = events.read_bytes() if events.exists() else b""
+    for line in written.splitlines(keepends=True):
+        try:
+            json.loads(line)
+        except ValueError:
+            problems.append(f"no whole event: {line!r}")
+    if written and not written.endswith(b"\n"):
+        problems.append("the events do not end at a whole line")
+    return [f"{environment['UNRULY']}, sandbox {sandbox}: {problem}" for problem in problems], len(written)
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--scan", required=True)
+    parser.add_argument("--plugins", required=True, type=pathlib.Path)
+    parser.add_argument("--times", type=int, default=15)
+    parser.add_argument("--seed", type=int, default=random.SystemRandom().randrange(1 << 32))
+    arguments = parser.parse_args()
+    print(f"seed {arguments.seed}", flush=True)
+    draw = random.Random(arguments.seed)
+    problems = []
+    begun = 0
+    with tempfile.TemporaryDirectory(prefix="killed-scan-") as folder:
+        world = pathlib.Path(folder)
+        (world / "tmp").mkdir()
+        (world / "plugins").mkdir()
+        for number in range(30):
+            name = "unruly" if number % 3 == 0 else "well_behaved_effect"
+            shutil.copy(arguments.plugins / f"{name}.so", world / "plugins" / f"{number:02}_{name}.so")
+        for number in range(arguments.times):
+            found, written = kill_once(os.path.abspath(arguments.scan), world, f"{world.name}-{number}", draw)
+            begun += written > 0
+            problems += [f"kill {number}: {problem}" for problem in found]
+    for problem in problems:
+        print(problem)
+    print(f"{arguments.times} kills, {begun} of them after the scan had begun, {len(problems)} problems")
+    # If every kill came before anything ran, nothing was tested.
+    return 1 if problems or begun < arguments.times / 4 else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())

@@ -1,0 +1,221 @@
+// SPDX-License-Identifier: MIT
+#include <gmock/gmock.h>
+
+#include "scanner/report/terminal.h"
+
+using namespace scanner;
+using ::testing::HasSubstr;
+using ::testing::Not;
+
+namespace {
+
+PluginResult result(Verdict verdict, const std::string& bundle, const std::string& cause = "") {
+  PluginResult one;
+  one.run.bundle = bundle;
+  one.judgement.verdict = verdict;
+  one.judgement.cause = cause;
+  one.isWanted = rowOf(verdict).isGood;
+  if (verdict != Verdict::kSkipped && verdict != Verdict::kWrongArchitecture) {
+    one.seen = RunSeen{};
+    one.seen->wallSeconds = 1.25;
+    one.command = {"/usr/lib/vsttorture-worker", bundle};
+  }
+  return one;
+}
+
+PluginResult child(std::int32_t id, const std::string& name) {
+  PluginResult one = result(Verdict::kPassed, "/lib/shell.so");
+  one.run.child = id;
+  one.run.childName = name;
+  return one;
+}
+
+/// A report whose output is kept.
+struct Terminal {
+  explicit Terminal(unsigned columns = 80) {
+    options.isTerminal = true;
+    options.showsProgress = true;
+    options.columns = columns;
+  }
+  TerminalReport& report() {
+    if (!made)
+      made = std::make_unique<TerminalReport>(options, [this](const std::string& text) {
+        written += text;
+        return true;
+      });
+    return *made;
+  }
+  /// What was written since the last call.
+  std::string take() { return std::exchange(written, {}); }
+
+  TerminalOptions options;
+  std::string written;
+  std::unique_ptr<TerminalReport> made;
+};
+
+/// A scan with something of everything.
+std::string wholeReport(Terminal& terminal) {
+  TerminalReport& report = terminal.report();
+  ScanStarted started;
+  started.plugins = 5;
+  started.jobs = 2;
+  started.sandbox = "bubblewrap";
+  started.notes = {"not searched: /lib/closed: Permission denied"};
+  report.started(started);
+  report.ended(result(Verdict::kPassed, "/usr/lib/vst/effect.so"));
+  report.ended(child(-7, "Third child"));
+  PluginResult crashed = result(Verdict::kCrashed, "/usr/lib/vst/with blank/oscilloscope.so",
+                                "step 5, testing setting states: SIGSEGV in effSetBypass (44) value 1, in "
+                                "oscilloscope.so+0x43480c, through a null pointer");
+  report.ended(crashed);
+  PluginResult unmet = result(Verdict::kPassed, "/usr/lib/vst/mended.so");
+  unmet.expected = Expectation{"crashed", 5, "known", false};
+  unmet.isWanted = false;
+  report.ended(unmet);
+  PluginResult met = result(Verdict::kFailed, "/usr/lib/vst/known.so", "threw");
+  met.expected = Expectation{"failed", {}, "known", true};
+  met.isWanted = true;
+  report.ended(met);
+  PluginResult flaky = result(Verdict::kExited, "/usr/lib/vst/flaky.so", "ended the process with status 0");
+  flaky.repetitions = Repetitions{3, {{"passed", 2}, {"exited at 4", 1}}};
+  report.ended(flaky);
+  report.ended(result(Verdict::kSkipped, "/usr/lib/vst/skipped.so", "slow"));
+  report.ended(result(Verdict::kWrongArchitecture, "/usr/lib/vst/arm.so", "built for Linux on aarch64"));
+  ScanEnded ended;
+  ended.wallSeconds = 75;
+  ended.counts = {{"passed", 3}, {"crashed", 1}, {"failed", 1},
+                  {"exited", 1}, {"skipped", 1}, {"wrong_architecture", 1}};
+  report.ended(ended);
+  return terminal.take();
+}
+
+TEST(TerminalReport, TellsEverythingAt80Columns) {
+  Terminal terminal(80);
+  EXPECT_EQ(wholeReport(terminal),
+            R"(not searched: /lib/closed: Permission denied
+5 plug-ins, 2 at a time, sandbox: bubblewrap
+passed         1.2 s  /usr/lib/vst/effect.so
+passed         1.2 s  /lib/shell.so #-7 Third child
+crashed        1.2 s  /usr/lib/vst/with blank/oscilloscope.so
+passed         1.2 s  /usr/lib/vst/mended.so
+failed         1.2 s  /usr/lib/vst/known.so  as expected
+flaky          1.2 s  /usr/lib/vst/flaky.so
+skipped               /usr/lib/vst/skipped.so
+wrong_architecture           /usr/lib/vst/arm.so
+
+crashed  /usr/lib/vst/with blank/oscilloscope.so
+  step 5, testing setting states: SIGSEGV in effSetBypass (44) value 1, in
+  oscilloscope.so+0x43480c, through a null pointer
+  again: /usr/lib/vsttorture-worker '/usr/lib/vst/with blank/oscilloscope.so'
+passed  /usr/lib/vst/mended.so
+  expected: crashed at 5
+  again: /usr/lib/vsttorture-worker /usr/lib/vst/mended.so
+exited  /usr/lib/vst/flaky.so
+  ended the process with status 0
+  flaky: 1 of 3 exited at 4, 2 of 3 passed
+  again: /usr/lib/vsttorture-worker /usr/lib/vst/flaky.so
+wrong_architecture  /usr/lib/vst/arm.so
+  built for Linux on aarch64
+
+8 results: 3 passed, 1 failed, 1 crashed, 1 exited, 1 wrong_architecture, 1
+  skipped, in 75 s
+)");
+}
+
+TEST(TerminalReport, FitsInto40ColumnsButForCommands) {
+  Terminal terminal(40);
+  const std::string text = wholeReport(terminal);
+  for (std::size_t at = 0; at < text.size();) {
+    const std::size_t end = text.find('\n', at);
+    const std::string line = text.substr(at, end - at);
+    if (line.find("again: ") == std::string::npos) {
+      EXPECT_LE(line.size(), 40U) << line;
+    }
+    at = end + 1;
+  }
+  EXPECT_THAT(text, HasSubstr("crashed     oscilloscope.so\n"));
+  EXPECT_THAT(text, HasSubstr("wrong_architecture arm.so\n"));
+}
+
+TEST(TerminalReport, ShowsOnlyWhatIsNotAsWantedWhenQuiet) {
+  Terminal terminal;
+  terminal.options.isQuiet = true;
+  const std::string text = wholeReport(terminal);
+  for (const char* name : {"effect.so", "Third child", "skipped.so", "known.so", "at a time"})
+    EXPECT_THAT(text, Not(HasSubstr(name)));
+  for (const char* name : {"oscilloscope.so", "mended.so", "flaky.so", "arm.so", "8 results", "not searched"})
+    EXPECT_THAT(text, HasSubstr(name));
+}
+
+TEST(TerminalReport, ColoursWordsOnly) {
+  Terminal terminal;
+  terminal.options.hasColours = true;
+  terminal.report().ended(result(Verdict::kPassed, "/a"));
+  EXPECT_EQ(terminal.take(), "\x1b[32mpassed      \x1b[0m   1.2 s  /a\n");
+  terminal.report().ended(result(Verdict::kCrashed, "/a"));
+  EXPECT_EQ(terminal.take(), "\x1b[31mcrashed     \x1b[0m   1.2 s  /a\n");
+  PluginResult known = result(Verdict::kCrashed, "/a");
+  known.isWanted = true;
+  terminal.report().ended(known);
+  EXPECT_EQ(terminal.take(), "\x1b[33mcrashed     \x1b[0m   1.2 s  /a\n");
+}
+
+TEST(TerminalReport, WritesNoControlCodesWithoutATerminal) {
+  Terminal terminal;
+  terminal.options.isTerminal = false;
+  terminal.report().progress(1, 2, 3, {"a"});
+  EXPECT_THAT(wholeReport(terminal), Not(HasSubstr("\x1b")));
+}
+
+TEST(TerminalReport, ProgressStandsInPlaceAndMakesRoomForALine) {
+  Terminal terminal;
+  terminal.report().progress(3, 200, 71.5, {"a.so", "shell.so #1 One"});
+  EXPECT_EQ(terminal.take(), "\r\x1b[K3/200, 72 s left  a.so  shell.so #1 One");
+  terminal.report().ended(result(Verdict::kPassed, "/a"));
+  EXPECT_EQ(terminal.take(), "\r\x1b[Kpassed         1.2 s  /a\n");
+  terminal.report().ended(result(Verdict::kPassed, "/b"));
+  EXPECT_EQ(terminal.take(), "passed         1.2 s  /b\n");
+}
+
+TEST(TerminalReport, ProgressLeavesTheLastColumnFree) {
+  Terminal terminal(40);
+  terminal.report().progress(1, 9, 0, {std::string(100, 'a')});
+  EXPECT_EQ(terminal.take().size(), 39 + std::string("\r\x1b[K").size());
+}
+
+TEST(TerminalReport, ShowsNoControlCodesOfOthers) {
+  Terminal terminal;
+  PluginResult one = child(1, "\x1b[2J\nname\xFF");
+  one.run.bundle = "/lib/\x1b]0;title\x07.so";
+  terminal.report().ended(one);
+  EXPECT_EQ(terminal.take(), "passed         1.2 s  /lib/?]0;title?.so #1 ?[2J?name\xEF\xBF\xBD\n");
+  terminal.report().progress(0, 1, 0, {"\x1b[31m"});
+  EXPECT_EQ(terminal.take(), "\r\x1b[K0/1  ?[31m");
+}
+
+TEST(Printable, ControlCharactersOfEightBitsAreReplacedAndLettersStay) {
+  EXPECT_EQ(printable("a\xC2\x9B"
+                      "31m \xC3\xA9\xE2\x82\xAC"),
+            "a?31m \xC3\xA9\xE2\x82\xAC");
+}
+
+TEST(Shortened, KeepsBothEndsAndCountsCharacters) {
+  EXPECT_EQ(shortened("abcdefghij", 10), "abcdefghij");
+  EXPECT_EQ(shortened("abcdefghijk", 10), "ab...ghijk");
+  EXPECT_EQ(shortened("\xC3\xA9\xC3\xA9\xC3\xA9\xC3\xA9\xC3\xA9\xC3\xA9\xC3\xA9", 6),
+            "\xC3\xA9...\xC3\xA9\xC3\xA9");
+  EXPECT_EQ(shortened("abcdef", 2), "ab");
+}
+
+TEST(Wrapped, BreaksAtBlanksAndLongWordsWhereTheyMust) {
+  EXPECT_EQ(wrapped("one two three", 8, 2), "one two\n  three");
+  EXPECT_EQ(wrapped("abcdefghijklmnop", 8, 2), "abcdefgh\n  ijklmn\n  op");
+  EXPECT_EQ(wrapped("", 8, 2), "");
+}
+
+TEST(ShellCommand, QuotesWhatAShellWouldTakeApart) {
+  EXPECT_EQ(shellCommand({"/bin/worker", "/lib/it's a.so", "", "-7"}),
+            "/bin/worker '/lib/it'\\''s a.so' '' -7");
+}
+
+}  // namespace
