@@ -11,8 +11,8 @@ import tempfile
 import unittest
 
 SOURCE = pathlib.Path(__file__).resolve().parent.parent
-REAL_TOOLS = ["awk", "basename", "bash", "cat", "chmod", "dirname", "env", "grep", "mkdir", "readlink", "rm", "sed",
-              "sort", "touch"]
+REAL_TOOLS = ["awk", "basename", "bash", "cat", "chmod", "dirname", "env", "grep", "mkdir", "mktemp", "readlink", "rm",
+              "sed", "sort", "touch", "uname"]
 
 DOUBLES = {
     "id": "echo ${FAKE_USER_ID:-0}",
@@ -20,6 +20,8 @@ DOUBLES = {
     "g++": "exit 0",
     "c++": "exit 0",
     "ninja": "exit 0",
+    "pkg-config": "exit 0",
+    "bwrap": "exit 0",
     "python3": "exit 0",
     "ctest": 'echo "ctest $*" >>"$FAKE_LOG"; exit ${FAKE_CTEST_STATUS:-0}',
     # What it installs are doubles that were missing.
@@ -29,7 +31,7 @@ DOUBLES = {
         [[ $1 == update ]] || cp "$FAKE_SHOP"/* "${0%/*}"
         exit ${FAKE_APT_STATUS:-0}''',
     "sudo": 'echo "sudo $*" >>"$FAKE_LOG"; exec "$@"',
-    # Its program prints its arguments and ends with status 42.
+    # Its programs print their names and arguments and end with status 42.
     "cmake": '''
         [[ $1 != --version ]] || { echo "cmake version ${FAKE_CMAKE_VERSION:-3.25.1}"; exit; }
         echo "cmake $*" >>"$FAKE_LOG"
@@ -43,7 +45,8 @@ DOUBLES = {
         else
           [[ -z ${FAKE_BUILD_FAILS:-} ]] || exit 1
           printf '#!/usr/bin/env bash\\necho "program $*"\\nexit 42\\n' >"$2/vsttorture"
-          chmod +x "$2/vsttorture"
+          printf '#!/usr/bin/env bash\\necho "scan $*"\\nexit 42\\n' >"$2/vsttorture-scan"
+          chmod +x "$2/vsttorture" "$2/vsttorture-scan"
         fi''',
 }
 
@@ -59,7 +62,7 @@ class Script(unittest.TestCase):
         self.log = self.folder / "log"
         for folder in (self.root / "scripts", self.bin, self.shop):
             folder.mkdir(parents=True)
-        for name in ("run", "check", "scripts/build.sh", "CMakePresets.json"):
+        for name in ("run", "check", "scan", "scripts/build.sh", "CMakePresets.json"):
             shutil.copy(SOURCE / name, self.root / name)
         for tool in [*REAL_TOOLS, "cp"]:
             (self.bin / tool).symlink_to(shutil.which(tool))
@@ -220,8 +223,33 @@ class Installing(Script):
                 (self.shop / "ninja").rename(self.bin / "ninja")
 
 
+class Scan(Script):
+    def setUp(self):
+        super().setUp()
+        self.take_away_for_good("apt-get")  # Whether this machine has the scan's libraries is of no interest.
+
+    def test_it_builds_the_programs_and_ends_as_the_scan_does(self):
+        output, _, status, calls = self.start("scan", "--quiet", "a folder")
+        self.assertEqual((output, status), ("scan --quiet a folder\n", 42))
+        self.assertEqual(calls, self.build_calls(
+            self.root / "build/release", "--target vsttorture-scan vsttorture-worker vsttorture-describe",
+            ("-DVSTTORTURE_SCAN=ON", "-DVSTTORTURE_WERROR=OFF")))
+
+    def test_without_a_sandbox_it_says_so_and_goes_on(self):
+        self.take_away_for_good("bwrap")
+        _, messages, status, _ = self.start("scan")
+        self.assertEqual(status, 42)
+        self.assertIn("scan: plug-ins run without a sandbox\n", messages)
+
+    def test_a_build_that_fails_is_status_3(self):
+        _, messages, status, _ = self.start("scan", FAKE_BUILD_FAILS="yes")
+        self.assertEqual(status, 3)
+        self.assertTrue(messages.endswith("scan: vsttorture-scan could not be built, so no plug-in was tried\n"))
+
+
 class Check(Script):
-    OPTIONS = ("-DBUILD_TESTING=ON", "-DVSTTORTURE_REQUIRE_TESTS=ON", "-DVSTTORTURE_WERROR=ON")
+    OPTIONS = ("-DBUILD_TESTING=ON", "-DVSTTORTURE_REQUIRE_TESTS=ON", "-DVSTTORTURE_SCAN=ON",
+               "-DVSTTORTURE_WERROR=ON")
 
     def setUp(self):
         super().setUp()

@@ -58,10 +58,10 @@ def processes(program):
     return found
 
 
-def processes_that_stay(program):
-    """What a run has killed may still be dying."""
+def processes_that_stay(program, before):
+    """What a run has killed may still be dying. What another test has left there before is not ours."""
     end = time.monotonic() + DYING_LIMIT_IN_SECONDS
-    while (found := processes(program)) and time.monotonic() < end:
+    while (found := [one for one in processes(program) if one not in before]) and time.monotonic() < end:
         time.sleep(0.1)
     return found
 
@@ -93,6 +93,7 @@ def main():
     draw = random.Random(arguments.seed)
     rows = [random_row(number, draw, samples) for number in range(arguments.runs)]
 
+    before = processes(program)
     problems = 0
     verdicts, times = collections.Counter(), []
     with tempfile.TemporaryDirectory(prefix="soak.") as folder:
@@ -107,7 +108,7 @@ def main():
                 if seen.status is None or left:
                     problems += 1
                     print(f"{row.name}: {verdict}, files left: {left}", flush=True)
-        left = os.listdir(folder) + processes_that_stay(program)
+        left = os.listdir(folder) + processes_that_stay(program, before)
     if left:
         problems += 1
         print(f"left behind: {left}")
