@@ -41,6 +41,13 @@ void observeRun(FlightRecord& observed, std::uint32_t process);
 /// share it.
 void forgetObservedRun();
 
+// A benchmark is built without the stores of requests, to measure what they cost.
+#ifdef VSTTORTURE_WITHOUT_STORES
+constexpr bool kStoresRequests = false;
+#else
+constexpr bool kStoresRequests = true;
+#endif
+
 /// A request to the plug-in, from just before it is made until it is left by a return or an exception.
 class RequestUnderWay {
  public:
@@ -48,6 +55,7 @@ class RequestUnderWay {
   explicit RequestUnderWay(FlightRequestKind kind) { begin(flightRecord(), kind); }
   /// The dispatcher is called.
   RequestUnderWay(std::int32_t opcode, std::int32_t index, std::int64_t value, float opt) {
+    if (!kStoresRequests) return;
     volatile FlightRecord& record = flightRecord();
     record.request.opcode = opcode;
     record.request.index = index;
@@ -62,7 +70,7 @@ class RequestUnderWay {
   RequestUnderWay& operator=(const RequestUnderWay&) = delete;
 
   void returned() {
-    flightRecord().request.state = kFlightReturned;
+    if (kStoresRequests) flightRecord().request.state = kFlightReturned;
     hasReturned = true;
   }
 
@@ -88,26 +96,32 @@ class ValuesUnderWay {
  public:
   /// Just before the first value is read.
   void begin(std::int32_t index) {
+    if (!kStoresRequests) return;
     flightRecord().request.index = index;
     flightRecord().request.kind = kFlightGetParameter;
     flightRecord().request.state = kFlightUnderWay;
   }
   void end() {
+    if (!kStoresRequests) return;
     flightRecord().requestsMade = flightRecord().requestsMade + made;
     flightRecord().request.state = kFlightReturned;
   }
 
   /// Just before a value is read, and set.
   void reads(std::int32_t index) {
+    if (!kStoresRequests) return;
     flightRecord().request.index = index;
     ++made;
   }
   void sets(float newValue) {
+    if (!kStoresRequests) return;
     flightRecord().request.opt = newValue;
     flightRecord().request.kind = kFlightSetParameter;
     ++made;
   }
-  void hasSet() { flightRecord().request.kind = kFlightGetParameter; }
+  void hasSet() {
+    if (kStoresRequests) flightRecord().request.kind = kFlightGetParameter;
+  }
 
   /// The plug-in has thrown; the row goes on.
   void hasThrown();
