@@ -1,14 +1,14 @@
 # SPDX-License-Identifier: MIT
 # Gives the files that cpack is about to pack the form that Debian wants: folders open to everybody, whatever the
-# umask, and man page and changelog compressed (-n: without the time of day). Finds out which packages the program
-# needs.
+# umask, and man pages and changelogs compressed (-n: without the time of day, so that the files are the same for every
+# architecture). Finds out which packages the programs need.
 cmake_policy(SET CMP0054 NEW)
 
-# debian_dependencies(PROGRAM RESULT): what dpkg-shlibdeps says, as the field Depends wants it.
+# debian_dependencies(RESULT PROGRAM...): what dpkg-shlibdeps says, as the field Depends wants it.
 #
 # A 32-bit program on a 64-bit machine uses 32-bit libraries out of packages for 64-bit machines (libc6-i386,
 # lib32stdc++6). On a 32-bit machine the same versions of the same libraries come in packages with the usual names.
-function(debian_dependencies program result)
+function(debian_dependencies result)
   find_program(DPKG_SHLIBDEPS dpkg-shlibdeps)
   if(NOT DPKG_SHLIBDEPS)
     message(FATAL_ERROR "dpkg-shlibdeps is needed to make Debian packages (Debian: dpkg-dev)")
@@ -16,10 +16,10 @@ function(debian_dependencies program result)
   set(folder ${CPACK_TEMPORARY_DIRECTORY}/../shlibdeps)
   file(WRITE ${folder}/debian/control "Source: vsttorture\n\nPackage: vsttorture\nArchitecture: any\n")
   execute_process(
-    COMMAND ${DPKG_SHLIBDEPS} -O -e${program}
+    COMMAND ${DPKG_SHLIBDEPS} -O ${ARGN}
     WORKING_DIRECTORY ${folder} OUTPUT_VARIABLE output COMMAND_ERROR_IS_FATAL ANY)
   if(NOT output MATCHES "shlibs:Depends=([^\n]+)")
-    message(FATAL_ERROR "dpkg-shlibdeps finds no libraries that ${program} needs: ${output}")
+    message(FATAL_ERROR "dpkg-shlibdeps finds no libraries that ${ARGN} need: ${output}")
   endif()
   string(REGEX REPLACE "lib32(stdc\\+\\+6|gcc-s1)" "lib\\1" packages "${CMAKE_MATCH_1}")
   string(REPLACE "libc6-i386" "libc6" packages "${packages}")
@@ -30,11 +30,19 @@ function(debian_dependencies program result)
 endfunction()
 
 if(CPACK_GENERATOR STREQUAL "DEB")
-  set(tree ${CPACK_TEMPORARY_DIRECTORY}${CPACK_PACKAGING_INSTALL_PREFIX})
-  file(CHMOD_RECURSE ${tree} DIRECTORY_PERMISSIONS
-    OWNER_READ OWNER_WRITE OWNER_EXECUTE GROUP_READ GROUP_EXECUTE WORLD_READ WORLD_EXECUTE)
+  set(links ${CPACK_TEMPORARY_DIRECTORY}/vsttorture${CPACK_PACKAGING_INSTALL_PREFIX})
+  set(workers ${CPACK_TEMPORARY_DIRECTORY}/workers${CPACK_PACKAGING_INSTALL_PREFIX})
+  execute_process(COMMAND find ${links} ${workers} -type d -exec chmod 755 {} + COMMAND_ERROR_IS_FATAL ANY)
+  file(GLOB pages ${links}/share/man/man1/*.1)
   execute_process(
-    COMMAND gzip -9n ${tree}/share/man/man1/vsttorture.1 ${tree}/share/doc/vsttorture/changelog
+    COMMAND gzip -9n ${pages} ${links}/share/doc/vsttorture/changelog ${workers}/share/doc/vsttorture-workers/changelog
     COMMAND_ERROR_IS_FATAL ANY)
-  debian_dependencies(${tree}/bin/vsttorture CPACK_DEBIAN_PACKAGE_DEPENDS)
+
+  file(GLOB_RECURSE programs ${workers}/lib/*)
+  debian_dependencies(CPACK_DEBIAN_WORKERS_PACKAGE_DEPENDS ${programs})
+  set(CPACK_DEBIAN_VSTTORTURE_PACKAGE_DEPENDS "vsttorture-workers (= ${CPACK_PACKAGE_VERSION})")
+  if(EXISTS ${links}/bin/vsttorture-scan)
+    debian_dependencies(libraries ${links}/bin/vsttorture-scan)
+    string(PREPEND CPACK_DEBIAN_VSTTORTURE_PACKAGE_DEPENDS "${libraries}, ")
+  endif()
 endif()

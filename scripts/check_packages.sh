@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: MIT
-# Checks the Debian packages, amd64 out of build/release and i386 out of build/x86: makes each, looks at what is in it
-# (lintian, mandoc, readelf), installs it on a fresh Debian 12 that holds what the package asks for and nothing else,
-# runs the program there, and removes it again.
+# Checks the Debian packages vsttorture and vsttorture-workers, amd64 out of build/release and i386 out of build/x86:
+# makes them, looks at what is in them (lintian, mandoc, readelf), installs them on fresh Debian 12s that hold what the
+# packages ask for and nothing else, runs the programs there, and removes them again. One Debian is of i386. The other
+# is of amd64 and gets i386's workers as well.
 # One line for each check; status 1 when one fails. Works as root, else through sudo. Apart from the two builds, all it
 # makes is in a folder of its own, which is removed at the end.
 # shellcheck disable=SC2016 # What looks like an expansion in single quotes is apt's or dpkg's own.
@@ -19,12 +20,12 @@ chmod 755 "$work"
 trap 'wait; "${as_root[@]}" rm -rf --one-file-system "$work"' EXIT
 failures=0
 
-# check NAME EXPECTED SEEN
+# check NAME EXPECTED SEEN: the line begins with $subject, what the check is about.
 check() {
   if [[ $2 == "$3" ]]; then
-    echo "ok    $architecture: $1"
+    echo "ok    $subject: $1"
   else
-    echo "FAIL  $architecture: $1"
+    echo "FAIL  $subject: $1"
     diff --label expected --label seen -u <(echo "$2") <(echo "$3") | sed 's/^/      /' || true
     failures=$((failures + 1))
   fi
@@ -41,22 +42,28 @@ mirror() {
   apt-get indextargets --format '$(REPO_URI)' 'Created-By: Packages' 'Codename: bookworm' | head -n 1
 }
 
-# build_package PRESET: the umask is one that must not show in the package.
-build_package() {
+# build_packages PRESET: the umask is one that must not show in the package.
+build_packages() {
   configure "$1"
-  cmake --build --preset "$1" --target vsttorture sample_plugins
+  cmake --build --preset "$1" --target "${programs[@]}" sample_plugins
   (umask 077 && cpack --config "build/$1/CPackConfig.cmake" -G DEB -B "$work/$1")
 }
 
-# The names in the field Depends, without versions.
+# dependencies PACKAGE: the names in the field Depends, without versions.
 dependencies() {
-  dpkg-deb -f "$package" Depends | sed 's/([^)]*)//g; s/,/ /g'
+  dpkg-deb -f "$1" Depends | sed 's/([^)]*)//g; s/,/ /g'
 }
 
-# Debian's essential packages, what the package asks for, and what these need.
+# Debian's essential packages, what the workers ask for, and what these need; for amd64 the same for i386's workers.
 make_root() {
-  "${as_root[@]}" mmdebstrap --mode=root --variant=essential --architectures="$architecture" \
-    --include="$(dependencies)" bookworm "$root" "$mirror"
+  local architectures=$architecture wanted
+  wanted=$(dependencies "$workers")
+  if [[ $architecture == amd64 ]]; then
+    architectures=amd64,i386
+    wanted+=" $(dependencies "$i386_workers" | sed -E 's/[^ ]+/&:i386/g')"
+  fi
+  "${as_root[@]}" mmdebstrap --mode=root --variant=essential --architectures="$architectures" \
+    --include="$wanted" bookworm "$root" "$mirror"
 }
 
 in_root() { "${as_root[@]}" chroot "$root" "$@"; }
@@ -67,15 +74,17 @@ files() {
     grep -Ev '^(var/lib/dpkg/|var/log/dpkg\.log$|var/cache/ldconfig/|etc/ld\.so\.cache$)' | sort
 }
 
-# run VARIABLE=VALUE... ARGUMENT...: what the program prints on both outputs, and its status, for an ordinary user.
-# The steps that are drawn at random become one line.
+# run PROGRAM VARIABLE=VALUE... ARGUMENT...: what the program prints on both outputs, and its status, for an ordinary
+# user. The steps that are drawn at random become one line.
 run() {
+  local program=$1
+  shift
   local variables=() status=0
   while [[ ${1:-} == *=* ]]; do
     variables+=("$1")
     shift
   done
-  "${as_root[@]}" chroot --userspec=65534:65534 "$root" /usr/bin/env -i "${variables[@]}" /usr/bin/vsttorture "$@" \
+  "${as_root[@]}" chroot --userspec=65534:65534 "$root" /usr/bin/env -i "${variables[@]}" "$program" "$@" \
     </dev/null >"$work/out" 2>"$work/err" || status=$?
   awk '
     NR >= 17 && $0 ~ "^" NR - 1 ", (inspect (class info|preset info|parameter info|latency)|testing setting states)$" {
@@ -87,46 +96,117 @@ run() {
   echo "exit status $status"
 }
 
+# describe PROGRAM BUNDLE: name, identifier and bundle out of the object that the program prints, and its status.
+describe() {
+  local status=0
+  "${as_root[@]}" chroot --userspec=65534:65534 "$root" /usr/bin/env -i "$@" </dev/null >"$work/out" 2>"$work/err" ||
+    status=$?
+  python3 -c '
+import json, sys
+plugin = json.load(sys.stdin)
+print(plugin["name"], plugin["uniqueId"]["text"], plugin["bundle"], sep="\n")' <"$work/out" 2>&1
+  sed 's/^/stderr: /' "$work/err"
+  echo "exit status $status"
+}
+
+# listing PACKAGE: permissions, owner and name of each file; of a link also where it leads.
+listing() {
+  dpkg-deb -c "$1" | awk '{ print $1, $2, $6, $7, $8 }' | sed 's/ *$//' | sort -k 3
+}
+
 check_contents() {
+  subject="vsttorture:$architecture"
   check "the package says what it is and what it needs" \
     "Package: vsttorture
 Version: $version
 Architecture: $architecture
 Section: sound
 Priority: optional
-Depends: libc6 (>= 2.34), libgcc-s1 (>= any), libstdc++6 (>= 9)" \
-    "$(dpkg-deb -f "$package" Package Version Architecture Section Priority Depends |
-      sed 's/libgcc-s1 (>= [0-9.]*)/libgcc-s1 (>= any)/')"
-
-  check "it holds the program, its man page and what makers of hosts read" \
+Depends: vsttorture-workers (= $version)" \
+    "$(dpkg-deb -f "$package" Package Version Architecture Multi-Arch Section Priority Depends)"
+  check "it holds links to the programs, their man pages and the documents" \
     "drwxr-xr-x root/root ./usr/
 drwxr-xr-x root/root ./usr/bin/
--rwxr-xr-x root/root ./usr/bin/vsttorture
+lrwxrwxrwx root/root ./usr/bin/vsttorture -> ../$library_folder/vsttorture
+lrwxrwxrwx root/root ./usr/bin/vsttorture-describe -> ../$library_folder/vsttorture-describe
+lrwxrwxrwx root/root ./usr/bin/vsttorture-worker -> ../$library_folder/vsttorture-worker
 drwxr-xr-x root/root ./usr/share/
 drwxr-xr-x root/root ./usr/share/doc/
 drwxr-xr-x root/root ./usr/share/doc/vsttorture/
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/FLIGHT_RECORD.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/PROTOCOL.md
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/WHEN_A_PLUGIN_FAILS.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/changelog.gz
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/copyright
 drwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/
+-rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/explain_plugin.py
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/examples/try_plugin.cpp
 -rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/try_plugin.py
+drwxr-xr-x root/root ./usr/share/doc/vsttorture/schema/
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/schema/plugin-description.schema.json
 drwxr-xr-x root/root ./usr/share/man/
 drwxr-xr-x root/root ./usr/share/man/man1/
+-rw-r--r-- root/root ./usr/share/man/man1/vsttorture-describe.1.gz
+-rw-r--r-- root/root ./usr/share/man/man1/vsttorture-worker.1.gz
 -rw-r--r-- root/root ./usr/share/man/man1/vsttorture.1.gz" \
-    "$(dpkg-deb -c "$package" | awk '{ print $1, $2, $6 }' | sort -k 3)"
-
-  local unpacked=$work/unpacked_$architecture
+    "$(listing "$package")"
+  check_with_lintian "$package"
+  local unpacked=$work/unpacked_$architecture name
   dpkg-deb -x "$package" "$unpacked"
-  check "lintian finds no error and gives no warning" "" \
-    "$(lintian --no-cfg --allow-root --display-level '>=warning' "$package" 2>&1)"
-  check "mandoc finds no fault in the man page" "" \
-    "$(gunzip -c "$unpacked/usr/share/man/man1/vsttorture.1.gz" | mandoc -T lint -W style 2>&1)"
-  check_hardening "$unpacked/usr/bin/vsttorture"
+  for name in "${programs[@]}"; do
+    check "mandoc finds no fault in $name(1)" "" \
+      "$(gunzip -c "$unpacked/usr/share/man/man1/$name.1.gz" | mandoc -T lint -W style 2>&1)"
+  done
+
+  subject="vsttorture-workers:$architecture"
+  check "the package says what it is and what it needs" \
+    "Package: vsttorture-workers
+Version: $version
+Architecture: $architecture
+Multi-Arch: same
+Section: sound
+Priority: optional
+Depends: libc6 (>= 2.34), libgcc-s1 (>= any), libstdc++6 (>= 11)" \
+    "$(dpkg-deb -f "$workers" Package Version Architecture Multi-Arch Section Priority Depends |
+      sed 's/libgcc-s1 (>= [0-9.]*)/libgcc-s1 (>= any)/')"
+  check "it holds the programs below the folder of the architecture" \
+    "drwxr-xr-x root/root ./usr/
+drwxr-xr-x root/root ./usr/lib/
+drwxr-xr-x root/root ./usr/${library_folder%/*}/
+drwxr-xr-x root/root ./usr/$library_folder/
+-rwxr-xr-x root/root ./usr/$library_folder/vsttorture
+-rwxr-xr-x root/root ./usr/$library_folder/vsttorture-describe
+-rwxr-xr-x root/root ./usr/$library_folder/vsttorture-worker
+drwxr-xr-x root/root ./usr/share/
+drwxr-xr-x root/root ./usr/share/doc/
+drwxr-xr-x root/root ./usr/share/doc/vsttorture-workers/
+-rw-r--r-- root/root ./usr/share/doc/vsttorture-workers/changelog.gz
+-rw-r--r-- root/root ./usr/share/doc/vsttorture-workers/copyright" \
+    "$(listing "$workers")"
+  check_with_lintian "$workers"
+  dpkg-deb -x "$workers" "$unpacked"
+  for name in "${programs[@]}"; do
+    subject=/usr/$library_folder/$name
+    check_program "$unpacked/usr/$library_folder/$name"
+  done
 }
 
-# check_hardening PROGRAM
-check_hardening() {
+# check_with_lintian PACKAGE
+check_with_lintian() {
+  check "lintian finds no error and gives no warning" "" \
+    "$(lintian --no-cfg --allow-root --display-level '>=warning' "$1" 2>&1)"
+}
+
+# check_program PROGRAM
+check_program() {
+  check "it is of this architecture" "$elf" "$(readelf -h "$1" | sed -nE 's/^ +(Class|Machine): +//p')"
+  check "it needs the dynamic loader, the C and C++ runtimes and nothing else" \
+    "$dynamic_loader
+libc.so.6
+libgcc_s.so.1
+libstdc++.so.6" \
+    "$(readelf -d "$1" | sed -nE 's/.*\(NEEDED\).*\[(.*)\]/\1/p' | sort)"
+  check "it has no symbols for a debugger" "" "$(readelf -SW "$1" | grep -oE '\.(symtab|debug)[^ ]*' || true)"
   check "it can be loaded at any address" "DYN (Position-Independent Executable file)" \
     "$(readelf -h "$1" | sed -n 's/^ *Type: *//p')"
   check "all its symbols are bound before it starts" "BIND_NOW NOW PIE" \
@@ -147,50 +227,51 @@ narrow_functions() {
     grep -oE ' (creat|f?open|openat|f?l?stat|fstatat|mmap|lseek|f?truncate|pread|pwrite|readdir|fseeko|ftello)(@|$)' || true
 }
 
+# check_installed PACKAGE...: the files of the packages lie in the root's folder packages.
 check_installed() {
-  check "dpkg installs it" "ii  $version" "$(in_root dpkg -i /vsttorture.deb >"$work/log" 2>&1 || cat "$work/log"
-    in_root dpkg-query -W -f '${db:Status-Abbrev} ${Version}' vsttorture 2>&1)"
-  check "every file is as packed" \
-    "usr/bin/vsttorture: OK
-usr/share/doc/vsttorture/PROTOCOL.md: OK
-usr/share/doc/vsttorture/changelog.gz: OK
-usr/share/doc/vsttorture/copyright: OK
-usr/share/doc/vsttorture/examples/try_plugin.cpp: OK
-usr/share/doc/vsttorture/examples/try_plugin.py: OK
-usr/share/man/man1/vsttorture.1.gz: OK" \
-    "$(in_root md5sum --check /var/lib/dpkg/info/vsttorture.md5sums 2>&1; in_root dpkg --verify vsttorture 2>&1)"
+  subject="Debian for $architecture"
+  check "dpkg installs the packages" "$(printf 'ii  %s\n' "$@" | sort)" \
+    "$(in_root dpkg -i -R /packages >"$work/log" 2>&1 || cat "$work/log"
+      in_root dpkg-query -W -f '${db:Status-Abbrev} ${Package}:${Architecture} ${Version}\n' 'vsttorture*' | sort)"
+  check "every file is as packed" "" "$(in_root dpkg --verify "${@%% *}" 2>&1)"
 
-  local page changelog
-  page=$(gunzip -c "$root/usr/share/man/man1/vsttorture.1.gz")
-  changelog=$(gunzip -c "$root/usr/share/doc/vsttorture/changelog.gz")
-  check "the man page and the changelog are of this version" \
-    "$(head -n 1 docs/vsttorture.1)
-$(head -n 1 docs/changelog)" "${page%%$'\n'*}
-${changelog%%$'\n'*}"
-
-  check "the program is of this architecture" "$elf" \
-    "$(readelf -h "$root/usr/bin/vsttorture" | sed -nE 's/^ +(Class|Machine): +//p')"
-  check "it needs the C and C++ runtimes and nothing else" \
-    "libc.so.6
-libgcc_s.so.1
-libstdc++.so.6" \
-    "$(readelf -d "$root/usr/bin/vsttorture" | sed -nE 's/.*\(NEEDED\).*\[(.*)\]/\1/p' | sort)"
-  check "it has no symbols for a debugger" "" \
-    "$(readelf -SW "$root/usr/bin/vsttorture" | grep -oE '\.(symtab|debug)[^ ]*' || true)"
+  local page name
+  for name in "${programs[@]}"; do
+    page=$(gunzip -c "$root/usr/share/man/man1/$name.1.gz")
+    check "the man page $name(1) is of this version" \
+      ".TH ${name^^} 1 DATE \"vsttorture $version\" \"User Commands\"" \
+      "$(sed -E '1s/ 1 [0-9-]+ / 1 DATE /; q' <<<"$page")"
+  done
+  for name in vsttorture vsttorture-workers; do
+    check "the changelog of $name is of this version" "$(head -n 1 docs/changelog)" \
+      "$(gunzip -c "$root/usr/share/doc/$name/changelog.gz" | sed -n 1p)"
+  done
 }
 
-check_runs() {
+# The name in the path, and bad input.
+check_command() {
+  subject="/usr/bin/vsttorture on $architecture"
   check "without arguments" \
     "!too few arguments. syntax is command pathtovst childID(optional)
-exit status 2" "$(run)"
+exit status 2" "$(run /usr/bin/vsttorture)"
   check "no such file" \
     "!create and initialize failed -1
 stderr: vsttorture: /plugins/none.so: No such file or directory
-exit status 3" "$(run /plugins/none.so)"
+exit status 3" "$(run /usr/bin/vsttorture /plugins/none.so)"
   check "a file that is no plug-in" \
     "!create and initialize failed -1
 stderr: vsttorture: /etc/hostname: file too short
-exit status 3" "$(run /etc/hostname)"
+exit status 3" "$(run /usr/bin/vsttorture /etc/hostname)"
+}
+
+# check_plugins PROGRAM ARCHITECTURE: the program, which is of this architecture, tries this architecture's plug-ins.
+check_plugins() {
+  local program=$1 plugins=/plugins/$2 other=/plugins/i386 refusal="is for i386, this program is for x86_64"
+  subject="$program on $architecture"
+  if [[ $2 == i386 ]]; then
+    other=/plugins/amd64
+    refusal="is for x86_64, this program is for i386"
+  fi
   check "a good plug-in" \
     "total, 64
 1, test gathering info
@@ -209,30 +290,40 @@ exit status 3" "$(run /etc/hostname)"
 14, initialize
 15, test gathering info
 16 to 65, tests drawn at random
-exit status 0" "$(run /plugins/well_behaved_effect.so)"
+exit status 0" "$(run "$program" "$plugins/well_behaved_effect.so")"
   check "a shell" \
     "total, 51
 1, test gathering info
-exit status 1" "$(run /plugins/shell.so)"
+exit status 1" "$(run "$program" "$plugins/shell.so")"
   # effGetPlugCategory (35) comes before the first line, effGetTailSize (52) in step 6.
   check "a plug-in that throws" \
     "!create and initialize failed 5
-exit status 3" "$(run FAULT_KIND=throw_int FAULT_PLACE=dispatch:35 /plugins/faulty.so)"
+exit status 3" "$(run "$program" FAULT_KIND=throw_int FAULT_PLACE=dispatch:35 "$plugins/faulty.so")"
   check "a plug-in that throws in a step" \
     "$steps_to_the_tail_size
 !inspect latency test failed 5
-exit status 3" "$(run FAULT_KIND=throw_int FAULT_PLACE=dispatch:52 /plugins/faulty.so)"
+exit status 3" "$(run "$program" FAULT_KIND=throw_int FAULT_PLACE=dispatch:52 "$plugins/faulty.so")"
   check "a plug-in that crashes" \
     "$steps_to_the_tail_size
 unexpected exit
-exit status 7" "$(run FAULT_KIND=null_store FAULT_PLACE=dispatch:52 /plugins/faulty.so)"
+exit status 7" "$(run "$program" FAULT_KIND=null_store FAULT_PLACE=dispatch:52 "$plugins/faulty.so")"
   check "a plug-in that throws with a C++ runtime of its own" \
     "!create and initialize failed 5
-exit status 3" "$(run FAULT_KIND=throw_int FAULT_PLACE=dispatch:35 /plugins/faulty_own_runtime.so)"
+exit status 3" "$(run "$program" FAULT_KIND=throw_int FAULT_PLACE=dispatch:35 "$plugins/faulty_own_runtime.so")"
   check "a plug-in of the other architecture" \
     "!create and initialize failed -1
-stderr: vsttorture: /plugins/other_architecture.so $other_architecture
-exit status 3" "$(run /plugins/other_architecture.so)"
+stderr: vsttorture: $other/well_behaved_effect.so $refusal
+exit status 3" "$(run "$program" "$other/well_behaved_effect.so")"
+}
+
+# check_describe PROGRAM ARCHITECTURE: the same for the program that describes plug-ins.
+check_describe() {
+  subject="$1 on $architecture"
+  check "it prints what a plug-in is" \
+    "Well-behaved effect
+WbEf
+/plugins/$2/well_behaved_effect.so
+exit status 0" "$(describe "$1" "/plugins/$2/well_behaved_effect.so")"
 }
 
 steps_to_the_tail_size="total, 64
@@ -245,25 +336,29 @@ steps_to_the_tail_size="total, 64
 
 version=$(sed -n 's/^project(vsttorture VERSION \([0-9.]*\).*/\1/p' CMakeLists.txt)
 
-# choose ARCHITECTURE: says which of the two packages the functions above are about.
+programs=(vsttorture vsttorture-worker vsttorture-describe)
+i386_workers=$work/x86/vsttorture-workers_${version}_i386.deb
+
+# choose ARCHITECTURE: says which of the packages and Debians the functions above are about.
 choose() {
   architecture=$1
   case $architecture in
     amd64)
-      preset=release other_preset=x86 elf=$'ELF64\nAdvanced Micro Devices X86-64'
-      other_architecture="is for i386, this program is for x86_64"
+      preset=release library_folder=lib/x86_64-linux-gnu/vsttorture
+      elf=$'ELF64\nAdvanced Micro Devices X86-64' dynamic_loader=ld-linux-x86-64.so.2
       ;;
     i386)
-      preset=x86 other_preset=release elf=$'ELF32\nIntel 80386'
-      other_architecture="is for x86_64, this program is for i386"
+      preset=x86 library_folder=lib/i386-linux-gnu/vsttorture
+      elf=$'ELF32\nIntel 80386' dynamic_loader=ld-linux.so.2
       ;;
   esac
   package=$work/$preset/vsttorture_${version}_$architecture.deb
+  workers=$work/$preset/vsttorture-workers_${version}_$architecture.deb
   root=$work/$architecture
 }
 
 need_packages "to check the packages" g++ g++-multilib cmake ninja-build dpkg-dev mmdebstrap arch-test lintian mandoc \
-  binutils
+  binutils python3
 mirror=$(mirror)
 if [[ -z $mirror ]]; then
   "${as_root[@]}" apt-get update -qq
@@ -271,11 +366,14 @@ if [[ -z $mirror ]]; then
 fi
 [[ -n $mirror ]] || give_up "apt knows no mirror of Debian 12 (bookworm)"
 
-# Both roots are made side by side, while nothing else is to do.
+for architecture in amd64 i386; do
+  choose "$architecture"
+  build_packages "$preset" >"$work/log" 2>&1 || { cat "$work/log"; give_up "$architecture: no packages"; }
+done
+# Both roots are made side by side.
 declare -A makers
 for architecture in amd64 i386; do
   choose "$architecture"
-  build_package "$preset" >"$work/log" 2>&1 || { cat "$work/log"; give_up "$architecture: no package"; }
   make_root >"$root.log" 2>&1 </dev/null &
   makers[$architecture]=$!
 done
@@ -287,16 +385,31 @@ done
 for architecture in amd64 i386; do
   choose "$architecture"
   check_contents
-  "${as_root[@]}" mkdir "$root/plugins"
-  "${as_root[@]}" cp "build/$preset/plugins"/{well_behaved_effect,shell,faulty,faulty_own_runtime}.so "$root/plugins"
-  "${as_root[@]}" cp "build/$other_preset/plugins/well_behaved_effect.so" "$root/plugins/other_architecture.so"
-  "${as_root[@]}" cp "$package" "$root/vsttorture.deb"
+  "${as_root[@]}" mkdir -p "$root"/plugins/{amd64,i386} "$root/packages"
+  "${as_root[@]}" cp build/release/plugins/{well_behaved_effect,shell,faulty,faulty_own_runtime}.so "$root/plugins/amd64"
+  "${as_root[@]}" cp build/x86/plugins/{well_behaved_effect,shell,faulty,faulty_own_runtime}.so "$root/plugins/i386"
+  "${as_root[@]}" cp "$package" "$workers" "$root/packages"
+  installed=("vsttorture:$architecture $version" "vsttorture-workers:$architecture $version")
+  if [[ $architecture == amd64 ]]; then
+    "${as_root[@]}" cp "$i386_workers" "$root/packages"
+    installed+=("vsttorture-workers:i386 $version")
+  fi
 
   before=$(files)
-  check_installed
-  check_runs
-  check "removed, it leaves nothing" "$before" "$(in_root dpkg -r vsttorture >"$work/log" 2>&1 || cat "$work/log"
-    in_root dpkg-query -W -f '${db:Status-Abbrev}\n' vsttorture 2>/dev/null; files)"
+  check_installed "${installed[@]}"
+  check_command
+  check_plugins /usr/bin/vsttorture "$architecture"
+  check_plugins /usr/bin/vsttorture-worker "$architecture"
+  check_describe /usr/bin/vsttorture-describe "$architecture"
+  if [[ $architecture == amd64 ]]; then
+    check_plugins /usr/lib/i386-linux-gnu/vsttorture/vsttorture i386
+    check_plugins /usr/lib/i386-linux-gnu/vsttorture/vsttorture-worker i386
+    check_describe /usr/lib/i386-linux-gnu/vsttorture/vsttorture-describe i386
+  fi
+  subject="Debian for $architecture"
+  check "removed, the packages leave nothing" "$before" \
+    "$(in_root dpkg -r "${installed[@]%% *}" >"$work/log" 2>&1 || cat "$work/log"
+      in_root dpkg-query -W -f '${db:Status-Abbrev}\n' 'vsttorture*' 2>/dev/null; files)"
 done
 
 if [[ $failures -gt 0 ]]; then

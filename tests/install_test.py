@@ -4,8 +4,9 @@ that all files that name the version name the same one.
 
     install_test.py BUILD SAMPLE_PLUGIN
 
-The build is the one that is being tested, so each preset installs its own program.
+The build is the one that is being tested, so each preset installs its own programs.
 """
+import json
 import os
 import pathlib
 import re
@@ -16,23 +17,24 @@ import tempfile
 import unittest
 
 SOURCE = pathlib.Path(__file__).resolve().parent.parent
-INSTALLED = {
-    "bin/vsttorture": 0o755,
-    "share/doc/vsttorture/PROTOCOL.md": 0o644,
-    "share/doc/vsttorture/changelog": 0o644,
-    "share/doc/vsttorture/copyright": 0o644,
-    "share/doc/vsttorture/examples/try_plugin.cpp": 0o644,
-    "share/doc/vsttorture/examples/try_plugin.py": 0o755,
-    "share/man/man1/vsttorture.1": 0o644,
-}
+PROGRAMS = ["bin/vsttorture", "bin/vsttorture-describe", "bin/vsttorture-worker"]
 COPIES = {
+    "share/doc/vsttorture/FLIGHT_RECORD.md": "docs/FLIGHT_RECORD.md",
     "share/doc/vsttorture/PROTOCOL.md": "docs/PROTOCOL.md",
+    "share/doc/vsttorture/WHEN_A_PLUGIN_FAILS.md": "docs/WHEN_A_PLUGIN_FAILS.md",
     "share/doc/vsttorture/changelog": "docs/changelog",
     "share/doc/vsttorture/copyright": "docs/copyright",
+    "share/doc/vsttorture/examples/explain_plugin.py": "docs/examples/explain_plugin.py",
     "share/doc/vsttorture/examples/try_plugin.cpp": "docs/examples/try_plugin.cpp",
     "share/doc/vsttorture/examples/try_plugin.py": "docs/examples/try_plugin.py",
+    "share/doc/vsttorture/schema/plugin-description.schema.json": "docs/schema/plugin-description.schema.json",
+    "share/man/man1/vsttorture-describe.1": "docs/vsttorture-describe.1",
+    "share/man/man1/vsttorture-worker.1": "docs/vsttorture-worker.1",
     "share/man/man1/vsttorture.1": "docs/vsttorture.1",
 }
+INSTALLED = {**dict.fromkeys(COPIES, 0o644), **dict.fromkeys(PROGRAMS, 0o755),
+             "share/doc/vsttorture/examples/explain_plugin.py": 0o755,
+             "share/doc/vsttorture/examples/try_plugin.py": 0o755}
 
 
 class Install(unittest.TestCase):
@@ -49,15 +51,21 @@ class Install(unittest.TestCase):
                        stdout=subprocess.DEVNULL)
 
     def check(self, root, prefix):
-        """Below the root lie the files of an installation with this prefix and no others, and the program runs."""
+        """Below the root lie the files of an installation with this prefix and no others, and the programs run."""
         found = {str(path.relative_to(root)): stat.S_IMODE(path.stat().st_mode)
                  for path in root.rglob("*") if not path.is_dir()}
         self.assertEqual(found, {f"{prefix}{name}": mode for name, mode in INSTALLED.items()})
         for name, source in COPIES.items():
             self.assertEqual((root / f"{prefix}{name}").read_bytes(), (SOURCE / source).read_bytes())
-        run = subprocess.run([root / f"{prefix}bin/vsttorture", sample_plugin], stdout=subprocess.PIPE, text=True,
-                             check=False)
-        self.assertEqual((run.returncode, run.stdout.splitlines()[:2]), (0, ["total, 64", "1, test gathering info"]))
+        for program in "vsttorture", "vsttorture-worker":
+            run = self.run_on_sample_plugin(root / f"{prefix}bin/{program}")
+            self.assertEqual((run.returncode, run.stdout.splitlines()[:2]),
+                             (0, ["total, 64", "1, test gathering info"]))
+        run = self.run_on_sample_plugin(root / f"{prefix}bin/vsttorture-describe")
+        self.assertEqual((run.returncode, json.loads(run.stdout)["name"]), (0, "Well-behaved effect"))
+
+    def run_on_sample_plugin(self, program):
+        return subprocess.run([program, sample_plugin], stdout=subprocess.PIPE, text=True, check=False)
 
     def test_a_staging_folder_holds_everything_below_the_prefix(self):
         for number, prefix in enumerate(("usr/", "usr/local/", "opt/two words/")):
@@ -82,12 +90,16 @@ class Version(unittest.TestCase):
         return re.search(pattern, pathlib.Path(path).read_text(), re.MULTILINE)[1]
 
     def test_every_file_that_names_the_version_names_that_of_the_build(self):
-        self.assertEqual({
-            "docs/vsttorture.1": self.first(r'^\.TH VSTTORTURE 1 \S+ "vsttorture ([^"]+)"', SOURCE / "docs/vsttorture.1"),
+        found = {
             "docs/changelog": self.first(r"\Avsttorture \(([^)]+)\)", SOURCE / "docs/changelog"),
             "CHANGELOG.md": self.first(r"^## (\S+)", SOURCE / "CHANGELOG.md"),
-        }, dict.fromkeys(["docs/vsttorture.1", "docs/changelog", "CHANGELOG.md"],
-                         self.first(r"^CMAKE_PROJECT_VERSION:STATIC=(.*)$", pathlib.Path(build, "CMakeCache.txt"))))
+        }
+        pages = list((SOURCE / "docs").glob("*.1"))
+        self.assertGreaterEqual(len(pages), len(PROGRAMS))
+        for page in pages:
+            found[page.name] = self.first(rf'\A\.TH {page.stem.upper()} 1 \S+ "vsttorture ([^"]+)"', page)
+        self.assertEqual(found, dict.fromkeys(found, self.first(
+            r"^CMAKE_PROJECT_VERSION:STATIC=(.*)$", pathlib.Path(build, "CMakeCache.txt"))))
 
 
 if __name__ == "__main__":
