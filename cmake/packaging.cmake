@@ -4,7 +4,7 @@
 # - vsttorture-workers: the programs that load plug-ins, below the folder of their architecture in the library path.
 #   A program loads plug-ins of its own word size only, so amd64's and i386's packages install side by side
 #   (Multi-Arch: same). Outside that folder they hold files only that are the same for every architecture.
-# - vsttorture: links to these programs in the path, and everything to read.
+# - vsttorture: links to these programs in the path, the scan where it is built, and everything to read.
 #
 # The component "programs" is in no package: it is where a plain `cmake --install` has the programs.
 include(GNUInstallDirs)
@@ -24,6 +24,7 @@ if(TARGET vsttorture-scan)
   install(TARGETS vsttorture-scan RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT vsttorture)
   install(FILES docs/vsttorture-scan.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT vsttorture)
   install(FILES docs/VERDICTS.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT vsttorture)
+  install(FILES docs/schema/scan-events.schema.json DESTINATION ${CMAKE_INSTALL_DOCDIR}/schema COMPONENT vsttorture)
   install(FILES completions/vsttorture-scan.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
           RENAME vsttorture-scan COMPONENT vsttorture)
 endif()
@@ -68,6 +69,14 @@ set(CPACK_DEBIAN_VSTTORTURE_DESCRIPTION "${PROJECT_DESCRIPTION}
 An audio host starts this tool as a child process before it loads a plug-in
 into its own. A faulty plug-in then harms only the child, whose lines and exit
 status say in which step it failed.")
+if(TARGET vsttorture-scan)
+  string(APPEND CPACK_DEBIAN_VSTTORTURE_DESCRIPTION "
+.
+vsttorture-scan finds plug-ins, tries each in a process of its own, and says
+which fail, where and why. With bubblewrap it confines them, and with
+vsttorture-workers of another architecture it tries that one's plug-ins, too.")
+  set(CPACK_DEBIAN_VSTTORTURE_PACKAGE_RECOMMENDS bubblewrap)
+endif()
 set(CPACK_DEBIAN_WORKERS_PACKAGE_NAME vsttorture-workers)
 # On purpose: a second field in the value of the first. CPack has no variable for it before CMake 3.31.
 set(CPACK_DEBIAN_WORKERS_PACKAGE_SOURCE "vsttorture\nMulti-Arch: same")

@@ -44,20 +44,26 @@ mirror() {
 
 # build_packages PRESET: the umask is one that must not show in the package.
 build_packages() {
-  configure "$1"
-  cmake --build --preset "$1" --target "${programs[@]}" sample_plugins
+  local targets=("${programs[@]}" sample_plugins)
+  if [[ $1 == release ]]; then
+    configure release -DVSTTORTURE_SCAN=ON
+    targets+=(vsttorture-scan)
+  else
+    configure "$1"
+  fi
+  cmake --build --preset "$1" --target "${targets[@]}"
   (umask 077 && cpack --config "build/$1/CPackConfig.cmake" -G DEB -B "$work/$1")
 }
 
-# dependencies PACKAGE: the names in the field Depends, without versions.
+# dependencies PACKAGE: the names in the field Depends, without versions and without our own package.
 dependencies() {
-  dpkg-deb -f "$1" Depends | sed 's/([^)]*)//g; s/,/ /g'
+  dpkg-deb -f "$1" Depends | sed 's/([^)]*)//g; s/,/ /g; s/vsttorture-workers//'
 }
 
-# Debian's essential packages, what the workers ask for, and what these need; for amd64 the same for i386's workers.
+# Debian's essential packages, what ours ask for, and what these need; for amd64 also what i386's workers ask for.
 make_root() {
   local architectures=$architecture wanted
-  wanted=$(dependencies "$workers")
+  wanted="$(dependencies "$package") $(dependencies "$workers")"
   if [[ $architecture == amd64 ]]; then
     architectures=amd64,i386
     wanted+=" $(dependencies "$i386_workers" | sed -E 's/[^ ]+/&:i386/g')"
@@ -114,7 +120,22 @@ listing() {
   dpkg-deb -c "$1" | awk '{ print $1, $2, $6, $7, $8 }' | sed 's/ *$//' | sort -k 3
 }
 
+# check_contents: the scan is in amd64's package only. It starts the workers of both word sizes.
 check_contents() {
+  local depends="vsttorture-workers (= $version)" pages=("${programs[@]}") scan_files=
+  if [[ $architecture == amd64 ]]; then
+    depends="libc6 (>= 2.34), libfmt9 (>= any), libgcc-s1 (>= any), libstdc++6 (>= 11), libuv1 (>= any), $depends
+Recommends: bubblewrap"
+    pages+=(vsttorture-scan)
+    scan_files="-rwxr-xr-x root/root ./usr/bin/vsttorture-scan
+drwxr-xr-x root/root ./usr/share/bash-completion/
+drwxr-xr-x root/root ./usr/share/bash-completion/completions/
+-rw-r--r-- root/root ./usr/share/bash-completion/completions/vsttorture-scan
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/VERDICTS.md
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/schema/scan-events.schema.json
+-rw-r--r-- root/root ./usr/share/man/man1/vsttorture-scan.1.gz
+"
+  fi
   subject="vsttorture:$architecture"
   check "the package says what it is and what it needs" \
     "Package: vsttorture
@@ -122,10 +143,11 @@ Version: $version
 Architecture: $architecture
 Section: sound
 Priority: optional
-Depends: vsttorture-workers (= $version)" \
-    "$(dpkg-deb -f "$package" Package Version Architecture Multi-Arch Section Priority Depends)"
+Depends: $depends" \
+    "$(dpkg-deb -f "$package" Package Version Architecture Multi-Arch Section Priority Depends Recommends |
+      without_versions)"
   check "it holds links to the programs, their man pages and the documents" \
-    "drwxr-xr-x root/root ./usr/
+    "$(sort -k 3 <<<"${scan_files}drwxr-xr-x root/root ./usr/
 drwxr-xr-x root/root ./usr/bin/
 lrwxrwxrwx root/root ./usr/bin/vsttorture -> ../$library_folder/vsttorture
 lrwxrwxrwx root/root ./usr/bin/vsttorture-describe -> ../$library_folder/vsttorture-describe
@@ -148,12 +170,12 @@ drwxr-xr-x root/root ./usr/share/man/
 drwxr-xr-x root/root ./usr/share/man/man1/
 -rw-r--r-- root/root ./usr/share/man/man1/vsttorture-describe.1.gz
 -rw-r--r-- root/root ./usr/share/man/man1/vsttorture-worker.1.gz
--rw-r--r-- root/root ./usr/share/man/man1/vsttorture.1.gz" \
+-rw-r--r-- root/root ./usr/share/man/man1/vsttorture.1.gz")" \
     "$(listing "$package")"
   check_with_lintian "$package"
   local unpacked=$work/unpacked_$architecture name
   dpkg-deb -x "$package" "$unpacked"
-  for name in "${programs[@]}"; do
+  for name in "${pages[@]}"; do
     check "mandoc finds no fault in $name(1)" "" \
       "$(gunzip -c "$unpacked/usr/share/man/man1/$name.1.gz" | mandoc -T lint -W style 2>&1)"
   done
@@ -168,7 +190,7 @@ Section: sound
 Priority: optional
 Depends: libc6 (>= 2.34), libgcc-s1 (>= any), libstdc++6 (>= 11)" \
     "$(dpkg-deb -f "$workers" Package Version Architecture Multi-Arch Section Priority Depends |
-      sed 's/libgcc-s1 (>= [0-9.]*)/libgcc-s1 (>= any)/')"
+      without_versions)"
   check "it holds the programs below the folder of the architecture" \
     "drwxr-xr-x root/root ./usr/
 drwxr-xr-x root/root ./usr/lib/
@@ -187,8 +209,17 @@ drwxr-xr-x root/root ./usr/share/doc/vsttorture-workers/
   dpkg-deb -x "$workers" "$unpacked"
   for name in "${programs[@]}"; do
     subject=/usr/$library_folder/$name
-    check_program "$unpacked/usr/$library_folder/$name"
+    check_program "$unpacked/usr/$library_folder/$name" "$dynamic_loader libc.so.6 libgcc_s.so.1 libstdc++.so.6"
   done
+  if [[ $architecture == amd64 ]]; then
+    subject=/usr/bin/vsttorture-scan
+    check_program "$unpacked/usr/bin/vsttorture-scan" "libc.so.6 libfmt.so.9 libgcc_s.so.1 libstdc++.so.6 libuv.so.1"
+  fi
+}
+
+# Replaces the versions that differ between the architectures, and those that only the libraries of others decide.
+without_versions() {
+  sed -E 's/(libgcc-s1|libfmt9|libuv1) \(>= [^)]*\)/\1 (>= any)/g'
 }
 
 # check_with_lintian PACKAGE
@@ -197,15 +228,11 @@ check_with_lintian() {
     "$(lintian --no-cfg --allow-root --display-level '>=warning' "$1" 2>&1)"
 }
 
-# check_program PROGRAM
+# check_program PROGRAM LIBRARIES: the libraries that it needs, in the order of the alphabet.
 check_program() {
   check "it is of this architecture" "$elf" "$(readelf -h "$1" | sed -nE 's/^ +(Class|Machine): +//p')"
-  check "it needs the dynamic loader, the C and C++ runtimes and nothing else" \
-    "$dynamic_loader
-libc.so.6
-libgcc_s.so.1
-libstdc++.so.6" \
-    "$(readelf -d "$1" | sed -nE 's/.*\(NEEDED\).*\[(.*)\]/\1/p' | sort)"
+  check "it needs these libraries and no others: $2" "$2" \
+    "$(readelf -d "$1" | sed -nE 's/.*\(NEEDED\).*\[(.*)\]/\1/p' | sort | xargs)"
   check "it has no symbols for a debugger" "" "$(readelf -SW "$1" | grep -oE '\.(symtab|debug)[^ ]*' || true)"
   check "it can be loaded at any address" "DYN (Position-Independent Executable file)" \
     "$(readelf -h "$1" | sed -n 's/^ *Type: *//p')"
@@ -246,6 +273,25 @@ check_installed() {
     check "the changelog of $name is of this version" "$(head -n 1 docs/changelog)" \
       "$(gunzip -c "$root/usr/share/doc/$name/changelog.gz" | sed -n 1p)"
   done
+}
+
+# The scan picks the worker for each plug-in. It needs /proc, which the root lacks: it is mounted in a namespace that
+# ends with the scan.
+check_scan() {
+  subject="/usr/bin/vsttorture-scan on $architecture"
+  check "it tries plug-ins of both architectures" \
+    "passed  /plugins/amd64/well_behaved_effect.so
+passed  /plugins/i386/well_behaved_effect.so
+2 results: 2 passed
+exit status 0" \
+    "$(status=0
+      "${as_root[@]}" unshare --mount sh -c 'mount -t proc proc "$1/proc" && exec chroot --userspec=65534:65534 "$@"' \
+        sh "$root" /usr/bin/env -i HOME=/tmp /usr/bin/vsttorture-scan --sandbox off --jobs 1 \
+        /plugins/{amd64,i386}/well_behaved_effect.so </dev/null >"$work/out" 2>"$work/err" || status=$?
+      sed -nE 's/^(passed) +[0-9.]+ s( .*)$/\1\2/p; s/^(.* results?: .*), in [0-9.]+ s$/\1/p; /^[a-z]/{/^passed/!p}' \
+        "$work/out"
+      sed 's/^/stderr: /' "$work/err"
+      echo "exit status $status")"
 }
 
 # The name in the path, and bad input.
@@ -359,6 +405,7 @@ choose() {
 
 need_packages "to check the packages" g++ g++-multilib cmake ninja-build dpkg-dev mmdebstrap arch-test lintian mandoc \
   binutils python3
+need_scan_libraries
 mirror=$(mirror)
 if [[ -z $mirror ]]; then
   "${as_root[@]}" apt-get update -qq
@@ -405,6 +452,7 @@ for architecture in amd64 i386; do
     check_plugins /usr/lib/i386-linux-gnu/vsttorture/vsttorture i386
     check_plugins /usr/lib/i386-linux-gnu/vsttorture/vsttorture-worker i386
     check_describe /usr/lib/i386-linux-gnu/vsttorture/vsttorture-describe i386
+    check_scan
   fi
   subject="Debian for $architecture"
   check "removed, the packages leave nothing" "$before" \

@@ -2,9 +2,10 @@
 """Tests of `cmake --install`: which files it puts where, below a staging folder and below prefixes of all kinds; and
 that all files that name the version name the same one.
 
-    install_test.py BUILD SAMPLE_PLUGIN
+    install_test.py BUILD SAMPLE_PLUGIN HAS_SCAN
 
-The build is the one that is being tested, so each preset installs its own programs.
+HAS_SCAN is 1 when vsttorture-scan is part of the build, else 0. The build is the one that is being tested, so each
+preset installs its own programs.
 """
 import json
 import os
@@ -32,9 +33,13 @@ COPIES = {
     "share/man/man1/vsttorture-worker.1": "docs/vsttorture-worker.1",
     "share/man/man1/vsttorture.1": "docs/vsttorture.1",
 }
-INSTALLED = {**dict.fromkeys(COPIES, 0o644), **dict.fromkeys(PROGRAMS, 0o755),
-             "share/doc/vsttorture/examples/explain_plugin.py": 0o755,
-             "share/doc/vsttorture/examples/try_plugin.py": 0o755}
+SCAN_PROGRAM = "bin/vsttorture-scan"
+COPIES_FOR_SCAN = {
+    "share/bash-completion/completions/vsttorture-scan": "completions/vsttorture-scan.bash",
+    "share/doc/vsttorture/VERDICTS.md": "docs/VERDICTS.md",
+    "share/doc/vsttorture/schema/scan-events.schema.json": "docs/schema/scan-events.schema.json",
+    "share/man/man1/vsttorture-scan.1": "docs/vsttorture-scan.1",
+}
 
 
 class Install(unittest.TestCase):
@@ -54,8 +59,13 @@ class Install(unittest.TestCase):
         """Below the root lie the files of an installation with this prefix and no others, and the programs run."""
         found = {str(path.relative_to(root)): stat.S_IMODE(path.stat().st_mode)
                  for path in root.rglob("*") if not path.is_dir()}
-        self.assertEqual(found, {f"{prefix}{name}": mode for name, mode in INSTALLED.items()})
-        for name, source in COPIES.items():
+        copies = {**COPIES, **(COPIES_FOR_SCAN if has_scan else {})}
+        programs = PROGRAMS + ([SCAN_PROGRAM] if has_scan else [])
+        executable = {*programs, "share/doc/vsttorture/examples/explain_plugin.py",
+                      "share/doc/vsttorture/examples/try_plugin.py"}
+        self.assertEqual(found, {f"{prefix}{name}": 0o755 if name in executable else 0o644
+                                 for name in [*programs, *copies]})
+        for name, source in copies.items():
             self.assertEqual((root / f"{prefix}{name}").read_bytes(), (SOURCE / source).read_bytes())
         for program in "vsttorture", "vsttorture-worker":
             run = self.run_on_sample_plugin(root / f"{prefix}bin/{program}")
@@ -63,6 +73,10 @@ class Install(unittest.TestCase):
                              (0, ["total, 64", "1, test gathering info"]))
         run = self.run_on_sample_plugin(root / f"{prefix}bin/vsttorture-describe")
         self.assertEqual((run.returncode, json.loads(run.stdout)["name"]), (0, "Well-behaved effect"))
+        if has_scan:  # It uses the worker that lies beside it.
+            run = self.run_on_sample_plugin(root / f"{prefix}{SCAN_PROGRAM}")
+            self.assertEqual((run.returncode, run.stdout.splitlines()[-1].split(", in ")[0]),
+                             (0, "1 result: 1 passed"))
 
     def run_on_sample_plugin(self, program):
         return subprocess.run([program, sample_plugin], stdout=subprocess.PIPE, text=True, check=False)
@@ -103,5 +117,5 @@ class Version(unittest.TestCase):
 
 
 if __name__ == "__main__":
-    build, sample_plugin = sys.argv[1:]
+    build, sample_plugin, has_scan = sys.argv[1:3] + [sys.argv[3] == "1"]
     unittest.main(argv=sys.argv[:1])
