@@ -23,6 +23,7 @@ VstInt32 countOrFail(VstInt32 claimed, VstInt32 most) {
 std::vector<std::string> currentValueTexts(VSTWrapper& wrapper) {
   const VstInt32 count = countOrFail(wrapper.effect->numParams, kMostParameters);
   std::vector<std::string> texts;
+  texts.reserve(static_cast<std::size_t>(count));
   for (VstInt32 i = 0; i < count; ++i) texts.push_back(wrapper.getParameterCurValueAsText(i));
   return texts;
 }

@@ -35,8 +35,9 @@ void storePath(volatile char (&field)[size], std::string_view path) {
 /// Puts memory that nobody sees in the place of the record, for all stores that still come. One system call, so
 /// that no thread ever stores into nothing.
 void leaveRecordAsItIs() {
-  mmap(&gFlightRecordPage, sizeof gFlightRecordPage, PROT_READ | PROT_WRITE,
-       MAP_PRIVATE | MAP_ANON | MAP_FIXED, -1, 0);
+  // Where that fails, the stores go on: nothing better can be done.
+  static_cast<void>(mmap(&gFlightRecordPage, sizeof gFlightRecordPage, PROT_READ | PROT_WRITE,
+                         MAP_PRIVATE | MAP_ANON | MAP_FIXED, -1, 0));
 }
 
 }  // namespace

@@ -44,8 +44,8 @@ constexpr CFStringEncoding kCFStringEncodingASCII = 0x0600;
 constexpr CFStringEncoding kCFStringEncodingUTF8 = 0x08000100;
 constexpr CFURLPathStyle kCFURLPOSIXPathStyle = 0;
 
-/// Destroys `object`, which must not be null. Leaves constants alone.
-void CFRelease(CFTypeRef object);
+/// Destroys what `reference` refers to; it must not be null. Leaves constants alone.
+void CFRelease(CFTypeRef reference);
 
 /// The constant string with the text of a literal; equal texts give the same object. It has no owner and is
 /// never destroyed.

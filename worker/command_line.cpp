@@ -51,7 +51,7 @@ bool readFile(const std::string& path, std::string& content, std::string& mistak
     return false;
   }
   content.resize(kMostBytesOfList + 1);
-  content.resize(std::fread(&content[0], 1, content.size(), file.get()));
+  content.resize(std::fread(content.data(), 1, content.size(), file.get()));
   if (std::ferror(file.get()) != 0) {
     mistake = "cannot read the tests from " + path + ": " + std::strerror(errno);
     return false;
