@@ -32,6 +32,13 @@ void makeRoom(AutoBuffer<char>& out, std::size_t headerSize, std::int64_t fixed,
   out.setSize(std::max(sizeOrFail(fixed, count, each), static_cast<int>(headerSize)));
 }
 
+/// On purpose: the pointer is not checked. A null chunk with a size crashes, as a bad pointer does. Volatile, since
+/// the compiler may take an argument of memcpy() for not null.
+__attribute__((no_sanitize("undefined"))) void copyChunk(char* to, const void* chunk, std::size_t size) {
+  const void* volatile from = chunk;
+  std::memcpy(to, from, size);
+}
+
 /// Writes the 28 bytes that all forms begin with.
 /// On purpose: the byte-size field is 0 and not the size.
 void writeHeader(char* at, VstInt32 formMagic, const AEffect* effect, VstInt32 count) {
@@ -67,8 +74,7 @@ void VSTWrapper::getChunkData(AutoBuffer<char>& out, bool isPreset) const {
   const VstIntPtr size = dispatch(*effect, effGetChunk, isPreset ? 1 : 0, 0, &chunk);
   if (size > std::numeric_limits<int>::max() || size < 0) throw -1;
   out.setSize(static_cast<int>(size));
-  // On purpose: the pointer is not checked. A null chunk with a size crashes, as a bad pointer does.
-  if (size > 0) std::memcpy(out.data(), chunk, static_cast<std::size_t>(size));
+  if (size > 0) copyChunk(out.data(), chunk, static_cast<std::size_t>(size));
 }
 
 void VSTWrapper::setChunkData(const char* data, int size, bool isPreset) {
