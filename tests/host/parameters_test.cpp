@@ -6,7 +6,10 @@
 #include <cstring>
 #include <limits>
 #include <string>
+#include <utility>
+#include <vector>
 
+#include "flight_recorder/flight_recorder.h"
 #include "tests/host/preset_bytes.h"
 #include "tests/shared/observed_thread.h"
 #include "tests/shared/wrapper_fixture.h"
@@ -114,6 +117,26 @@ TEST_F(VSTWrapperParameterValues, AreNamedByParamBeingSetOnlyWhileThePluginSetsT
   wrapper->getParameter(1);
   EXPECT_THAT(atReads, ElementsAre(-1, -1, -1));
   EXPECT_THAT(atWrites, ElementsAre(2));
+}
+
+// What a crash in the middle of a row is explained by.
+TEST_F(VSTWrapperParameterValues, AreNamedByTheFlightRecordOneByOneAlsoInARow) {
+  AutoBuffer<char> store;
+  wrapper->createTempParameterStore(store);
+  effect.setParameters({0.9f, 0.9f});
+  using Noted = std::pair<std::uint32_t, std::int32_t>;
+  std::vector<Noted> noted;
+  effect.onRequest = [&](const Request& request) {
+    if (request.kind == Request::Kind::kDispatch) return;
+    EXPECT_EQ(flightRecord().request.state, kFlightUnderWay);
+    noted.emplace_back(flightRecord().request.kind, flightRecord().request.index);
+    if (request.index == 1 && isWrite(request)) throw 7;
+  };
+  wrapper->restoreFromTempParameterStore(store);
+  EXPECT_THAT(noted, ElementsAre(Noted(kFlightGetParameter, 0), Noted(kFlightSetParameter, 0),
+                                 Noted(kFlightGetParameter, 1), Noted(kFlightSetParameter, 1)));
+  EXPECT_EQ(flightRecord().request.state, kFlightReturned);
+  EXPECT_EQ(flightRecord().thrown.kind, kFlightSetParameter);
 }
 
 // On purpose: the inner one does not restore the outer one's index.
