@@ -104,7 +104,8 @@ need_build_tools() {
 # need_scan_libraries: what building vsttorture-scan takes in addition.
 need_scan_libraries() {
   need_tools "to build vsttorture-scan" pkg-config /usr/include/uv.h=libuv1-dev /usr/include/CLI/CLI.hpp=libcli11-dev \
-    /usr/include/fmt/format.h=libfmt-dev /usr/include/nlohmann/json.hpp=nlohmann-json3-dev
+    /usr/include/fmt/format.h=libfmt-dev /usr/include/nlohmann/json.hpp=nlohmann-json3-dev \
+    /usr/include/sqlite3.h=libsqlite3-dev /usr/include/pugixml.hpp=libpugixml-dev
 }
 
 # build_folder PRESET: where its build is: below $VSTTORTURE_BUILD, or else build/.

@@ -141,6 +141,7 @@ void addSeen(Json& event, const RunSeen& seen, const Judgement& judgement) {
   event["printed"] = printedJson(seen);
   event["outputBytes"] = seen.outputBytes;
   event["leftBehind"] = {{"processes", seen.leftBehind.processes},
+                         {"sharedMemory", seen.leftBehind.sharedMemory},
                          {"files", texts(seen.leftBehind.files)},
                          {"fileCount", seen.leftBehind.fileCount},
                          {"fileBytes", seen.leftBehind.fileBytes}};
@@ -160,7 +161,55 @@ Json repetitionsJson(const std::optional<Repetitions>& repetitions) {
       {"runs", repetitions->runs}, {"isFlaky", repetitions->isFlaky()}, {"verdicts", repetitions->verdicts}};
 }
 
+Json comparisonJson(const std::optional<Comparison>& comparison) {
+  if (!comparison) return nullptr;
+  Json earlier = nullptr;
+  if (comparison->earlier) {
+    earlier = {{"verdict", comparison->earlier->verdict},
+               {"step", orNull(comparison->earlier->step)},
+               {"time", comparison->earlier->time}};
+  }
+  return {{"change", nameOfChange(comparison->change)}, {"earlier", earlier}};
+}
+
+Json diagnosisJson(const std::optional<Diagnosis>& diagnosis) {
+  if (!diagnosis) return nullptr;
+  Json findings = Json::array();
+  for (const Diagnosis::Finding& one : diagnosis->findings)
+    findings.push_back({{"kind", text(one.kind)}, {"text", text(one.text)}, {"frames", texts(one.frames)}});
+  return {{"tool", text(diagnosis->tool)},
+          {"command", texts(diagnosis->command)},
+          {"findings", findings},
+          {"problem", diagnosis->problem.empty() ? Json(nullptr) : text(diagnosis->problem)},
+          {"report", text(diagnosis->report)}};
+}
+
+Json shrunkJson(const std::optional<Shrunk>& shrunk) {
+  if (!shrunk) return nullptr;
+  return {{"from", shrunk->from},
+          {"tests", shrunk->tests},
+          {"runs", shrunk->runs},
+          {"isReproduced", shrunk->isReproduced},
+          {"command", texts(shrunk->command)}};
+}
+
 }  // namespace
+
+const char* nameOfChange(Comparison::Change change) {
+  switch (change) {
+    case Comparison::Change::kNone:
+      return "none";
+    case Comparison::Change::kNew:
+      return "new";
+    case Comparison::Change::kMended:
+      return "mended";
+    case Comparison::Change::kStillFailing:
+      return "still_failing";
+    case Comparison::Change::kFlaky:
+      return "flaky";
+  }
+  return "none";
+}
 
 std::string eventLine(const ScanStarted& started) {
   return line({{"event", "scan_started"},
@@ -205,6 +254,10 @@ std::string eventLine(const PluginResult& result) {
       {"expected", expectedJson(result.expected)},
       {"repetitions", repetitionsJson(result.repetitions)},
       {"command", texts(result.command)},
+      {"isRemembered", result.isRemembered},
+      {"comparison", comparisonJson(result.comparison)},
+      {"diagnosis", diagnosisJson(result.diagnosis)},
+      {"shrunk", shrunkJson(result.shrunk)},
   };
   if (result.seen) addSeen(event, *result.seen, judgement);
   if (result.description) event["description"] = Json::parse(*result.description, nullptr, false);

@@ -31,6 +31,48 @@ struct Expectation {
   bool isMet = false;
 };
 
+/// How a result compares with an earlier one of the same plug-in: the last scan's, or the baseline's.
+struct Comparison {
+  enum class Change {
+    kNone,          ///< Good before and now, or not known before and good.
+    kNew,           ///< Fails, and did not before, or in another way (with another verdict).
+    kMended,        ///< Failed before, and is good now.
+    kStillFailing,  ///< Fails with the verdict that it had before.
+    kFlaky,         ///< Ended differently although nothing that matters has changed, or is flaky in itself.
+  };
+  /// What the plug-in ended with before.
+  struct Earlier {
+    std::string verdict;  ///< The word.
+    std::optional<int> step = {};
+    double time = 0;  ///< When that run began, in seconds since 1970.
+  };
+  Change change = Change::kNone;
+  std::optional<Earlier> earlier = {};  ///< Nothing for a plug-in that is seen for the first time.
+};
+
+/// What a tool for finding errors (memcheck, gdb or a command of the user's) said of a further run.
+struct Diagnosis {
+  struct Finding {
+    std::string kind;                      ///< The tool's word: "InvalidRead", "SIGSEGV".
+    std::string text;                      ///< One line for people.
+    std::vector<std::string> frames = {};  ///< Innermost first: "function (file:line)" or "module+0xoffset".
+  };
+  std::string tool;                       ///< "memcheck", "gdb", or the command's name.
+  std::vector<std::string> command = {};  ///< What repeats the run under the tool.
+  std::vector<Finding> findings = {};
+  std::string problem = {};  ///< Why there is no diagnosis: a sentence; empty where there is one.
+  std::string report = {};   ///< What the tool printed, its last 64 KiB.
+};
+
+/// The shortest list of tests that was found to fail in the same way.
+struct Shrunk {
+  std::string from;           ///< The tests that were run first: "0,3,3,1".
+  std::string tests;          ///< The list that was left of them; the same where it did not shrink.
+  unsigned runs = 0;          ///< How many runs that took.
+  bool isReproduced = false;  ///< Whether running `from` again failed in the same way at all.
+  std::vector<std::string> command = {};  ///< What repeats the failure.
+};
+
 struct PluginResult {
   Run run;
   std::vector<std::string> otherNames = {};
@@ -41,6 +83,10 @@ struct PluginResult {
   bool isWanted = true;                         ///< Good, or as expected.
   std::optional<std::string> description = {};  ///< With --describe: the object that the describer printed.
   std::vector<std::string> command = {};        ///< What repeats the run.
+  bool isRemembered = false;                    ///< From an earlier scan; no process was started.
+  std::optional<Comparison> comparison = {};    ///< Where there is something to compare with.
+  std::optional<Diagnosis> diagnosis = {};      ///< With --under.
+  std::optional<Shrunk> shrunk = {};            ///< With --shrink, for a run that failed.
 };
 
 struct ScanStarted {
@@ -65,5 +111,15 @@ struct ScanEnded {
   bool isInterrupted = false;
   int status = 0;  ///< Of vsttorture-scan.
 };
+
+/// A whole scan, as reports that are written at its end need it.
+struct ScanReport {
+  ScanStarted started;
+  std::vector<PluginResult> results;
+  std::optional<ScanEnded> ended;  ///< Nothing of a scan that was killed.
+};
+
+/// "new", "mended", "still_failing", "flaky"; "none" for no change worth a word.
+const char* nameOfChange(Comparison::Change change);
 
 }  // namespace scanner
