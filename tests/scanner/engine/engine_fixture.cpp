@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <sstream>
 #include <stdexcept>
 #include <thread>
 
@@ -56,9 +57,10 @@ std::set<int> processesNamed(const std::string& argument) {
     const std::string name = entry.path().filename();
     if (name.find_first_not_of("0123456789") != std::string::npos) continue;
     std::ifstream file(entry.path() / "cmdline");
-    const std::string commandLine(
-        '\0' + std::string((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>()));
-    if (commandLine.find('\0' + argument + '\0') != std::string::npos) found.insert(std::stoi(name));
+    std::ostringstream commandLine;
+    // An istreambuf_iterator would throw for a process that ends meanwhile; operator<< does not.
+    commandLine << '\0' << file.rdbuf();
+    if (commandLine.str().find('\0' + argument + '\0') != std::string::npos) found.insert(std::stoi(name));
   }
   return found;
 }
