@@ -1,8 +1,12 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/events/event_json.h"
 
+#include <utility>
+
 #include <fmt/format.h>
 #include <nlohmann/json.hpp>
+
+#include "scanner/events/bounded_json.h"
 
 namespace scanner {
 namespace {
@@ -260,7 +264,11 @@ std::string eventLine(const PluginResult& result) {
       {"shrunk", shrunkJson(result.shrunk)},
   };
   if (result.seen) addSeen(event, *result.seen, judgement);
-  if (result.description) event["description"] = Json::parse(*result.description, nullptr, false);
+  if (result.description) {
+    // The describer ran the plug-in's code, so that this may be anything.
+    std::optional<Json> description = parseBounded(*result.description, kDeepestEvent - 1, nullptr);
+    if (description) event["description"] = std::move(*description);
+  }
   return line(event);
 }
 

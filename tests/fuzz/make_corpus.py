@@ -6,6 +6,7 @@
 
 Leaves inputs alone that were added by hand because a fuzzer found them.
 """
+import json
 import pathlib
 import struct
 
@@ -99,7 +100,53 @@ READ_RECORDS = {
     "ends_in_a_text": b"\0\x40half",
 }
 
-for folder, inputs in {"load_preset": LOAD_PRESET, "read_records": READ_RECORDS}.items():
+PLUGIN = {"bundle": "/a.so", "child": None, "childName": None, "target": {"system": "linux", "processor": "x86_64"}}
+NOTHING = {"step": None, "request": None, "hostRequest": None, "status": None, "signal": None, "place": None,
+           "activity": None, "hangs": None, "expected": None, "repetitions": None, "comparison": None,
+           "diagnosis": None, "shrunk": None}
+ENDED = {"event": "plugin_ended", "plugin": PLUGIN, "otherNames": [], "verdict": "passed", "isWanted": True,
+         "cause": "", **NOTHING, "contradictions": [], "command": [], "isRemembered": False}
+SEEN = {"time": 1.5, "wallSeconds": 2, "userSeconds": 0, "systemSeconds": 0, "peakMemoryInBytes": 1,
+        "sandbox": "none", "steps": [{"number": 1, "text": "a", "seconds": 0.5},
+                                     {"number": 2, "text": "b", "seconds": None}],
+        "tests": "0,3", "printed": [{"step": 1, "stream": "stderr", "text": "a\n"}], "outputBytes": 2,
+        "leftBehind": {"processes": 0, "sharedMemory": 0, "files": ["x"], "fileCount": 1, "fileBytes": 9}}
+FULL = {**ENDED, **SEEN, "plugin": {**PLUGIN, "child": -7, "childName": "c"}, "verdict": "hung", "isWanted": False,
+        "step": {"number": 5, "text": "testing"},
+        "request": {"kind": "dispatcher", "opcode": 44, "name": "effSetBypass", "index": 0, "value": 1, "opt": 0.5},
+        "hostRequest": {"opcode": 1, "name": "n", "index": 0, "value": -1, "count": 3},
+        "status": 7, "signal": {"number": 11, "name": "SIGSEGV"},
+        "place": {"module": "a.so", "offset": "0x1f", "address": "0x0"},
+        "activity": {"processorSeconds": 1, "wallSeconds": 2, "state": "R", "systemCall": None, "sockets": 0},
+        "hangs": "busy", "expected": {"verdict": "passed", "step": None, "reason": "", "isMet": False},
+        "repetitions": {"runs": 2, "isFlaky": True, "verdicts": {"passed": 1, "hung at 5": 1}},
+        "comparison": {"change": "new", "earlier": {"verdict": "passed", "step": None, "time": 1}},
+        "diagnosis": {"tool": "gdb", "command": ["gdb"], "findings": [{"kind": "k", "text": "t", "frames": ["f"]}],
+                      "problem": None, "report": "r"},
+        "shrunk": {"from": "0,3", "tests": "3", "runs": 2, "isReproduced": True, "command": ["w"]},
+        "description": {"name": "n", "children": []}}
+
+
+def line(event):
+    return json.dumps(event, separators=(",", ":")).encode() + b"\n"
+
+
+READ_EVENT = {
+    "scan_started": line({"event": "scan_started", "format": 1, "version": "0.2.0", "time": 1, "machine": "m",
+                          "places": ["/"], "shard": {"part": 1, "parts": 2}, "jobs": 2,
+                          "limits": {"stepInSeconds": 20, "runInSeconds": 120, "memoryInBytes": 1,
+                                     "outputInBytes": 1, "filesInBytes": 1},
+                          "sandbox": "none", "plugins": 1, "notes": ["n"]}),
+    "run_started": line({"event": "run_started", "plugin": PLUGIN}),
+    "not_run": line({**ENDED, "verdict": "skipped"}),
+    "everything": line(FULL),
+    "parameter": line({**ENDED, **SEEN, "request": {"kind": "setParameter", "index": 1, "opt": None}}),
+    "scan_ended": line({"event": "scan_ended", "time": 1, "wallSeconds": 1, "counts": {"passed": 1}, "unwanted": 0,
+                        "isInterrupted": False, "status": 0}),
+    "nested": b'{"description":' + b"[" * 300 + b"]" * 300 + b"}",
+}
+
+for folder, inputs in {"load_preset": LOAD_PRESET, "read_records": READ_RECORDS, "read_event": READ_EVENT}.items():
     (CORPUS / folder).mkdir(parents=True, exist_ok=True)
     for name, data in inputs.items():
         (CORPUS / folder / name).write_bytes(data)
