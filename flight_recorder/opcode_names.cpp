@@ -6,8 +6,9 @@
 
 namespace {
 
-/// In the order of their numbers.
-constexpr const char* kNames[] = {
+// In the order of their numbers.
+
+constexpr const char* kEffectNames[] = {
     "effOpen",
     "effClose",
     "effSetProgram",
@@ -89,10 +90,69 @@ constexpr const char* kNames[] = {
     "effGetNumMidiInputChannels",
     "effGetNumMidiOutputChannels",
 };
-static_assert(std::size(kNames) == 80);
+static_assert(std::size(kEffectNames) == 80);
+
+constexpr const char* kHostNames[] = {
+    "audioMasterAutomate",
+    "audioMasterVersion",
+    "audioMasterCurrentId",
+    "audioMasterIdle",
+    "audioMasterPinConnected",
+    nullptr,  // The interface does not use it.
+    "audioMasterWantMidi",
+    "audioMasterGetTime",
+    "audioMasterProcessEvents",
+    "audioMasterSetTime",
+    "audioMasterTempoAt",
+    "audioMasterGetNumAutomatableParameters",
+    "audioMasterGetParameterQuantization",
+    "audioMasterIOChanged",
+    "audioMasterNeedIdle",
+    "audioMasterSizeWindow",
+    "audioMasterGetSampleRate",
+    "audioMasterGetBlockSize",
+    "audioMasterGetInputLatency",
+    "audioMasterGetOutputLatency",
+    "audioMasterGetPreviousPlug",
+    "audioMasterGetNextPlug",
+    "audioMasterWillReplaceOrAccumulate",
+    "audioMasterGetCurrentProcessLevel",
+    "audioMasterGetAutomationState",
+    "audioMasterOfflineStart",
+    "audioMasterOfflineRead",
+    "audioMasterOfflineWrite",
+    "audioMasterOfflineGetCurrentPass",
+    "audioMasterOfflineGetCurrentMetaPass",
+    "audioMasterSetOutputSampleRate",
+    "audioMasterGetOutputSpeakerArrangement",
+    "audioMasterGetVendorString",
+    "audioMasterGetProductString",
+    "audioMasterGetVendorVersion",
+    "audioMasterVendorSpecific",
+    "audioMasterSetIcon",
+    "audioMasterCanDo",
+    "audioMasterGetLanguage",
+    "audioMasterOpenWindow",
+    "audioMasterCloseWindow",
+    "audioMasterGetDirectory",
+    "audioMasterUpdateDisplay",
+    "audioMasterBeginEdit",
+    "audioMasterEndEdit",
+    "audioMasterOpenFileSelector",
+    "audioMasterCloseFileSelector",
+    "audioMasterEditFile",
+    "audioMasterGetChunkFile",
+    "audioMasterGetInputSpeakerArrangement",
+};
+static_assert(std::size(kHostNames) == 50);
+
+template <std::size_t size>
+const char* nameIn(const char* const (&names)[size], std::int32_t opcode) {
+  return opcode >= 0 && static_cast<std::size_t>(opcode) < size ? names[opcode] : nullptr;
+}
 
 }  // namespace
 
-const char* effectOpcodeName(std::int32_t opcode) {
-  return opcode >= 0 && static_cast<std::size_t>(opcode) < std::size(kNames) ? kNames[opcode] : nullptr;
-}
+const char* effectOpcodeName(std::int32_t opcode) { return nameIn(kEffectNames, opcode); }
+
+const char* hostOpcodeName(std::int32_t opcode) { return nameIn(kHostNames, opcode); }

@@ -116,6 +116,11 @@ std::string lastErrorLine(const RunSeen& seen) {
   return line.rfind(kPrefix, 0) == 0 ? line.substr(kPrefix.size()) : line;
 }
 
+/// Of an opcode: its own, or its number where it has none.
+std::string nameOr(const char* name, std::int32_t opcode) {
+  return name != nullptr ? name : fmt::format("opcode {}", opcode);
+}
+
 RequestSeen requestFrom(const ReportedRequest& reported) {
   RequestSeen request;
   switch (reported.kind) {
@@ -133,8 +138,7 @@ RequestSeen requestFrom(const ReportedRequest& reported) {
       break;
     default:
       request.kind = "dispatcher";
-      const char* name = effectOpcodeName(reported.opcode);
-      request.name = name != nullptr ? name : fmt::format("opcode {}", reported.opcode);
+      request.name = nameOr(effectOpcodeName(reported.opcode), reported.opcode);
   }
   request.opcode = reported.opcode;
   request.index = reported.index;
@@ -154,6 +158,7 @@ class Judge {
     out.stepText = lines.stepText;
     if (hasRecord) compareStep();
     decide();
+    addUnkillable();
     describePlace();
     describeSteps();
     return std::move(out);
@@ -541,6 +546,14 @@ class Judge {
                              megabytes(seen.peakMemoryInBytes), megabytes(limits.memoryInBytes));
   }
 
+  /// Whatever the verdict: it says nothing against the run itself.
+  void addUnkillable() {
+    if (seen.leftBehind.unkillable.empty()) return;
+    contradict(fmt::format(
+        "could not be killed: process {} is still there after SIGKILL, and has been left with the folder {}",
+        fmt::join(seen.leftBehind.unkillable, ", "), seen.leftBehind.folder));
+  }
+
   void say(Verdict verdict, const std::string& cause) {
     out.verdict = verdict;
     out.cause = cause;
@@ -558,7 +571,7 @@ class Judge {
       host.index = record.hostRequest.index;
       host.value = record.hostRequest.value;
       host.count = record.hostRequest.count;
-      host.name = fmt::format("opcode {}", host.opcode);
+      host.name = nameOr(hostOpcodeName(host.opcode), host.opcode);
       out.hostRequest = host;
     }
   }

@@ -30,7 +30,7 @@ struct RequestSeen {
 /// The last request of the plug-in to its host.
 struct HostRequestSeen {
   std::int32_t opcode = 0;
-  std::string name;
+  std::string name;  ///< Of the opcode, such as "audioMasterVersion"; "opcode 123" for one without a name.
   std::int32_t index = 0;
   std::int64_t value = 0;
   std::uint64_t count = 0;  ///< How many there were.

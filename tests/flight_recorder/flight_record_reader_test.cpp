@@ -7,6 +7,7 @@
 #include "flight_recorder/opcode_names.h"
 #include "tests/flight_recorder/record_bytes.h"
 #include "vst2/effect_opcodes.h"
+#include "vst2/host_opcodes.h"
 
 using testing::ElementsAre;
 
@@ -246,6 +247,69 @@ TEST(EffectOpcodeName, IsTheInterfacesOwn) {
   EXPECT_STREQ(effectOpcodeName(effGetNumMidiOutputChannels), "effGetNumMidiOutputChannels");
   EXPECT_EQ(effectOpcodeName(-1), nullptr);
   EXPECT_EQ(effectOpcodeName(80), nullptr);
+}
+
+TEST(HostOpcodeName, IsTheInterfacesOwn) {
+  struct Named {
+    std::int32_t opcode;
+    const char* name;
+  };
+#define NAMED(opcode) \
+  { opcode, #opcode }
+  constexpr Named kAll[] = {
+      NAMED(audioMasterAutomate),
+      NAMED(audioMasterVersion),
+      NAMED(audioMasterCurrentId),
+      NAMED(audioMasterIdle),
+      NAMED(audioMasterPinConnected),
+      NAMED(audioMasterWantMidi),
+      NAMED(audioMasterGetTime),
+      NAMED(audioMasterProcessEvents),
+      NAMED(audioMasterSetTime),
+      NAMED(audioMasterTempoAt),
+      NAMED(audioMasterGetNumAutomatableParameters),
+      NAMED(audioMasterGetParameterQuantization),
+      NAMED(audioMasterIOChanged),
+      NAMED(audioMasterNeedIdle),
+      NAMED(audioMasterSizeWindow),
+      NAMED(audioMasterGetSampleRate),
+      NAMED(audioMasterGetBlockSize),
+      NAMED(audioMasterGetInputLatency),
+      NAMED(audioMasterGetOutputLatency),
+      NAMED(audioMasterGetPreviousPlug),
+      NAMED(audioMasterGetNextPlug),
+      NAMED(audioMasterWillReplaceOrAccumulate),
+      NAMED(audioMasterGetCurrentProcessLevel),
+      NAMED(audioMasterGetAutomationState),
+      NAMED(audioMasterOfflineStart),
+      NAMED(audioMasterOfflineRead),
+      NAMED(audioMasterOfflineWrite),
+      NAMED(audioMasterOfflineGetCurrentPass),
+      NAMED(audioMasterOfflineGetCurrentMetaPass),
+      NAMED(audioMasterSetOutputSampleRate),
+      NAMED(audioMasterGetOutputSpeakerArrangement),
+      NAMED(audioMasterGetVendorString),
+      NAMED(audioMasterGetProductString),
+      NAMED(audioMasterGetVendorVersion),
+      NAMED(audioMasterVendorSpecific),
+      NAMED(audioMasterSetIcon),
+      NAMED(audioMasterCanDo),
+      NAMED(audioMasterGetLanguage),
+      NAMED(audioMasterOpenWindow),
+      NAMED(audioMasterCloseWindow),
+      NAMED(audioMasterGetDirectory),
+      NAMED(audioMasterUpdateDisplay),
+      NAMED(audioMasterBeginEdit),
+      NAMED(audioMasterEndEdit),
+      NAMED(audioMasterOpenFileSelector),
+      NAMED(audioMasterCloseFileSelector),
+      NAMED(audioMasterEditFile),
+      NAMED(audioMasterGetChunkFile),
+      NAMED(audioMasterGetInputSpeakerArrangement),
+  };
+#undef NAMED
+  for (const Named& one : kAll) EXPECT_STREQ(hostOpcodeName(one.opcode), one.name);
+  for (const std::int32_t unused : {-1, 5, 50}) EXPECT_EQ(hostOpcodeName(unused), nullptr);
 }
 
 }  // namespace

@@ -124,6 +124,10 @@ class SeenRun {
     record.set64(64, 335);
     return set(72, 1).set(76, kind).set(80, opcode).set(84, 0);
   }
+  SeenRun& hostRequest(std::uint32_t opcode, std::uint64_t count) {
+    record.set64(128, count);
+    return set(136, opcode);
+  }
   SeenRun& requestReturned() { return set(72, 2); }
   SeenRun& thrown(std::uint32_t kind, std::uint32_t opcode, std::uint32_t step) {
     return set(72, 3).set(192, 3).set(196, kind).set(200, opcode).set(220, step);
@@ -678,6 +682,31 @@ TEST(Judge, NamesModuleOffsetAndAddressOfACrash) {
   EXPECT_EQ(judgement.place->address, 0x1234u);
   EXPECT_EQ(judgement.signal, SIGSEGV);
   EXPECT_EQ(judgement.status, std::nullopt);
+}
+
+TEST(Judge, NamesTheLastRequestOfThePluginToItsHost) {
+  const auto requestAfter = [](SeenRun run) { return judge(run.crashes().result(), Limits()).hostRequest; };
+
+  const std::optional<HostRequestSeen> request = requestAfter(SeenRun::in(6).hostRequest(33, 2));
+  ASSERT_TRUE(request);
+  EXPECT_EQ(request->name, "audioMasterGetProductString");
+  EXPECT_EQ(request->opcode, 33);
+  EXPECT_EQ(request->count, 2u);
+  EXPECT_EQ(requestAfter(SeenRun::in(6).hostRequest(777, 1))->name, "opcode 777");
+  EXPECT_FALSE(requestAfter(SeenRun::in(6).hostRequest(0, 0)));
+}
+
+TEST(Judge, NamesProcessesThatCouldNotBeKilledAndJudgesTheRunAsWithoutThem) {
+  RunSeen passed = SeenRun::passed().result();
+  passed.leftBehind.unkillable = {77, 78};
+  passed.leftBehind.folder = "/tmp/scratch";
+  const Judgement judgement = judge(passed, Limits());
+
+  EXPECT_EQ(judgement.verdict, Verdict::kPassed);
+  EXPECT_THAT(
+      judgement.contradictions,
+      testing::ElementsAre("could not be killed: process 77, 78 is still there after SIGKILL, and has "
+                           "been left with the folder /tmp/scratch"));
 }
 
 TEST(Judge, GivesTheStatusOfAnExitAndNoSignal) {
