@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: MIT
-"""Fetches the i386 builds of the Debian packages that real_plugins.py runs, and the libraries they need.
+"""Fetches the i386 builds of the Debian packages that scan_real_plugins.py scans, and the libraries they need.
 
     fetch_i386.py FOLDER [PACKAGE...]
 
