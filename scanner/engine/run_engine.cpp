@@ -40,6 +40,8 @@ constexpr double kMeasureFilesAtTimesItsCost = 10;
 constexpr double kLongestWindowInSeconds = 2;
 constexpr double kPatienceAfterTermInSeconds = 2;
 constexpr double kPatienceAfterInterruptInSeconds = 0.5;
+/// How long a process may take to end when it has been killed.
+constexpr double kPatienceAfterKillInSeconds = 5;
 /// How long the pipes may stay open when all that could write to them is gone.
 constexpr double kPatienceWithPipesInSeconds = 0.5;
 /// So much of the limit, used by a run that failed, is what it failed of: the allocation that would have exceeded it
@@ -187,6 +189,7 @@ struct RunEngine::Implementation::ActiveRun {
   void readRest(Output& output);
   void hit(LimitHit limit);
   void killNow();
+  void giveUp();
   void watch(double now);
   void watchStep(double now);
   void sample(double now);
@@ -211,6 +214,7 @@ struct RunEngine::Implementation::ActiveRun {
   double startedAt = 0;
   double endedAt = 0;
   double terminatedAt = 0;
+  double killedAt = 0;
   double stepSince = 0;
   std::pair<std::uint32_t, std::uint32_t> stepKey = {0, 0};
   double sampledAt = 0;
@@ -300,7 +304,19 @@ void RunEngine::Implementation::ActiveRun::hit(LimitHit limit) {
 }
 
 void RunEngine::Implementation::ActiveRun::killNow() {
-  if (isRunning) kill(process, SIGKILL);
+  if (!isRunning) return;
+  if (killedAt == 0) killedAt = monotonicSeconds();
+  kill(process, SIGKILL);
+}
+
+/// It was killed and does not end. When it does after all, it is reaped like an orphan.
+void RunEngine::Implementation::ActiveRun::giveUp() {
+  seen.end.kind = End::Kind::kNotEnded;
+  seen.leftBehind.unkillable.push_back(process);
+  process = -1;
+  isRunning = false;
+  endedAt = monotonicSeconds();
+  seen.wallSeconds = endedAt - startedAt;
 }
 
 void RunEngine::Implementation::ActiveRun::makeRecord() {
@@ -320,6 +336,10 @@ std::string RunEngine::Implementation::ActiveRun::readRecord() const {
 
 void RunEngine::Implementation::ActiveRun::watch(double now) {
   if (!isRunning) return;
+  if (killedAt > 0) {
+    if (now - killedAt > kPatienceAfterKillInSeconds) giveUp();
+    return;
+  }
   if (terminatedAt > 0) {
     const bool isInterrupt = seen.limitHit == LimitHit::kInterrupted;
     const double patience = isInterrupt ? kPatienceAfterInterruptInSeconds : kPatienceAfterTermInSeconds;
@@ -482,11 +502,11 @@ RunEngine::Implementation::~Implementation() {
     kill(process, SIGKILL);
     system::reap(process);
   }
-  system::killOrphans(marks, {});
+  const bool isAnyLeft = !system::killOrphans(marks, {}).left.empty();
   active.clear();
   spareScratch.clear();
   // The folder first: should this process be killed now, the keeper still removes what is left.
-  system::removeTree(scratchRoot);
+  if (!isAnyLeft) system::removeTree(scratchRoot);
   system::dismissKeeper(keeper);
 }
 
@@ -617,6 +637,7 @@ void RunEngine::Implementation::takeEnd(ActiveRun& run) {
   RunSeen& seen = run.seen;
   const system::Orphans orphans = system::killOrphans({run.mark, run.mark}, livingProcesses());
   kill(-run.process, SIGKILL);
+  seen.leftBehind.unkillable = orphans.left;
   if (!sandbox) {
     std::vector<int> makers = orphans.killed;
     // What a limit of ours has ended did not get to ending its own processes.
@@ -672,8 +693,13 @@ void RunEngine::Implementation::finish(ActiveRun& run) {
   if (!run.queued.job.isWorker) seen.texts.push_back({0, false, std::move(run.wholeOutput)});
   for (PluginText& text : run.errorText.pieces()) seen.texts.push_back(std::move(text));
   seen.record = run.readRecord();
-  if (run.recordFile >= 0) unlink(run.scratch->record().c_str());
-  if (run.scratch->isAsNew()) {
+  const bool isUsed = !seen.leftBehind.unkillable.empty();
+  if (run.recordFile >= 0 && !isUsed) unlink(run.scratch->record().c_str());
+  if (isUsed) {
+    seen.leftBehind.folder = run.scratch->path();
+    run.scratch->leave();
+    run.scratch.reset();
+  } else if (run.scratch->isAsNew()) {
     spareScratch.push_back(std::move(run.scratch));
   } else {
     run.scratch->list(seen.leftBehind);

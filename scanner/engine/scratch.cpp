@@ -71,7 +71,9 @@ ScratchFolder::ScratchFolder(const std::string& folder_) : folder(folder_) {
   }
 }
 
-ScratchFolder::~ScratchFolder() { system::removeTree(folder); }
+ScratchFolder::~ScratchFolder() {
+  if (!isLeft) system::removeTree(folder);
+}
 
 std::vector<std::string> ScratchFolder::environment() const {
   return {

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// The folder of one run: its home, temporary files and flight record. Removed with everything in it.
+// The folder of one run: its home, temporary files and flight record. Removed with everything in it, unless it has
+// to be left.
 #pragma once
 
 #include <cstdint>
@@ -30,6 +31,8 @@ class ScratchFolder {
 
   /// True when there is nothing in it but the folders that it was made with, as they were: it can serve another run.
   [[nodiscard]] bool isAsNew() const;
+  /// It is not removed: a process still uses it, and the file system that it is on may not answer.
+  void leave() { isLeft = true; }
   /// What a plug-in has put here: files in its home and its temporary folder. The count ends at a million.
   void list(LeftBehind& leftBehind) const;
   /// The size of all that was put here. A file or folder counts as a block of 4096 bytes at least. No more is
@@ -38,6 +41,7 @@ class ScratchFolder {
 
  private:
   std::string folder;
+  bool isLeft = false;
 };
 
 }  // namespace scanner

@@ -45,6 +45,9 @@ int startProcess(const ProcessStart& start, std::string& reason, bool* isShortag
 /// Lets this process open as many descriptors as it may. Those that it starts get the limit that it had before.
 void allowManyDescriptors();
 
+/// How many processors this process may use, as taskset and containers limit them: 1 at least.
+unsigned usableProcessors();
+
 /// The number of a child, adopted ones too, that has ended and waits to be reaped, which keeps its number from being
 /// used again; 0 when there is none.
 int endedChild();
@@ -63,15 +66,20 @@ void addUsage(ProcessEnd& end, const ProcessEnd& other);
 /// Waits for a child and forgets it.
 ProcessEnd reap(int process);
 
+/// The same without waiting: nothing for a child that has not ended, or whose end somebody else has to see first, as
+/// for one that is being traced.
+std::optional<ProcessEnd> reapIfEnded(int process);
+
 // ---- Descendants ------------------------------------------------------------------------------------------
 
 /// From now on a descendant that loses its parent becomes a child of this process, so that it can be found.
 void adoptOrphans();
 
 /// Kills and reaps what this process has adopted and what carries one of these marks, with all of its descendants.
-/// `living` are our own children, which are left alone.
+/// `living` are our own children, which are left alone. Waits up to 5 seconds for the end of what was killed.
 struct Orphans {
   std::vector<int> killed;  ///< Their numbers.
+  std::vector<int> left;    ///< Those of our children that did not end in time.
   ProcessEnd used;          ///< Times and memory of all that were reaped; the rest of it says nothing.
 };
 Orphans killOrphans(const Marks& marks, const std::vector<int>& living);

@@ -106,7 +106,11 @@ PluginResult fullResult() {
     seen.lines.push_back({ProtocolLine::Kind::kStep, number, "step"});
   seen.texts = {{0, false, std::string("\0\r\n", 3)}, {4, true, "\xE2\x80\xA8 \xF0\x9F\x8E\xB5"}};
   seen.outputBytes = 7;
-  seen.leftBehind = {2, 1, {"home/.x"}, 101, std::numeric_limits<std::uint64_t>::max()};
+  seen.leftBehind.processes = 2;
+  seen.leftBehind.sharedMemory = 1;
+  seen.leftBehind.files = {"home/.x"};
+  seen.leftBehind.fileCount = 101;
+  seen.leftBehind.fileBytes = std::numeric_limits<std::uint64_t>::max();
   seen.activity = Activity{19.5, 20, 'R', "", 3};
   result.expected = Expectation{"crashed", 5, "known\tissue", false};
   result.repetitions = Repetitions{3, {{"passed", 2}, {"hung at 65", 1}}};

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 // Finding, watching and killing what a run has started.
 #include <algorithm>
+#include <chrono>
 #include <csignal>
 #include <cstdlib>
 
@@ -17,7 +18,7 @@ namespace {
 
 /// The one outside, and the first one in the process namespace.
 constexpr std::size_t kSandboxProcesses = 2;
-constexpr int kMostRounds = 1000;
+constexpr std::chrono::seconds kPatience{5};
 constexpr useconds_t kRoundInMicroseconds = 500;
 
 // Places of fields behind the name in /proc/PID/stat.
@@ -59,23 +60,23 @@ Orphans killOrphans(const Marks& marks, const std::vector<int>& living) {
     return std::find(processes.begin(), processes.end(), process) != processes.end();
   };
   // A process that is killed may have started another one just before, and takes a moment to end.
-  for (int round = 0; round < kMostRounds; ++round) {
-    bool isAnyLeft = false;
+  for (const auto end = std::chrono::steady_clock::now() + kPatience;;) {
+    orphans.left.clear();
     for (const int child : childrenOf(getpid())) {
       if (isIn(living, child)) continue;
       const Mark mark = markOf(child);
       if (mark < marks.first || mark > marks.last) continue;
-      isAnyLeft = true;
-      if (isZombie(child)) {
-        addUsage(orphans.used, reap(child));
+      if (const std::optional<ProcessEnd> ended = reapIfEnded(child)) {
+        addUsage(orphans.used, *ended);
         continue;
       }
+      orphans.left.push_back(child);
       for (const int process : descendantsOf(child)) {
         if (killIfMarked(process, marks) && !isIn(killed, process)) killed.push_back(process);
       }
       if (killIfMarked(child, marks) && !isIn(killed, child)) killed.push_back(child);
     }
-    if (!isAnyLeft) break;
+    if (orphans.left.empty() || std::chrono::steady_clock::now() > end) break;
     usleep(kRoundInMicroseconds);
   }
   return orphans;

@@ -83,18 +83,15 @@ Mark markOf(int process) {
   return std::strtoull(hard.c_str(), nullptr, 10);  // "unlimited" is 0.
 }
 
-bool isZombie(int process) {
-  const std::vector<std::string> stat = statFields(readProc(std::to_string(process) + "/stat"));
-  return !stat.empty() && (stat[0] == "Z" || stat[0] == "X");
-}
-
 bool killIfMarked(int process, const Marks& marks) {
   // The handle stays with the process that has the number now. If that has gone when the signal is sent, what was
   // read may have been another's; then there is nothing to be signalled.
   const auto handle = static_cast<int>(syscall(SYS_pidfd_open, process, 0));
   if (handle < 0) return false;
   const Mark mark = markOf(process);
-  const bool isOurs = mark != 0 && mark >= marks.first && mark <= marks.last && !isZombie(process);
+  const std::vector<std::string> stat = statFields(readProc(std::to_string(process) + "/stat"));
+  const bool hasEnded = !stat.empty() && (stat[0] == "Z" || stat[0] == "X");
+  const bool isOurs = mark != 0 && mark >= marks.first && mark <= marks.last && !hasEnded;
   const bool isKilled = isOurs && syscall(SYS_pidfd_send_signal, handle, SIGKILL, nullptr, 0) == 0;
   close(handle);
   return isKilled;

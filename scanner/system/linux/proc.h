@@ -27,9 +27,6 @@ std::vector<std::string> statFields(const std::string& stat);
 /// The mark that a process carries; 0 without one.
 Mark markOf(int process);
 
-/// Whether it has ended and waits to be reaped.
-bool isZombie(int process);
-
 /// Kills the process if it carries one of the marks and has not ended yet. Its number may be used again meanwhile:
 /// nobody else is killed then. True when it was killed.
 bool killIfMarked(int process, const Marks& marks);

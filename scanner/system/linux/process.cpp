@@ -8,6 +8,7 @@
 
 #include <fcntl.h>
 #include <linux/close_range.h>
+#include <sched.h>
 #include <sys/prctl.h>
 #include <sys/resource.h>
 #include <sys/wait.h>
@@ -130,6 +131,17 @@ void allowManyDescriptors() {
   setrlimit(RLIMIT_NOFILE, &own);
 }
 
+unsigned usableProcessors() {
+  cpu_set_t usable;
+  // Fails on a machine with more processors than the set has room for.
+  if (sched_getaffinity(0, sizeof usable, &usable) == 0) {
+    const int count = CPU_COUNT(&usable);
+    if (count > 0) return static_cast<unsigned>(count);
+  }
+  const long online = sysconf(_SC_NPROCESSORS_ONLN);
+  return online > 0 ? static_cast<unsigned>(online) : 1;
+}
+
 int endedChild() {
   siginfo_t info = {};
   return waitid(P_ALL, 0, &info, WEXITED | WNOHANG | WNOWAIT) == 0 ? info.si_pid : 0;
@@ -141,11 +153,9 @@ void addUsage(ProcessEnd& end, const ProcessEnd& other) {
   end.peakMemoryInBytes = std::max(end.peakMemoryInBytes, other.peakMemoryInBytes);
 }
 
-ProcessEnd reap(int process) {
-  int status = 0;
-  rusage used = {};
-  while (wait4(process, &status, 0, &used) < 0 && errno == EINTR) {
-  }
+namespace {
+
+ProcessEnd endFrom(int status, const rusage& used) {
   const auto seconds = [](const timeval& time) {
     return static_cast<double>(time.tv_sec) + static_cast<double>(time.tv_usec) / 1e6;
   };
@@ -156,6 +166,23 @@ ProcessEnd reap(int process) {
   end.systemSeconds = seconds(used.ru_stime);
   end.peakMemoryInBytes = static_cast<std::uint64_t>(used.ru_maxrss) * 1024;
   return end;
+}
+
+}  // namespace
+
+ProcessEnd reap(int process) {
+  int status = 0;
+  rusage used = {};
+  while (wait4(process, &status, 0, &used) < 0 && errno == EINTR) {
+  }
+  return endFrom(status, used);
+}
+
+std::optional<ProcessEnd> reapIfEnded(int process) {
+  int status = 0;
+  rusage used = {};
+  if (wait4(process, &status, WNOHANG, &used) != process) return std::nullopt;
+  return endFrom(status, used);
 }
 
 }  // namespace scanner::system
