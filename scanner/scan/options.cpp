@@ -6,7 +6,8 @@
 #include <cstdlib>
 
 #include <CLI/CLI.hpp>
-#include <unistd.h>
+
+#include "scanner/system/system.h"
 
 namespace scanner {
 namespace {
@@ -34,16 +35,11 @@ std::string checkSeconds(const std::string& text) {
   return isNumber && seconds > 0 ? "" : "\"" + text + "\" is no number of seconds above 0";
 }
 
-unsigned usableProcessors() {
-  const long count = sysconf(_SC_NPROCESSORS_ONLN);
-  return count > 0 ? static_cast<unsigned>(count) : 1;
-}
-
 }  // namespace
 
 std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& status) {
   ScanOptions options;
-  options.engine.jobs = usableProcessors();
+  options.engine.jobs = system::usableProcessors();
   Limits& limits = options.engine.limits;
   std::uint64_t memoryInMiB = limits.memoryInBytes >> 20;
   std::string shard;

@@ -89,6 +89,24 @@ class ScanTest(unittest.TestCase):
         return folder
 
 
+class Surroundings(ScanTest):
+    def test_as_many_run_at_a_time_as_there_are_processors_that_it_may_use(self):
+        few = sorted(os.sched_getaffinity(0))[:1]
+        first = self.events(PLUGINS / EFFECT, preexec_fn=lambda: os.sched_setaffinity(0, few))[0]
+        self.assertEqual((first["event"], first["jobs"]), ("scan_started", 1))
+
+    def test_two_scans_at_once_are_told_apart(self):
+        folder = self.copies(20)
+        arguments = [SCAN, "--sandbox=off", "-j", "4", "--no-progress", "--json", "-", folder]
+        scans = [subprocess.Popen(arguments, env=self.environment(), stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                                  stderr=subprocess.DEVNULL) for _ in range(2)]
+        for scan in scans:
+            events = [json.loads(line) for line in scan.communicate(timeout=120)[0].splitlines()]
+            self.assertEqual(scan.returncode, 0)
+            verdicts = [event["verdict"] for event in events if event["event"] == "plugin_ended"]
+            self.assertEqual(verdicts, ["passed"] * 20)
+
+
 class WrongUse(ScanTest):
     def assert_ends(self, status, sentence, *arguments, **more):
         result = self.scan(*arguments, **more)
