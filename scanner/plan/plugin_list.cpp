@@ -31,6 +31,8 @@ bool isNumber(const std::string& text) {
          number <= INT32_MAX;
 }
 
+std::string fileNameOf(const std::string& path) { return path.substr(path.rfind('/') + 1); }
+
 [[noreturn]] void fail(const std::string& file, unsigned line, const std::string& what) {
   throw BrokenList(fmt::format("{}, line {}: {}", file, line, what));
 }
@@ -40,7 +42,7 @@ template <class Take>
 PluginList readList(const std::string& path, Take take) {
   std::ifstream input(path, std::ios::binary);
   if (!input) throw BrokenList(fmt::format("{}: {}", path, std::strerror(errno)));
-  PluginList list{path, {}};
+  PluginList list(path);
   unsigned number = 0;
   for (std::string line; std::getline(input, line);) {
     ++number;
@@ -60,7 +62,7 @@ PluginList readList(const std::string& path, Take take) {
     }
     if (row.pattern.empty()) fail(path, number, "no plug-in is named");
     take(fields, row);
-    list.rows.push_back(row);
+    list.add(row);
   }
   if (input.bad()) throw BrokenList(fmt::format("{}: {}", path, std::strerror(errno)));
   return list;
@@ -81,11 +83,32 @@ bool PluginRow::matches(const std::string& bundle, const std::optional<std::int3
   return fnmatch(pattern.c_str(), bundle.c_str() + begin + 1, FNM_PATHNAME) == 0;
 }
 
-const PluginRow* PluginList::find(const std::string& bundle, const std::optional<std::int32_t>& child) const {
-  for (const PluginRow& row : rows) {
-    if (row.matches(bundle, child)) return &row;
+void PluginList::add(const PluginRow& row) {
+  const std::string name = fileNameOf(row.pattern);
+  // Brackets may hold a slash, so they are looked for in the whole pattern.
+  const bool isPattern =
+      name.find_first_of("*?") != std::string::npos || row.pattern.find_first_of("[\\") != std::string::npos;
+  (isPattern ? rowsWithPattern : rowsByFileName[name]).push_back(rows.size());
+  rows.push_back(row);
+}
+
+std::vector<const PluginRow*> PluginList::matching(const std::string& bundle,
+                                                   const std::optional<std::int32_t>& child) const {
+  std::vector<std::size_t> candidates = rowsWithPattern;
+  const auto named = rowsByFileName.find(fileNameOf(bundle));
+  if (named != rowsByFileName.end())
+    candidates.insert(candidates.end(), named->second.begin(), named->second.end());
+  std::sort(candidates.begin(), candidates.end());
+  std::vector<const PluginRow*> found;
+  for (const std::size_t one : candidates) {
+    if (rows[one].matches(bundle, child)) found.push_back(&rows[one]);
   }
-  return nullptr;
+  return found;
+}
+
+const PluginRow* PluginList::find(const std::string& bundle, const std::optional<std::int32_t>& child) const {
+  const std::vector<const PluginRow*> found = matching(bundle, child);
+  return found.empty() ? nullptr : found.front();
 }
 
 PluginList readSkipList(const std::string& path) {

@@ -16,6 +16,8 @@
 #include <optional>
 #include <stdexcept>
 #include <string>
+#include <unordered_map>
+#include <utility>
 #include <vector>
 
 namespace scanner {
@@ -39,12 +41,27 @@ struct PluginRow {
   bool matches(const std::string& bundle, const std::optional<std::int32_t>& wantedChild) const;
 };
 
-struct PluginList {
-  std::string file = {};
-  std::vector<PluginRow> rows = {};
+class PluginList {
+ public:
+  PluginList() = default;
+  explicit PluginList(std::string file_) : file(std::move(file_)) {}
 
-  /// The first row that matches, which decides, or null. Owned by the list.
-  const PluginRow* find(const std::string& bundle, const std::optional<std::int32_t>& child) const;
+  void add(const PluginRow& row);
+
+  /// All rows that match, in their order. Owned by the list. Fast also with a row for each of many plug-ins, as long as
+  /// the rows end with a file name rather than a pattern.
+  [[nodiscard]] std::vector<const PluginRow*> matching(const std::string& bundle,
+                                                       const std::optional<std::int32_t>& child) const;
+  /// The first of them, which decides, or null.
+  [[nodiscard]] const PluginRow* find(const std::string& bundle,
+                                      const std::optional<std::int32_t>& child) const;
+
+  std::string file = {};
+  std::vector<PluginRow> rows = {};  ///< Changed by add() alone.
+
+ private:
+  std::unordered_map<std::string, std::vector<std::size_t>> rowsByFileName;
+  std::vector<std::size_t> rowsWithPattern;  ///< Those that do not end with a file name.
 };
 
 /// Read the file at `path`. Throw BrokenList. A verdict word is checked against those of judge/verdict.h by

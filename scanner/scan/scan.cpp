@@ -302,10 +302,9 @@ class Scan {
     const bool isGood = rowOf(result.judgement.verdict).isGood;
     const bool isFlaky = result.repetitions && result.repetitions->isFlaky();
     result.isWanted = isGood && !isFlaky;
-    for (const PluginRow& row : expected.rows) {
-      if (row.matches(result.run.bundle, result.run.child)) rowsMet.insert(row.line);
-    }
-    const PluginRow* row = expected.find(result.run.bundle, result.run.child);
+    const auto rows = expected.matching(result.run.bundle, result.run.child);
+    for (const PluginRow* one : rows) rowsMet.insert(one->line);
+    const PluginRow* row = rows.empty() ? nullptr : rows.front();
     // The list of what to skip has a reason for each; it needs no second one.
     if (row != nullptr && result.judgement.verdict != Verdict::kSkipped) {
       const bool isMet = row->verdict == rowOf(result.judgement.verdict).word &&

@@ -39,6 +39,12 @@ class Lists {
   TemporaryDirectory folder;
 };
 
+PluginList listOf(const PluginRow& row) {
+  PluginList list("list");
+  list.add(row);
+  return list;
+}
+
 PluginList readExpected(const std::string& path) { return readExpectations(path, {"passed", "crashed"}); }
 
 struct Broken {
@@ -140,6 +146,15 @@ INSTANTIATE_TEST_SUITE_P(
                       Match{"a.so#*", "/lib/a.so", 2, true}, Match{"a.so#*", "/lib/a.so", {}, false},
                       Match{"a#b.so", "/lib/a#b.so", {}, true}));
 
+TEST(PluginListMatching, GivesNamesAndPatternsInTheOrderOfTheList) {
+  Lists lists;
+  const PluginList list = readSkipList(
+      lists.write("*\t1\nb.so\t2\na.so\t3\nlib/a.so\t4\n/lib[x/]a.so\t5\n/*/a.so\t6\na.s?\t7\na\\.so\t8\n"));
+  std::string reasons;
+  for (const PluginRow* row : list.matching("/lib/a.so", {})) reasons += row->reason;
+  EXPECT_EQ(reasons, "134678");
+}
+
 TEST(PluginListFind, TheFirstRowThatMatchesDecides) {
   Lists lists;
   const PluginList list = readExpected(lists.write("a.so\tcrashed\n*\tpassed\n"));
@@ -195,7 +210,7 @@ TEST(PlanRuns, WhatTheListSkipsIsNotRunWhateverItIsBuiltFor) {
   PluginRow row;
   row.pattern = "/a";
   row.reason = "needs a licence";
-  const RunList list = plan({module("/a", "aarch64"), module("/b", "x86_64")}, {"list", {row}});
+  const RunList list = plan({module("/a", "aarch64"), module("/b", "x86_64")}, listOf(row));
   ASSERT_EQ(list.notRun.size(), 1U);
   EXPECT_EQ(list.notRun[0].why, NotRun::Why::kSkipped);
   EXPECT_EQ(list.notRun[0].reason, "needs a licence");
@@ -240,7 +255,7 @@ TEST(RunsOfChildren, EachIdentifierIsRunOnceInTheShellsOrderBySameWorker) {
   row.child = "3";
   row.reason = "slow";
   const RunList list =
-      runsOfChildren(shell, {{7, "Seven"}, {-1, "Minus"}, {7, "Again"}, {3, "Three"}}, {"list", {row}});
+      runsOfChildren(shell, {{7, "Seven"}, {-1, "Minus"}, {7, "Again"}, {3, "Three"}}, listOf(row));
   ASSERT_EQ(list.runs.size(), 2U);
   EXPECT_EQ(list.runs[0].child, 7);
   EXPECT_EQ(list.runs[0].childName, "Seven");
