@@ -11,7 +11,7 @@ class Bytes {
   Bytes& number(std::uint64_t value, unsigned size) {
     for (unsigned i = 0; i < size; ++i) {
       const unsigned shift = 8 * (isBigEndian ? size - 1 - i : i);
-      content += static_cast<char>(value >> shift & 0xFF);
+      content += static_cast<char>(shift < 64 ? value >> shift & 0xFF : 0);
     }
     return *this;
   }

@@ -129,7 +129,10 @@ TEST_P(UnrulyPlugin, AllocatingWithoutEndMeetsTheLimitOfMemory) {
   EXPECT_GT(seen.peakMemoryInBytes, options.limits.memoryInBytes / 2);
 }
 
-TEST_P(UnrulyPlugin, AThousandThreadsAreItsOwnAffair) { EXPECT_TRUE(isPass(runBetweenOthers("threads"))); }
+TEST_P(UnrulyPlugin, AThousandThreadsAreItsOwnAffair) {
+  if (kWithThreadSanitizer) options.limits.stepInSeconds = 30;  // It takes milliseconds for each thread.
+  EXPECT_TRUE(isPass(runBetweenOthers("threads")));
+}
 
 TEST_P(UnrulyPlugin, ASegmentOfSystemVSharedMemoryIsRemoved) {
   const RunSeen seen = runBetweenOthers("system_v_segment");
