@@ -2,14 +2,19 @@
 # SPDX-License-Identifier: MIT
 """Holds the cost of vsttorture-scan against bare runs of vsttorture on the same plug-ins.
 
-    cmake --preset release && cmake --build --preset release
-    bench/scan.py [--build build/release] [--copies 200] [--rounds 7] [--modules FOLDER]
+    cmake --preset bench && cmake --build --preset bench
+    bench/scan.py [--build build/bench] [--copies 200] [--rounds 7] [--modules FOLDER]
+    bench/scan.py --sizes 1000 2500 5000 10000 [--build build/bench] [--jobs 2]
 
 A round is: all plug-ins run one after the other without the scan; scanned with -j 1, without and with sandbox;
 scanned with -j 2 without sandbox. Wall and processor time (user and system, of all processes) are taken of each; the
 medians of all rounds are printed. What a scan of one plug-in costs beyond its run is the start of the scan, which
 is taken off where the cost of a run is told. Bare runs write to /dev/null, which is the least that they can cost.
-Plug-ins are copies of the sample effect, or with --modules those below that folder. Needs Python's standard library.
+Plug-ins are copies of the sample effect, or with --modules those below that folder. A ratio follows each table.
+
+With --sizes it scans so many copies of the plug-in that answers nothing, once each, and prints wall time, time for each
+plug-in and the scan's own peak memory. They are copies, since hard links are one plug-in to the scan. No scan uses
+remembered results. Needs Python's standard library.
 """
 import argparse
 import json
@@ -47,6 +52,9 @@ class Bench:
     def __init__(self, build):
         self.scan = os.path.join(build, "vsttorture-scan")
         self.tool = os.path.join(build, "vsttorture")
+        self.null_plugin = os.path.join(build, "plugins", "null_plugin.so")
+        usage = subprocess.run([self.scan, "--help"], stdout=subprocess.PIPE, text=True, check=True).stdout
+        self.fresh = ["--cache", "off"] if "--cache" in usage else []
 
     def run_bare(self, plugins):
         silent = [(os.POSIX_SPAWN_OPEN, number, "/dev/null", os.O_RDWR, 0) for number in range(3)]
@@ -55,7 +63,7 @@ class Bench:
             os.waitpid(process, 0)
 
     def run_scan(self, options, plugins):
-        process = subprocess.run([self.scan, *options, "--quiet", "--no-progress", "--", *plugins],
+        process = subprocess.run([self.scan, *self.fresh, *options, "--quiet", "--no-progress", "--", *plugins],
                                  stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE,
                                  check=False)
         if process.returncode not in (0, 1):
@@ -67,20 +75,60 @@ class Bench:
 
     def modules_below(self, folder):
         """The modules that can be run here, as the scan finds them."""
-        events = subprocess.run([self.scan, "--sandbox=off", "--no-progress", "--json", "-", folder],
+        events = subprocess.run([self.scan, *self.fresh, "--sandbox=off", "--no-progress", "--json", "-", folder],
                                 stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, check=False).stdout
         started = [json.loads(line) for line in events.splitlines() if b'"run_started"' in line]
         return sorted({event["plugin"]["bundle"] for event in started if event["plugin"]["child"] is None})
 
 
+    def peak_of_scan(self, options, folder):
+        """Wall seconds of a scan, and the peak of its own resident memory in bytes, without that of its children."""
+        begin = time.perf_counter()
+        process = subprocess.Popen([self.scan, *self.fresh, *options, "--quiet", "--no-progress", folder],
+                                   stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL)
+        peak = 0
+        while process.poll() is None:
+            try:
+                status = pathlib.Path(f"/proc/{process.pid}/status").read_text()
+            except OSError:
+                continue
+            peak = max([peak] + [int(line.split()[1]) * 1024 for line in status.splitlines()
+                                 if line.startswith("VmHWM:")])
+            time.sleep(0.02)
+        seconds = time.perf_counter() - begin
+        if process.returncode not in (0, 1):
+            sys.exit(f"the scan ended with {process.returncode}")
+        return seconds, peak
+
+
+def compare_sizes(bench, sizes, jobs):
+    print(f"load {os.getloadavg()[0]:.1f}, -j {jobs}, no sandbox")
+    print("| plug-ins | wall s | ms a plug-in | peak memory MiB |")
+    print("|---|---|---|---|")
+    costs = []
+    for size in sizes:
+        with tempfile.TemporaryDirectory(prefix="scan-bench-") as folder:
+            for number in range(size):
+                shutil.copy(bench.null_plugin, os.path.join(folder, f"{number:05}.so"))
+            seconds, peak = bench.peak_of_scan(["-j", str(jobs), "--sandbox=off"], folder)
+        costs.append(seconds / size * 1000)
+        print(f"| {size} | {seconds:.1f} | {costs[-1]:.2f} | {peak / 2**20:.1f} |", flush=True)
+    print(f"time for a plug-in, {sizes[-1]} against {sizes[0]}: {costs[-1] / costs[0]:.2f} (goal: linear, 1)")
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
-    parser.add_argument("--build", default="build/release")
+    parser.add_argument("--build", default="build/bench")
     parser.add_argument("--copies", type=int, default=200)
     parser.add_argument("--rounds", type=int, default=7)
     parser.add_argument("--modules")
+    parser.add_argument("--sizes", type=int, nargs="+", metavar="COUNT")
+    parser.add_argument("--jobs", type=int, default=2, help="with --sizes: runs at a time")
     arguments = parser.parse_args()
     bench = Bench(os.path.abspath(arguments.build))
+    if arguments.sizes:
+        compare_sizes(bench, arguments.sizes, arguments.jobs)
+        return
     with tempfile.TemporaryDirectory(prefix="scan-bench-") as folder:
         if arguments.modules:
             plugins = bench.modules_below(arguments.modules)
@@ -111,6 +159,14 @@ def main():
         wall, processor = median(costs[way], 0), median(costs[way], 1)
         print(f"| {way} | {wall:.2f} | {processor:.2f} | {processor / median(costs['bare'], 1):.2f} "
               f"| {per_run(way, 0):.2f} | {per_run(way, 0) - per_run('bare', 0):.2f} | {per_run(way, 1):.2f} |")
+
+    if count > 1:
+        for way, goal in (("scan, no sandbox", 1), ("scan, sandbox", 8)):
+            print(f"more than a bare run, {way}: {per_run(way, 0) - per_run('bare', 0):.2f} ms (goal: {goal})")
+    serial, parallel = (median(costs[way], 0) for way in ("scan, no sandbox", "scan, no sandbox, -j 2"))
+    print(f"-j 2 against -j 1: {serial / parallel:.2f} times faster (goal: 1.9)")
+    processor = median(costs["scan, no sandbox"], 1) / median(costs["bare"], 1)
+    print(f"processor time without sandbox against bare runs: {processor:.2f} (goal: 1.05)")
 
 
 if __name__ == "__main__":

@@ -1,13 +1,14 @@
 # SPDX-License-Identifier: MIT
 """Many scanned runs with faults at random places: nothing may be left behind, and the scan's memory must stay flat.
 
-    soak.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--runs 2000] [-j 4] [--seed N]
+    soak.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--runs 2000] [-j 4]
+            [--sandbox=required] [--seed N]
 
 All runs belong to one scan, of copies of the faulty plug-in, each with a file beside it that names its fault. While
 it runs, its resident memory and its descriptors are measured. At the end there must be a verdict for each, and no
-process with one of the plug-ins in its command line, no scratch folder, no temporary file, no shared memory. The
-verdicts themselves are not looked at: which one a place leads to is what the fault matrix knows. Prints the seed
-first, so that the same faults can be had again.
+process with one of the plug-ins in its command line, no scratch folder, no temporary file or pipe, no shared memory of
+either kind. The verdicts themselves are not looked at: which one a place leads to is what the fault matrix knows. Prints
+the seed first, so that the same faults can be had again. Exits with 77 where a sandbox is required and none works.
 """
 import argparse
 import json
@@ -24,6 +25,7 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "fault_matrix"))
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 from engine.killed_scan import processes_of  # noqa: E402
+from judge.scan_matrix import SKIPPED, sandbox_works  # noqa: E402
 from rows import KINDS  # noqa: E402
 
 MOMENTS = ["load", "entry", "getParameter", "setParameter"]
@@ -82,10 +84,20 @@ class Looks:
         return problems
 
 
+def shared_memory():
+    """The segments that nobody may use any more: those of POSIX, and of System V where their maker has ended."""
+    found = {f"/dev/shm/{name}" for name in os.listdir("/dev/shm")}
+    for line in pathlib.Path("/proc/sysvipc/shm").read_text().splitlines()[1:]:
+        key, number, _, _, maker, _, attached = line.split()[:7]
+        if attached == "0" and not os.path.exists(f"/proc/{maker}"):
+            found.add(f"System V segment {number} (key {key}, of process {maker})")
+    return found
+
+
 def left_behind(world, shared_before):
     problems = [f"still running: {process}" for process in processes_of([str(world)])]
     problems += [f"still there: {path}" for path in (world / "tmp").iterdir()]
-    problems += [f"shared memory: {name}" for name in set(os.listdir("/dev/shm")) - shared_before]
+    problems += [f"shared memory: {name}" for name in shared_memory() - shared_before]
     return problems
 
 
@@ -98,8 +110,11 @@ def main():
     parser.add_argument("--sandbox", default="off")
     parser.add_argument("--seed", type=int, default=random.SystemRandom().randrange(1 << 32))
     arguments = parser.parse_args()
+    if arguments.sandbox == "required" and not sandbox_works():
+        print("bubblewrap does not work here")
+        return SKIPPED
     print(f"seed {arguments.seed}", flush=True)
-    shared_before = set(os.listdir("/dev/shm"))
+    shared_before = shared_memory()
     with tempfile.TemporaryDirectory(prefix="scan-soak-") as folder:
         world = pathlib.Path(folder)
         (world / "tmp").mkdir()

@@ -7,7 +7,8 @@
 The scan runs each file once, so a row is a copy of the faulty plug-in with a file beside it that names the fault; some
 hundred at a time. The rows are those of tests/fault_matrix/rows.py, and those below: lines, statuses and records that a
 plug-in forges. With --sandboxed only so many rows are run, drawn at random, in the sandbox. The environment variable
-VSTTORTURE_SCAN_MATRIX=all overrides --part.
+VSTTORTURE_SCAN_MATRIX=all overrides --part. With --sanitizer a few dozen of those rows are run that apply to programs
+that are built with it.
 
 Prints a line for each row that fails, then a summary. Status 77 where --sandboxed finds no sandbox that works.
 """
@@ -27,10 +28,12 @@ import time
 import zlib
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "fault_matrix"))
+from sanitizers import is_reported, reason_to_leave_out  # noqa: E402
 from rows import ALL_STEPS, FIRST_DRAWN, KIND_OF, PLACE_OF, PLACES, THROWN, all_rows  # noqa: E402
 
 ALL_ROWS = all_rows()
 ROWS_AT_A_TIME = 300
+PART_FOR_SANITIZERS = "1/100"
 SKIPPED = 77
 WITHOUT_CHECK = object()
 
@@ -278,6 +281,7 @@ def main():
     parser.add_argument("--list", action="store_true", help="print the rows and what they demand")
     parser.add_argument("--part", default="1/1", metavar="K/N", help="a fixed part of the rows")
     parser.add_argument("--sandboxed", type=int, metavar="COUNT", help="run so many rows in the sandbox")
+    parser.add_argument("--sanitizer", choices=["address", "thread"], help="the one that the programs are built with")
     parser.add_argument("--seed", type=int, default=random.SystemRandom().randrange(1 << 32), help="what draws them")
     parser.add_argument("--jobs", type=int, default=12, help="runs at a time; some of them only wait")
     arguments = parser.parse_args()
@@ -286,6 +290,9 @@ def main():
     part = "1/1" if os.environ.get("VSTTORTURE_SCAN_MATRIX") == "all" else arguments.part
     rows = [row for row in rows_of_everything() if re.search(arguments.only, row.name) and is_in_part(row, part)]
     options = ["--sandbox=off"]
+    if arguments.sanitizer is not None:
+        rows = [row for row in rows_of_everything() if is_in_part(row, PART_FOR_SANITIZERS) and not
+                (reason_to_leave_out(row, arguments.sanitizer) or is_reported(row, arguments.sanitizer))]
     if arguments.sandboxed is not None:
         if not sandbox_works():
             print("bubblewrap does not work here")
