@@ -108,6 +108,17 @@ need_scan_libraries() {
     /usr/include/sqlite3.h=libsqlite3-dev /usr/include/pugixml.hpp=libpugixml-dev
 }
 
+# take_turn: waits until no other ./run, ./scan or ./check builds this checkout, since two builds in one folder disturb
+# each other. The turn lasts until the shell ends, or until end_turn. Without flock (macOS) nobody waits.
+take_turn() {
+  command -v flock >/dev/null || return 0
+  exec 9<.
+  flock --nonblock 9 && return 0
+  say "waiting for another build of this checkout"
+  flock 9 || true
+}
+end_turn() { exec 9<&-; }
+
 # build_folder PRESET: where its build is: below $VSTTORTURE_BUILD, or else build/.
 build_folder() { echo "${VSTTORTURE_BUILD:-$PWD/build}/$1"; }
 

@@ -11,8 +11,8 @@ import tempfile
 import unittest
 
 SOURCE = pathlib.Path(__file__).resolve().parent.parent
-REAL_TOOLS = ["awk", "basename", "bash", "cat", "chmod", "dirname", "env", "grep", "mkdir", "mktemp", "readlink", "rm",
-              "sed", "sort", "touch", "uname"]
+REAL_TOOLS = ["awk", "basename", "bash", "cat", "chmod", "dirname", "env", "flock", "grep", "mkdir", "mktemp",
+              "readlink", "rm", "sed", "sort", "touch", "uname"]
 
 DOUBLES = {
     "id": "echo ${FAKE_USER_ID:-0}",
@@ -240,6 +240,17 @@ class Scan(Script):
         _, messages, status, _ = self.start("scan")
         self.assertEqual(status, 42)
         self.assertIn("scan: plug-ins run without a sandbox\n", messages)
+
+    def test_two_at_once_build_one_after_the_other(self):
+        self.add_double("cmake", 'case $1 in --version) echo "cmake version 3.25.1" ;; *) echo begin >>"$FAKE_LOG"; '
+                        'sleep 0.2; echo end >>"$FAKE_LOG"; exit 1 ;; esac')
+        (self.bin / "sleep").symlink_to(shutil.which("sleep"))
+        environment = {"PATH": str(self.bin), "FAKE_LOG": str(self.log)}
+        scans = [subprocess.Popen([self.root / "scan"], env=environment, stdin=subprocess.DEVNULL,
+                                  stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True) for _ in range(3)]
+        messages = "".join(scan.communicate(timeout=60)[1] for scan in scans)
+        self.assertEqual(self.log.read_text().splitlines(), ["begin", "end"] * 3)
+        self.assertIn("scan: waiting for another build of this checkout\n", messages)
 
     def test_a_build_that_fails_is_status_3(self):
         _, messages, status, _ = self.start("scan", FAKE_BUILD_FAILS="yes")
