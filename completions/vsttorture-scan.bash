@@ -7,7 +7,7 @@ _vsttorture_scan() {
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$current")
       return
       ;;
-    --skip | --expect | --json)
+    --skip | --expect | --cache | --json)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -f -- "$current")
       return
@@ -23,7 +23,7 @@ _vsttorture_scan() {
   esac
   if [[ $current == -* ]]; then
     mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --skip --expect --shard
-      --sandbox --describe --display --json --quiet --no-progress --workers --help --version" -- "$current")
+      --sandbox --describe --display --cache --fresh --json --quiet --no-progress --workers --help --version" -- "$current")
   else
     compopt -o filenames
     mapfile -t COMPREPLY < <(compgen -f -- "$current")

@@ -13,8 +13,6 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-constexpr int kFormat = 1;
-
 std::string line(const Json& event) {
   return event.dump(-1, ' ', false, Json::error_handler_t::replace) + "\n";
 }
@@ -217,7 +215,7 @@ const char* nameOfChange(Comparison::Change change) {
 
 std::string eventLine(const ScanStarted& started) {
   return line({{"event", "scan_started"},
-               {"format", kFormat},
+               {"format", kEventFormat},
                {"version", started.version},
                {"time", started.time},
                {"machine", text(started.machine)},

@@ -9,6 +9,9 @@
 
 namespace scanner {
 
+/// Of the events; the member "format" of scan_started. Another number for a change that readers notice.
+inline constexpr int kEventFormat = 1;
+
 /// Each is one line with its newline. Texts that are not valid UTF-8 (names of files, what a plug-in prints) are
 /// made so: a byte that cannot stay becomes U+FFFD.
 std::string eventLine(const ScanStarted& started);

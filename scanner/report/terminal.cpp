@@ -15,6 +15,7 @@ constexpr std::size_t kWordColumns = 12;
 constexpr std::size_t kTimeColumns = 8;
 constexpr std::size_t kIndent = 2;
 constexpr std::size_t kFewestColumns = 20;
+constexpr std::size_t kMostMendedNamed = 10;
 
 constexpr const char* kGreen = "\x1b[32m";
 constexpr const char* kRed = "\x1b[31m";
@@ -53,6 +54,29 @@ std::string secondsInWords(double seconds) {
   if (seconds < 100) return fmt::format("{:.0f} s", seconds);
   if (seconds < 3600) return fmt::format("{:.0f} min", seconds / 60);
   return fmt::format("{:.1f} h", seconds / 3600);
+}
+
+/// What has changed since the last scan, in a sentence; empty for nothing.
+std::string changeInWords(const PluginResult& result) {
+  if (!result.comparison || result.judgement.verdict == Verdict::kNotRun) return {};
+  const std::optional<Comparison::Earlier>& earlier = result.comparison->earlier;
+  const std::string before = !earlier        ? std::string()
+                             : earlier->step ? fmt::format("{} at {}", earlier->verdict, *earlier->step)
+                                             : earlier->verdict;
+  switch (result.comparison->change) {
+    case Comparison::Change::kNew:
+      return earlier ? "new: it was \"" + before + "\" before" : "new: it was not there before";
+    case Comparison::Change::kStillFailing:
+      return "still failing";
+    case Comparison::Change::kFlaky:
+      return earlier && earlier->verdict != rowOf(result.judgement.verdict).word
+                 ? "flaky: it was \"" + before + "\" before, and nothing has changed since"
+                 : "";
+    case Comparison::Change::kMended:
+    case Comparison::Change::kNone:
+      break;
+  }
+  return {};
 }
 
 }  // namespace
@@ -95,7 +119,12 @@ void TerminalReport::ended(const PluginResult& result) {
   const bool isGood = rowOf(result.judgement.verdict).isGood;
   const bool isFlaky = result.repetitions && result.repetitions->isFlaky();
   const bool isExpected = result.expected && result.expected->isMet;
-  if (!isGood || isFlaky || !result.isWanted) {
+  const bool changesByItself = result.comparison && result.comparison->change == Comparison::Change::kFlaky;
+  if (result.isRemembered) ++remembered;
+  if (result.comparison && result.comparison->change == Comparison::Change::kMended &&
+      ++mendedInAll <= kMostMendedNamed)
+    mended.push_back(nameOf(result.run, false));
+  if (!isGood || isFlaky || changesByItself || !result.isWanted) {
     remarkable.push_back(result);
     // What it printed and the like is not shown, and would be kept for each of many.
     remarkable.back().seen.reset();
@@ -108,13 +137,15 @@ void TerminalReport::ended(const PluginResult& result) {
   std::string line = fmt::format("{:<{}}", word, kWordColumns);
   if (columnsOf(line) > kWordColumns) line += ' ';
   std::string time(kTimeColumns + 2, ' ');
-  if (result.seen) time = fmt::format("{:>{}}  ", secondsInWords(result.seen->wallSeconds), kTimeColumns);
+  if (result.seen && !result.isRemembered)
+    time = fmt::format("{:>{}}  ", secondsInWords(result.seen->wallSeconds), kTimeColumns);
   const bool isNarrow = options.columns < 60;
   if (isNarrow) time.clear();
   const std::string name = printable(nameOf(result.run, !isNarrow));
   const std::size_t used = columnsOf(line) + columnsOf(time);
   const std::size_t room = options.columns > used ? options.columns - used : 1;
   std::string remark = isExpected && !isGood ? "  as expected" : "";
+  if (result.isRemembered) remark += "  (remembered)";
   if (columnsOf(name) + remark.size() > room) remark.clear();
   print(coloured(line, result.judgement.verdict, result.isWanted && !isFlaky) + time +
         shortened(name, options.isTerminal ? room : name.size()) + remark + "\n");
@@ -150,6 +181,7 @@ void TerminalReport::ended(const ScanEnded& scan) {
       }
       add("flaky: " + ends);
     }
+    if (const std::string change = changeInWords(result); !change.empty()) add(change);
     for (const std::string& contradiction : result.judgement.contradictions) add("note: " + contradiction);
     if (!result.command.empty()) block += indent + printable("again: " + shellCommand(result.command)) + "\n";
     print(block);
@@ -165,8 +197,16 @@ void TerminalReport::ended(const ScanEnded& scan) {
   }
   std::string summary = fmt::format("{} {}{}{}, in {}", total, total == 1 ? "result" : "results",
                                     counts.empty() ? "" : ": ", counts, secondsInWords(scan.wallSeconds));
+  if (remembered > 0)
+    summary += remembered == total ? "; all remembered" : fmt::format("; {} remembered", remembered);
   if (scan.isInterrupted) summary += "; interrupted";
   if (!isFirst) print("\n");
+  if (mendedInAll > 0) {
+    std::string names;
+    for (const std::string& name : mended) names += (names.empty() ? "" : ", ") + printable(name);
+    if (mendedInAll > mended.size()) names += fmt::format(" and {} more", mendedInAll - mended.size());
+    print(wrapped("mended: " + names, options.columns, kIndent) + "\n");
+  }
   print(wrapped(summary, options.columns, kIndent) + "\n");
 }
 

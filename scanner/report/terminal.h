@@ -47,6 +47,9 @@ class TerminalReport {
   std::function<bool(const std::string&)> write;
   bool hasProgressLine = false;
   std::vector<PluginResult> remarkable;  ///< For the table at the end.
+  std::vector<std::string> mended;       ///< Names of plug-ins that fail no longer; the first few.
+  std::size_t mendedInAll = 0;
+  std::size_t remembered = 0;
 };
 
 /// What people call a plug-in: the file's name, with its folder where that is wanted, and the child. Not yet

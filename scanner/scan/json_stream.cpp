@@ -28,7 +28,7 @@ JsonStream::~JsonStream() {
 }
 
 void JsonStream::write(const std::string& line) {
-  if (descriptor < 0 || !trouble.empty()) return;
+  if (!isOpen()) return;
   std::size_t written = 0;
   while (written < line.size()) {
     const ssize_t count = ::write(descriptor, line.data() + written, line.size() - written);

@@ -19,6 +19,9 @@ class JsonStream {
   /// to start. Throws std::runtime_error with a sentence where it cannot be.
   void openFile(const std::string& file);
 
+  /// Whether lines are wanted and can still be written.
+  [[nodiscard]] bool isOpen() const { return descriptor >= 0 && trouble.empty(); }
+
   void write(const std::string& line);
 
   /// Why no more is written; empty while all is well.

@@ -79,6 +79,10 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
       ->capture_default_str();
   app.add_flag("--describe", options.describes, "Add each plug-in's description to its result");
   app.add_flag("--display", options.engine.keepDisplay, "Let plug-ins see the display (DISPLAY)");
+  app.add_option("--cache", options.cacheFile,
+                 "Remember results in this file; off: nowhere. Without it: in the user's cache folder")
+      ->type_name("FILE");
+  app.add_flag("--fresh", options.isFresh, "Run again what is remembered");
   app.add_option("--json", options.jsonFile, "Write each event as one line of JSON; - is standard output")
       ->type_name("FILE");
   app.add_flag("--quiet", options.isQuiet, "No line for a plug-in that ended as it should");

@@ -28,7 +28,9 @@ struct ScanOptions {
   std::string expectFile = {};
   Shard shard = {};
   bool describes = false;
-  std::string jsonFile = {};  ///< "-" for standard output.
+  std::string jsonFile = {};   ///< "-" for standard output.
+  std::string cacheFile = {};  ///< Where results are remembered; empty for the default, "off" for nowhere.
+  bool isFresh = false;        ///< Nothing is taken from earlier scans, but all is remembered.
   bool isQuiet = false;
   bool showsProgress = true;
   std::vector<std::string> workerFolders = {};  ///< Looked into before the usual ones.

@@ -21,8 +21,10 @@
 
 #include "scanner/events/event_json.h"
 #include "scanner/find/find_modules.h"
+#include "scanner/plan/time_left.h"
 #include "scanner/report/terminal.h"
 #include "scanner/scan/json_stream.h"
+#include "scanner/scan/remembering.h"
 #include "scanner/scan/workers.h"
 
 namespace scanner {
@@ -94,7 +96,11 @@ class Scan {
       : options(options_),
         output(options.jsonFile == "-" ? STDERR_FILENO : STDOUT_FILENO),
         terminal(terminalOptions(options, output.descriptor),
-                 [this](const std::string& text) { return output.write(text); }) {
+                 [this](const std::string& text) { return output.write(text); }),
+        remembering(options, [this](const std::string& sentence) {
+          terminal.clearProgress();
+          complain(sentence);
+        }) {
     if (!options.skipFile.empty()) skipped = readSkipList(options.skipFile);
     if (!options.expectFile.empty()) expected = readExpectations(options.expectFile, verdictWords());
   }
@@ -102,30 +108,34 @@ class Scan {
   int run() {
     FindResult found;
     if (!find(found)) return kScanWrongUse;
-    const WorkersByProcessor workers = findWorkers(options.workerFolders, notes);
+    const WorkersByProcessor workers =
+        findWorkers(options.workerFolders, notes,
+                    [this](const std::string& program) { return remembering.versionOf(program); });
     if (workers.empty()) {
       for (const std::string& note : notes) complain(note);
       complain(fmt::format("there is no vsttorture-worker; looked in {}",
                            fmt::join(workerFolders(options.workerFolders), ", ")));
       return kScanCannotGoOn;
     }
-    RunEngine engine(options.engine);
-    json.openFile(options.jsonFile);
-    engineInUse = &engine;
     for (const Module& module : found.modules) otherNames[module.bundle] = module.otherNames;
     RunList list = planRuns(found.modules, workers, ownProcessor(), skipped, options.shard,
-                            [](const Module&) { return 0.0; });
+                            [this](const Module& module) { return remembering.secondsOf(module); });
     total = list.runs.size() + list.notRun.size();
-    begin(found, engine);
+    const Remembering::Recollection recollection = remembering.recall(list.runs, skipped);
+    if (!recollection.unknown.empty()) makeEngine();
+    json.openFile(options.jsonFile);
+    begin(found);
     for (const NotRun& one : list.notRun) endWithoutRun(one);
-    for (const Run& one : list.runs) start(one, false);
-    engine.onTick([this] { showProgress(); });
-    const bool isWhole = engine.run();
+    total += recollection.known.size() + recollection.unknown.size() + recollection.notRun.size() -
+             list.runs.size();
+    take(recollection, false);
+    const bool isWhole = !engine || engine->run();
     // Of several runs the later ones may have been left out by the interruption.
     for (const auto& plugin : std::vector(underWay)) {
+      plugin->isStopped = true;
       if (plugin->runsDone > 0) deliver(plugin);
     }
-    engineInUse = nullptr;
+    engine.reset();
     return finish(isWhole);
   }
 
@@ -134,6 +144,9 @@ class Scan {
   struct UnderWay {
     PluginResult result;
     unsigned runsDone = 0;
+    double earlierSeconds = 0;  ///< How long a run took in an earlier scan; 0 for unknown.
+    std::optional<std::vector<Child>> children = {};  ///< Of a shell that could be described.
+    bool isStopped = false;  ///< It was interrupted, so that the result is not whole.
   };
   using Plugin = std::shared_ptr<UnderWay>;
 
@@ -153,7 +166,12 @@ class Scan {
     return false;
   }
 
-  void begin(const FindResult& found, const RunEngine& engine) {
+  void makeEngine() {
+    engine = std::make_unique<RunEngine>(options.engine);
+    engine->onTick([this] { showProgress(); });
+  }
+
+  void begin(const FindResult& found) {
     startedAt = secondsSince1970();
     ScanStarted started;
     started.version = VSTTORTURE_VERSION;
@@ -163,11 +181,42 @@ class Scan {
     started.shard = options.shard;
     started.jobs = options.engine.jobs;
     started.limits = options.engine.limits;
-    started.sandbox = engine.isSandboxed() ? "bubblewrap" : "none (" + engine.whyNotSandboxed() + ")";
+    started.sandbox = !engine                 ? "none (nothing has to be run)"
+                      : engine->isSandboxed() ? "bubblewrap"
+                                              : "none (" + engine->whyNotSandboxed() + ")";
     started.plugins = total;
     started.notes = notes;
     json.write(eventLine(started));
     terminal.started(started);
+    remembering.begin(started);
+  }
+
+  /// Delivers what is known and queues the rest. Urgent runs go before all that are queued.
+  void take(const Remembering::Recollection& recollection, bool isUrgent) {
+    for (const Remembering::Known& one : recollection.known) {
+      std::optional<PluginResult> result = remembering.resultOf(one);
+      if (result) {
+        result->otherNames = otherNames[one.run.bundle];
+        result->command = commandOf(one.run);
+        deliver(*result);
+      } else {
+        start({one.run, one.answer.wallSeconds}, isUrgent);
+      }
+    }
+    for (const NotRun& one : recollection.notRun) endWithoutRun(one);
+    const std::vector<Remembering::Unknown>& unknown = recollection.unknown;
+    if (!isUrgent) {
+      for (const Remembering::Unknown& one : unknown) start(one, false);
+    } else {
+      // Each goes before all that are queued, so the last comes first.
+      for (auto one = unknown.rbegin(); one != unknown.rend(); ++one) start(*one, true);
+    }
+  }
+
+  [[nodiscard]] static std::vector<std::string> commandOf(const Run& run) {
+    std::vector<std::string> command = {run.workers.worker, run.bundle};
+    if (run.child) command.push_back(std::to_string(*run.child));
+    return command;
   }
 
   [[nodiscard]] Job workerJob(const Run& run, unsigned repetition) const {
@@ -179,17 +228,19 @@ class Scan {
     return job;
   }
 
-  void start(const Run& run, bool isUrgent) {
+  void start(const Remembering::Unknown& one, bool isUrgent) {
+    if (!engine) makeEngine();  // A remembered result could not be read.
     const auto plugin = std::make_shared<UnderWay>();
-    plugin->result.run = run;
-    plugin->result.otherNames = otherNames[run.bundle];
-    plugin->result.command = {run.workers.worker, run.bundle};
-    if (run.child) plugin->result.command.push_back(std::to_string(*run.child));
+    plugin->result.run = one.run;
+    plugin->result.otherNames = otherNames[one.run.bundle];
+    plugin->result.command = commandOf(one.run);
+    plugin->earlierSeconds = one.seconds * options.repeat;
+    timeLeft.expect(plugin->earlierSeconds);
     startRepetition(plugin, isUrgent);
   }
 
   void startRepetition(const Plugin& plugin, bool isUrgent) {
-    engineInUse->add(
+    engine->add(
         workerJob(plugin->result.run, plugin->runsDone),
         [this, plugin](const RunSeen& seen) { ended(plugin, seen); }, isUrgent,
         [this, plugin] {
@@ -209,8 +260,8 @@ class Scan {
       result.judgement = judgement;
       result.seen = seen;
     }
-    const bool isStopped = seen.limitHit == LimitHit::kInterrupted;
-    if (plugin->runsDone < options.repeat && !isStopped) {
+    plugin->isStopped = seen.limitHit == LimitHit::kInterrupted;
+    if (plugin->runsDone < options.repeat && !plugin->isStopped) {
       startRepetition(plugin, true);
       return;
     }
@@ -218,7 +269,7 @@ class Scan {
     const bool isDescribable =
         isShell || (options.describes && result.judgement.verdict != Verdict::kNotLoadable &&
                     result.judgement.verdict != Verdict::kRefused);
-    if (isDescribable && !isStopped) {
+    if (isDescribable && !plugin->isStopped) {
       describe(plugin, isShell);
     } else {
       deliver(plugin);
@@ -239,7 +290,7 @@ class Scan {
     job.isWorker = false;
     job.arguments = {plugin->result.run.bundle};
     if (plugin->result.run.child) job.arguments.push_back(std::to_string(*plugin->result.run.child));
-    engineInUse->add(
+    engine->add(
         std::move(job),
         [this, plugin, isShell](const RunSeen& seen) {
           std::string object;
@@ -250,14 +301,15 @@ class Scan {
               seen.end.kind == End::Kind::kExited && (seen.end.status == 0 || seen.end.status == 1);
           const nlohmann::json description = nlohmann::json::parse(isOver ? object : "", nullptr, false);
           if (description.is_object() && options.describes) plugin->result.description = object;
-          const bool isStopped = seen.limitHit == LimitHit::kInterrupted;
-          if (isShell && !isStopped) addChildren(plugin->result, description);
+          plugin->isStopped = seen.limitHit == LimitHit::kInterrupted;
+          if (isShell && !plugin->isStopped) addChildren(*plugin, description);
           deliver(plugin);
         },
         true);
   }
 
-  void addChildren(PluginResult& shell, const nlohmann::json& description) {
+  void addChildren(UnderWay& plugin, const nlohmann::json& description) {
+    PluginResult& shell = plugin.result;
     std::vector<Child> children;
     const nlohmann::json listed =
         description.is_object() ? description.value("children", nlohmann::json()) : nullptr;
@@ -270,6 +322,7 @@ class Scan {
         children.push_back(
             {id.get<std::int32_t>(), name.is_string() ? name.get<std::string>() : std::string()});
       }
+      plugin.children = children;
     } else {
       shell.judgement.contradictions.emplace_back(
           "it passed as a shell, but could not be described: its children were not run");
@@ -278,8 +331,7 @@ class Scan {
     RunList list = runsOfChildren(shell.run, children, skipped);
     total += list.runs.size() + list.notRun.size();
     for (const NotRun& one : list.notRun) endWithoutRun(one);
-    // Each goes before all that are queued, so the last comes first.
-    for (auto one = list.runs.rbegin(); one != list.runs.rend(); ++one) start(*one, true);
+    take(remembering.recall(list.runs, skipped), true);
   }
 
   void endWithoutRun(const NotRun& one) {
@@ -295,10 +347,13 @@ class Scan {
   void deliver(const Plugin& plugin) {
     const Plugin delivered = plugin;
     underWay.erase(std::remove(underWay.begin(), underWay.end(), delivered), underWay.end());
-    deliver(delivered->result);
+    const auto& seen = delivered->result.seen;
+    timeLeft.ended(delivered->earlierSeconds, seen ? seen->wallSeconds * delivered->runsDone : 0);
+    deliver(delivered->result, delivered.get());
   }
 
-  void deliver(PluginResult& result) {
+  /// `plugin`: of a run of this scan, which is remembered.
+  void deliver(PluginResult& result, const UnderWay* plugin = nullptr) {
     const bool isGood = rowOf(result.judgement.verdict).isGood;
     const bool isFlaky = result.repetitions && result.repetitions->isFlaky();
     result.isWanted = isGood && !isFlaky;
@@ -315,20 +370,19 @@ class Scan {
     ++done;
     ++counts[rowOf(result.judgement.verdict).word];
     if (!result.isWanted) ++unwanted;
-    json.write(eventLine(result));
+    if (plugin != nullptr || result.isRemembered) remembering.compareWithLast(result);
+    if (plugin != nullptr && !plugin->isStopped) remembering.save(result, plugin->children);
+    if (json.isOpen()) json.write(eventLine(result));
     terminal.ended(result);
     // With nobody left to read what comes out, there is nothing to run for.
     const bool isJsonLost = options.jsonFile.empty() || !json.problem().empty();
-    if (output.hasFailed && isJsonLost && engineInUse != nullptr) engineInUse->stop();
+    if (output.hasFailed && isJsonLost && engine) engine->stop();
   }
 
   void showProgress() {
-    const double elapsed = secondsSince1970() - startedAt;
-    const double left =
-        done > 0 ? elapsed / static_cast<double>(done) * static_cast<double>(total - done) : 0;
     std::vector<std::string> names;
     for (const Plugin& plugin : underWay) names.push_back(nameOf(plugin->result.run, false));
-    terminal.progress(done, total, left, names);
+    terminal.progress(done, total, timeLeft.seconds(options.engine.jobs), names);
   }
 
   int finish(bool isWhole) {
@@ -344,6 +398,7 @@ class Scan {
                    : unwanted > 0 || !isComplete ? kScanNotAsWanted
                                                  : kScanAsWanted;
     if (isListIncomplete && ended.status == kScanAsWanted) ended.status = kScanNotAsWanted;
+    remembering.end(ended);
     terminal.ended(ended);
     if (output.hasFailed) {
       complain("the report could not be written: " + output.reason);
@@ -379,8 +434,10 @@ class Scan {
   PluginList expected;
   std::vector<std::string> notes;
   std::map<std::string, std::vector<std::string>> otherNames;
-  RunEngine* engineInUse = nullptr;
-  std::vector<Plugin> underWay;  ///< Started and not yet delivered.
+  Remembering remembering;
+  TimeLeft timeLeft;
+  std::unique_ptr<RunEngine> engine;  ///< Made when something has to be run.
+  std::vector<Plugin> underWay;       ///< Started and not yet delivered.
   std::set<unsigned> rowsMet;
   std::map<std::string, std::size_t> counts;
   std::size_t total = 0;
@@ -393,7 +450,8 @@ class Scan {
 }  // namespace
 
 int scan(const ScanOptions& options) {
-  std::signal(SIGPIPE, SIG_IGN);  // A reader that has gone is a write that fails.
+  std::signal(SIGPIPE, SIG_IGN);  // A reader that has gone is a write that fails,
+  std::signal(SIGXFSZ, SIG_IGN);  // and so is a file that has become too large.
   try {
     return Scan(options).run();
   } catch (const BrokenList& error) {

@@ -22,8 +22,9 @@ constexpr const char* kDescribe = "vsttorture-describe";
 
 constexpr int kPatienceInMilliseconds = 5000;
 
-/// The first line that a program prints with --version; empty where it cannot be run or prints none in time.
-std::string versionOf(const std::string& program) {
+}  // namespace
+
+std::string askVersion(const std::string& program) {
   int output[2];
   if (pipe2(output, O_CLOEXEC) != 0) return {};
   system::ProcessStart start;
@@ -52,8 +53,6 @@ std::string versionOf(const std::string& program) {
   return said.substr(0, said.find('\n'));
 }
 
-}  // namespace
-
 std::string ownProcessor() {
   const std::optional<Target> self = targetOfProgram("/proc/self/exe");
   return self ? self->processor : std::string();
@@ -76,7 +75,8 @@ std::vector<std::string> workerFolders(const std::vector<std::string>& folders) 
   return all;
 }
 
-WorkersByProcessor findWorkers(const std::vector<std::string>& folders, std::vector<std::string>& notes) {
+WorkersByProcessor findWorkers(const std::vector<std::string>& folders, std::vector<std::string>& notes,
+                               const std::function<std::string(const std::string& program)>& versionOf) {
   WorkersByProcessor workers;
   for (const std::string& folder : workerFolders(folders)) {
     const std::string program = folder + "/" + kWorker;

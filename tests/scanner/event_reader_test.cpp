@@ -203,7 +203,7 @@ TEST(ReadEvent, EveryLineOfRealScansIsWrittenAgainToTheByte) {
       {{"--expect", "/dev/null", "--step-limit", "0.5", samplePlugin("faulty")}, hang},
   };
   for (ProgramCall call : calls) {
-    call.arguments.insert(call.arguments.begin(), {"--json", "-", "--sandbox", "off"});
+    call.arguments.insert(call.arguments.begin(), {"--json", "-", "--sandbox", "off", "--cache", "off"});
     const std::vector<std::string> all = lines(runProgram(SCAN, call).standardOutput);
     EXPECT_GE(all.size(), 4U);
     for (const std::string& line : all) expectReadBack(line + "\n");

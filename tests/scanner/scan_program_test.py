@@ -30,6 +30,7 @@ ROOT = pathlib.Path(__file__).resolve().parent.parent.parent
 SCHEMAS = ROOT / "docs/schema"
 SCAN = PLUGINS = None  # From the command line.
 EFFECT = "well_behaved_effect.so"
+PLAIN = ["--cache", "off", "--sandbox", "off"]
 SET_SAMPLE_RATE = "dispatch:10"
 
 
@@ -44,10 +45,13 @@ class ScanTest(unittest.TestCase):
         return {"HOME": str(self.folder / "home"), "PATH": "/usr/bin:/bin", "LC_ALL": "C",
                 "TMPDIR": str(self.folder), **more}
 
-    def scan(self, *arguments, environment=None, sandbox="off", **more):
-        """One scan: its status, standard output and standard error."""
+    def scan(self, *arguments, environment=None, sandbox="off", cache="off", **more):
+        """One scan: its status, standard output and standard error. Nothing is remembered unless `cache` names a
+        file, or is None for the default one, which is in a home of the test's own."""
         if sandbox:
             arguments = ["--sandbox", sandbox, *arguments]
+        if cache:
+            arguments = ["--cache", cache, *arguments]
         more.setdefault("stdout", subprocess.PIPE)
         more.setdefault("cwd", self.folder)
         return subprocess.run([SCAN, *map(str, arguments)], env=self.environment(**(environment or {})),
@@ -305,7 +309,7 @@ class Outputs(ScanTest):
     def test_a_disk_that_becomes_full_ends_the_results_at_a_whole_line(self):
         results = self.folder / "results"
         shell = 'trap "" XFSZ; ulimit -f 16; exec "$@"'
-        subprocess.run(["bash", "-c", shell, "bash", SCAN, "--sandbox", "off", "--json", results, PLUGINS],
+        subprocess.run(["bash", "-c", shell, "bash", SCAN, *PLAIN, "--json", results, PLUGINS],
                        env=self.environment(), capture_output=True, timeout=60, check=False)
         lines = results.read_text().split("\n")
         self.assertEqual(lines.pop(), "")
@@ -321,7 +325,7 @@ class Outputs(ScanTest):
 
     def test_a_closed_standard_output(self):
         results = self.folder / "results"
-        command = [SCAN, "--sandbox", "off", "--json", results, PLUGINS / EFFECT]
+        command = [SCAN, *PLAIN, "--json", results, PLUGINS / EFFECT]
         result = subprocess.run(["sh", "-c", '"$@" >&-', "sh", *command], env=self.environment(), text=True,
                                 stderr=subprocess.PIPE, timeout=60, check=False)
         self.assertEqual(result.returncode, 3)
@@ -348,7 +352,7 @@ class Outputs(ScanTest):
         """What a scan writes to a terminal, and how many seconds it takes."""
         ours, terminal = pty.openpty()
         started = time.monotonic()
-        process = subprocess.Popen([SCAN, "--sandbox", "off", *map(str, arguments)], stdin=subprocess.DEVNULL,
+        process = subprocess.Popen([SCAN, *PLAIN, *map(str, arguments)], stdin=subprocess.DEVNULL,
                                    stdout=terminal, stderr=terminal,
                                    env=self.environment(**{"TERM": "xterm", **environment}))
         os.close(terminal)
@@ -387,7 +391,7 @@ class Interruption(ScanTest):
     def interrupted(self, *arguments, after, **environment):
         """Sends SIGINT when the events tell that `after` is true of them. Returns status, events, report, seconds."""
         results = self.folder / "results"
-        process = subprocess.Popen([SCAN, "--sandbox", "off", "--json", results, *map(str, arguments)],
+        process = subprocess.Popen([SCAN, *PLAIN, "--json", results, *map(str, arguments)],
                                    env=self.environment(**environment), stdin=subprocess.DEVNULL,
                                    stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
         deadline = time.monotonic() + 60

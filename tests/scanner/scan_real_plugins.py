@@ -56,8 +56,8 @@ def unpacked_files(root, package):
 
 def scan(program, arguments, environment):
     """The status of a scan, and its plugin_ended events. Its report goes to standard error."""
-    result = subprocess.run([program, "--no-progress", "--json", "-", *map(str, arguments)], stdin=subprocess.DEVNULL,
-                            stdout=subprocess.PIPE, env=environment, check=False)
+    result = subprocess.run([program, "--cache=off", "--no-progress", "--json", "-", *map(str, arguments)],
+                            stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, env=environment, check=False)
     events = [json.loads(line) for line in result.stdout.decode().splitlines()]
     return result.returncode, [event for event in events if event["event"] == "plugin_ended"]
 

@@ -126,8 +126,8 @@ def main():
         with open(world / "errors", "wb") as errors:
             scan = subprocess.Popen(
                 [os.path.abspath(arguments.scan), "-j", str(arguments.jobs), "--no-progress", "--quiet",
-                 f"--sandbox={arguments.sandbox}", "--step-limit", str(STEP_LIMIT_IN_SECONDS), "--json", str(events),
-                 str(world / "plugins")],
+                 "--cache=off", f"--sandbox={arguments.sandbox}", "--step-limit", str(STEP_LIMIT_IN_SECONDS),
+                 "--json", str(events), str(world / "plugins")],
                 env=dict(os.environ, TMPDIR=str(world / "tmp")), stdin=subprocess.DEVNULL,
                 stdout=subprocess.DEVNULL, stderr=errors)
             while scan.poll() is None:

@@ -185,8 +185,8 @@ def prepare(rows, plugins, folder):
 
 def scan(arguments, folder, options):
     """The results of a folder by the path of the plug-in, and what was wrong with the scan itself."""
-    command = [arguments.scan, "-j", str(arguments.jobs), "--quiet", "--no-progress", "--json", os.path.join(folder, "events"),
-               *options, os.path.join(folder, "plugins")]
+    command = [arguments.scan, "-j", str(arguments.jobs), "--cache=off", "--quiet", "--no-progress",
+               "--json", os.path.join(folder, "events"), *options, os.path.join(folder, "plugins")]
     environment = {name: value for name, value in os.environ.items() if not name.startswith("FAULT_")}
     ended = subprocess.run(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
                            stderr=subprocess.STDOUT, check=False)
