@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: MIT
 // vsttorture-scan: tortures many plug-ins, and says which of them fail, where and why.
+#include <cstring>
 #include <optional>
 
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "scanner/scan/history_command.h"
 #include "scanner/scan/options.h"
 #include "scanner/scan/scan.h"
 
@@ -23,6 +25,7 @@ void occupyStandardDescriptors() {
 
 int main(int argc, char** argv) {
   occupyStandardDescriptors();
+  if (argc > 1 && std::strcmp(argv[1], "history") == 0) return scanner::historyCommand(argc, argv);
   int status = scanner::kScanAsWanted;
   const std::optional<scanner::ScanOptions> options = scanner::readOptions(argc, argv, status);
   return options ? scanner::scan(*options) : status;

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/scan/remembering.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
+#include <tuple>
 
 #include <fmt/format.h>
 #include <sys/stat.h>
@@ -98,6 +100,10 @@ Circumstances Remembering::circumstancesOf(const Run& run) {
 Remembering::Recollection Remembering::recall(const std::vector<Run>& runs, const PluginList& skipped) {
   Recollection recollection;
   for (const Run& run : runs) recall(run, skipped, recollection);
+  // In the order in which they were found, rather than in that of their durations.
+  std::stable_sort(recollection.known.begin(), recollection.known.end(), [](const Known& a, const Known& b) {
+    return std::tie(a.run.bundle, a.run.target.processor) < std::tie(b.run.bundle, b.run.target.processor);
+  });
   return recollection;
 }
 
@@ -139,20 +145,22 @@ std::optional<PluginResult> Remembering::resultOf(const Known& known) {
 
 void Remembering::compareWithLast(PluginResult& result) {
   if (result.isRemembered) {
+    ++remembered;
     const PluginResult itself = result;
     result.comparison = compare(result, &itself, true);
-    return;
+  } else if (store && hasEarlierResults) {
+    const std::vector<Remembered> earlier =
+        store->resultsOf(result.run.bundle, result.run.target.processor, result.run.child);
+    if (earlier.empty()) {
+      result.comparison = compare(result, nullptr, false);
+    } else {
+      const PluginResult last = resultInShort(earlier.front());
+      const bool isUnchanged = whyVoid(earlier.front(), circumstancesOf(result.run)) == Void::kNot;
+      result.comparison = compare(result, &last, isUnchanged);
+    }
   }
-  if (!store || !hasEarlierResults) return;
-  const std::vector<Remembered> earlier =
-      store->resultsOf(result.run.bundle, result.run.target.processor, result.run.child);
-  if (earlier.empty()) {
-    result.comparison = compare(result, nullptr, false);
-    return;
-  }
-  const PluginResult last = resultInShort(earlier.front());
-  const bool isUnchanged = whyVoid(earlier.front(), circumstancesOf(result.run)) == Void::kNot;
-  result.comparison = compare(result, &last, isUnchanged);
+  if (result.comparison && result.comparison->change != Comparison::Change::kNone)
+    ++changes[nameOfChange(result.comparison->change)];
 }
 
 void Remembering::begin(const ScanStarted& scan) {
@@ -165,7 +173,7 @@ void Remembering::save(const PluginResult& result, const std::optional<std::vect
 }
 
 void Remembering::end(const ScanEnded& scan) {
-  if (store) store->endScan(scan);
+  if (store) store->endScan(scan, changes, remembered);
 }
 
 double Remembering::secondsOf(const Module& module) {

@@ -67,6 +67,8 @@ class Remembering {
   Circumstances common;                           ///< But for the file and the worker.
   std::map<std::string, std::string> identities;  ///< Of programs, by path.
   bool hasEarlierResults = false;
+  std::map<std::string, std::size_t> changes;  ///< How often each was seen, by its word.
+  std::size_t remembered = 0;
 };
 
 }  // namespace scanner

@@ -57,6 +57,17 @@ CREATE VIEW latest AS
          wallSeconds, toolVersion, event
   FROM results WHERE id IN (SELECT max(id) FROM results GROUP BY bundle, processor, child);
 )",
+    // How a scan ended, and what was new in it.
+    R"(
+ALTER TABLE scans ADD COLUMN endedAt REAL;
+ALTER TABLE scans ADD COLUMN status INTEGER;
+ALTER TABLE scans ADD COLUMN isInterrupted INTEGER;
+ALTER TABLE scans ADD COLUMN counts TEXT;
+ALTER TABLE scans ADD COLUMN changes TEXT;
+ALTER TABLE scans ADD COLUMN remembered INTEGER;
+ALTER TABLE results ADD COLUMN change TEXT;
+CREATE INDEX resultsByScan ON results (scan);
+)",
 };
 
 std::int64_t versionOf(Database& database) { return database.number("PRAGMA user_version"); }

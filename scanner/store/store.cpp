@@ -15,6 +15,7 @@
 
 #include "scanner/events/event_json.h"
 #include "scanner/store/database.h"
+#include "scanner/store/open_database.h"
 #include "scanner/store/schema.h"
 
 namespace scanner {
@@ -47,14 +48,19 @@ constexpr const char* kVersionOf = "SELECT says FROM programs WHERE path = ?1 AN
 constexpr const char* kSaveVersion =
     "INSERT OR REPLACE INTO programs (path, identity, says) VALUES (?1, ?2, ?3)";
 constexpr const char* kBeginScan = "INSERT INTO scans (time, machine, toolVersion) VALUES (?1, ?2, ?3)";
+constexpr const char* kEndScan =
+    "UPDATE scans SET endedAt = ?2, status = ?3, isInterrupted = ?4, counts = ?5, changes = ?6, remembered = "
+    "?7"
+    " WHERE id = ?1";
 constexpr const char* kSave =
     "INSERT INTO results (scan, bundle, processor, child, childName, device, inode, size, changedAt, worker, "
     "options,"
     " sandboxWanted, isSandboxed, libraries, format, toolVersion, verdict, step, cause, isFlaky, time, "
     "wallSeconds,"
-    " children, event) VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11, ?12, ?13, ?14, ?15, ?16, ?17, "
+    " children, event, change) VALUES (?1, ?2, ?3, ?4, ?5, ?6, ?7, ?8, ?9, ?10, ?11, ?12, ?13, ?14, ?15, "
+    "?16, ?17, "
     "?18, ?19,"
-    " ?20, ?21, ?22, ?23, ?24)";
+    " ?20, ?21, ?22, ?23, ?24, ?25)";
 constexpr const char* kForgetEvents =
     "UPDATE results SET event = NULL WHERE event IS NOT NULL AND id IN (SELECT id FROM results WHERE bundle "
     "= ?1 AND"
@@ -94,11 +100,6 @@ std::optional<std::vector<Child>> childrenOf(const std::string& text) {
   return children;
 }
 
-bool isThere(const std::string& path, bool mustHoldBytes) {
-  struct stat status = {};
-  return stat(path.c_str(), &status) == 0 && (!mustHoldBytes || status.st_size > 0);
-}
-
 /// The folders that `file` stands in. Empty, or why there are none.
 std::string makeFolders(const std::string& file) {
   for (std::size_t slash = file.find('/', 1); slash != std::string::npos; slash = file.find('/', slash + 1)) {
@@ -107,21 +108,6 @@ std::string makeFolders(const std::string& file) {
       return folder + ": " + std::strerror(errno);
   }
   return {};
-}
-
-std::string reasonInWords(const DatabaseError& error) {
-  switch (error.kind) {
-    case Kind::kLocked:
-      return "another program has locked it";
-    case Kind::kReadOnly:
-      return "it cannot be written to";
-    case Kind::kFull:
-      return "the disk is full";
-    case Kind::kDamaged:
-    case Kind::kOther:
-      break;
-  }
-  return error.what();
 }
 
 /// A row to write, which outlives the result it was made of.
@@ -140,6 +126,7 @@ struct Row {
   double wallSeconds = 0;
   std::optional<std::string> children;
   std::string event;
+  std::optional<std::string> change;
 };
 
 }  // namespace
@@ -150,7 +137,8 @@ struct Store::Implementation {
 
   /// An open database with its statements.
   struct Connection {
-    Connection(const std::string& file, Database::Access access) : database(file, access) {}
+    explicit Connection(std::unique_ptr<Database> database_)
+        : owner(std::move(database_)), database(*owner) {}
 
     Statement& prepared(const char* sql) {
       std::unique_ptr<Statement>& statement = statements[sql];
@@ -159,13 +147,13 @@ struct Store::Implementation {
       return *statement;
     }
 
-    Database database;
+    std::unique_ptr<Database> owner;
+    Database& database;
     std::map<const char*, std::unique_ptr<Statement>> statements;
   };
 
   void open();
   void connect();
-  std::unique_ptr<Connection> connectReadOnly();
   bool setAside(const std::string& reason);
   void handle(const DatabaseError& error, bool isWriting);
   void giveUpWriting(const std::string& reason);
@@ -227,7 +215,7 @@ void Store::Implementation::open() {
 void Store::Implementation::connect() {
   canWrite = false;
   try {
-    connection = std::make_unique<Connection>(file, Database::Access::kWrite);
+    connection = std::make_unique<Connection>(std::make_unique<Database>(file, Database::Access::kWrite));
     Database& database = connection->database;
     database.waitForLocks(kWaitAtTheBeginningInMilliseconds);
     if (database.isReadOnly()) throw DatabaseError(Kind::kReadOnly, "");
@@ -250,22 +238,13 @@ void Store::Implementation::connect() {
   } catch (const DatabaseError& error) {
     const bool isMaybeReadOnly = error.kind == Kind::kReadOnly || error.kind == Kind::kOther;
     if (!isMaybeReadOnly || !isThere(file, true)) throw;
-    connection = connectReadOnly();
+    connection.reset();
+    connection = std::make_unique<Connection>(openForReading(file));
+    connection->database.waitForLocks(kWaitMeanwhileInMilliseconds);
     say("the results of this scan are not remembered: " + file + " cannot be written to");
   }
   struct stat status = {};
   inode = stat(file.c_str(), &status) == 0 ? status.st_ino : 0;
-}
-
-/// Without a file beside it that has to be read as well, the database is read as it is: where nothing can be
-/// written, SQLite's other way of reading does not work.
-std::unique_ptr<Store::Implementation::Connection> Store::Implementation::connectReadOnly() {
-  connection.reset();
-  const auto access = isThere(file + "-wal", true) ? Database::Access::kRead : Database::Access::kImmutable;
-  auto opened = std::make_unique<Connection>(file, access);
-  opened->database.waitForLocks(kWaitMeanwhileInMilliseconds);
-  if (!hasCurrentSchema(opened->database)) throw DatabaseError(Kind::kReadOnly, "");
-  return opened;
 }
 
 /// Renames the database, with the files that belong to it, and opens a new one. Once a scan: something that
@@ -364,6 +343,7 @@ void Store::Implementation::write(const Row& row) {
       .bind(22, row.wallSeconds)
       .bind(23, row.children)
       .bind(24, row.event)
+      .bind(25, row.change)
       .finish();
   const auto forget = [&](const char* sql, std::int64_t kept) {
     connection->prepared(sql)
@@ -528,6 +508,7 @@ void Store::save(const PluginResult& result, const Circumstances& circumstances,
   row.time = result.seen ? result.seen->startedAt : 0;
   row.wallSeconds = result.seen ? result.seen->wallSeconds : 0;
   if (children) row.children = childrenText(*children);
+  if (result.comparison) row.change = nameOfChange(result.comparison->change);
   row.event = eventLine(result);
   row.event.pop_back();  // The newline.
   if (self.bytesWaiting + row.event.size() > kMostBytesWaiting) {
@@ -539,14 +520,24 @@ void Store::save(const PluginResult& result, const Circumstances& circumstances,
   if (Clock::now() >= self.nextAttempt) self.flush();
 }
 
-void Store::endScan(const ScanEnded& /*scan*/) {
+void Store::endScan(const ScanEnded& scan, const std::map<std::string, std::size_t>& changes,
+                    std::size_t remembered) {
   Implementation& self = *implementation;
   if (!self.connection || !self.canWrite) return;
-  if (!self.waiting.empty()) {
-    self.attempt(true,
-                 [](auto& connection) { connection.database.waitForLocks(kWaitAtTheEndInMilliseconds); });
-    self.flush();
-  }
+  self.attempt(true, [](auto& connection) { connection.database.waitForLocks(kWaitAtTheEndInMilliseconds); });
+  self.flush();
+  self.attempt(true, [&](auto& connection) {
+    if (self.scanRow == 0) self.writeScan();
+    connection.prepared(kEndScan)
+        .bind(1, self.scanRow)
+        .bind(2, scan.time)
+        .bind(3, std::int64_t{scan.status})
+        .bind(4, std::int64_t{scan.isInterrupted})
+        .bind(5, nlohmann::json(scan.counts).dump())
+        .bind(6, nlohmann::json(changes).dump())
+        .bind(7, static_cast<std::int64_t>(remembered))
+        .finish();
+  });
   // Closing writes to the database file and waits for the disk, which takes longer than a scan of plug-ins that are
   // all remembered. Of such a scan there is nothing to lose but its own row.
   if (!self.hasSaved)

@@ -11,6 +11,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
@@ -61,8 +62,10 @@ class Store {
   void save(const PluginResult& result, const Circumstances& circumstances,
             const std::optional<std::vector<Child>>& children);
   void saveVersion(const std::string& path, const std::string& identity, const std::string& version);
-  /// Also writes what could not be written before, because another program had locked the database.
-  void endScan(const ScanEnded& scan);
+  /// Also writes what could not be written before, because another program had locked the database. `changes` is
+  /// how often each change was seen, by its word; `remembered` how many results were taken from earlier scans.
+  void endScan(const ScanEnded& scan, const std::map<std::string, std::size_t>& changes,
+               std::size_t remembered);
 
  private:
   struct Implementation;

@@ -1,0 +1,149 @@
+// SPDX-License-Identifier: MIT
+#include "scanner/scan/history_command.h"
+
+#include <cstdio>
+#include <ctime>
+#include <filesystem>
+
+#include <CLI/CLI.hpp>
+#include <fmt/format.h>
+
+#include "scanner/judge/verdict.h"
+#include "scanner/report/terminal.h"
+#include "scanner/scan/options.h"
+#include "scanner/scan/remembering.h"
+#include "scanner/store/history.h"
+#include "scanner/store/open_database.h"
+#include "scanner/store/schema.h"
+
+namespace scanner {
+namespace {
+
+constexpr std::size_t kScansShown = 20;
+
+int complain(const std::string& sentence, ScanStatus status) {
+  std::fprintf(stderr, "vsttorture-scan: %s\n", printable(sentence).c_str());
+  return status;
+}
+
+/// The local time, to the minute.
+std::string timeInWords(double seconds) {
+  const auto time = static_cast<std::time_t>(seconds);
+  std::tm parts = {};
+  char text[32] = "";
+  if (localtime_r(&time, &parts) != nullptr) std::strftime(text, sizeof text, "%Y-%m-%d %H:%M", &parts);
+  return text;
+}
+
+/// "197 passed, 3 crashed", in the order of the verdicts.
+std::string countsInWords(const std::map<std::string, std::size_t>& counts) {
+  std::string text;
+  for (const std::string& word : verdictWords()) {
+    const auto found = counts.find(word);
+    if (found != counts.end()) text += fmt::format("{}{} {}", text.empty() ? "" : ", ", found->second, word);
+  }
+  return text.empty() ? "no results" : text;
+}
+
+/// "; 1 new, 2 mended", or nothing.
+std::string changesInWords(const std::map<std::string, std::size_t>& changes) {
+  std::string text;
+  for (const auto& [word, name] :
+       {std::pair("new", "new"), std::pair("mended", "mended"), std::pair("still_failing", "still failing"),
+        std::pair("flaky", "flaky")}) {
+    const auto found = changes.find(word);
+    if (found != changes.end())
+      text += fmt::format("{}{} {}", text.empty() ? "; " : ", ", found->second, name);
+  }
+  return text;
+}
+
+void print(const std::string& line) { std::printf("%s\n", printable(line).c_str()); }
+
+void printScans(const std::vector<EarlierScan>& scans) {
+  for (const EarlierScan& scan : scans) {
+    const char* end = !scan.hasEnded ? "; did not end" : scan.isInterrupted ? "; interrupted" : "";
+    print(fmt::format("{}  {}  {}  {}{}{}", timeInWords(scan.time), scan.machine, scan.toolVersion,
+                      countsInWords(scan.counts), changesInWords(scan.changes), end));
+  }
+}
+
+void printResults(const std::vector<EarlierResult>& results) {
+  std::string last;
+  for (const EarlierResult& result : results) {
+    std::string name = nameOf({result.bundle, result.child, result.childName}, true);
+    // The processor tells the modules of one bundle apart.
+    if (!result.processor.empty()) name += " (" + result.processor + ")";
+    const std::string key = fmt::format("{}\n{}\n{}", result.bundle, result.processor,
+                                        result.child ? std::to_string(*result.child) : "");
+    if (key != last) print(name);
+    last = key;
+    print(fmt::format("  {}  {:<12} {:>8.1f} s  {}{}{}", timeInWords(result.time), result.verdict,
+                      result.wallSeconds, result.toolVersion, result.isFlaky ? "  flaky" : "",
+                      result.cause.empty() ? "" : "  " + result.cause));
+  }
+}
+
+/// A path that is there is looked for from the root, any other text as it is.
+std::string nameToLookFor(const std::string& given) {
+  std::error_code error;
+  if (!std::filesystem::exists(given, error)) return given;
+  std::string path = std::filesystem::absolute(given, error).lexically_normal().string();
+  while (path.size() > 1 && path.back() == '/') path.pop_back();
+  return path;
+}
+
+int show(const std::string& file, const std::string& plugin) {
+  History history(file);
+  if (plugin.empty()) {
+    const std::vector<EarlierScan> scans = history.lastScans(kScansShown);
+    if (scans.empty()) return complain(file + " holds no scan yet", kScanWrongUse);
+    printScans(scans);
+    return kScanAsWanted;
+  }
+  const std::vector<EarlierResult> results = history.resultsOf(nameToLookFor(plugin));
+  if (results.empty())
+    return complain(fmt::format("no result of a plug-in called \"{}\" is remembered in {}", plugin, file),
+                    kScanWrongUse);
+  printResults(results);
+  return kScanAsWanted;
+}
+
+}  // namespace
+
+int historyCommand(int argc, const char* const* argv) {
+  std::string cache;
+  std::string plugin;
+  CLI::App app("Shows the last scans, or the results of one plug-in over time.", "vsttorture-scan history");
+  app.footer(
+      "Status: 0 something was shown, 2 wrong use or nothing to show, 3 the database cannot be read.\n"
+      "A plug-in named \"history\" is scanned as ./history.");
+  app.add_option("PLUG-IN", plugin, "A path, or a part of one");
+  app.add_option("--cache", cache, "The database, instead of the one in the user's cache folder")
+      ->type_name("FILE");
+  try {
+    app.parse(argc - 1, argv + 1);
+  } catch (const CLI::ParseError& error) {
+    if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
+      app.exit(error);
+      return kScanAsWanted;
+    }
+    complain(error.what(), kScanWrongUse);
+    std::fprintf(stderr, "vsttorture-scan history --help says what there is.\n");
+    return kScanWrongUse;
+  }
+  const std::string file = databaseFile(cache);
+  if (file.empty())
+    return complain("there is no database: neither XDG_CACHE_HOME nor HOME is set, or it is off",
+                    kScanWrongUse);
+  if (!isThere(file, false)) return complain("nothing is remembered yet: there is no " + file, kScanWrongUse);
+  try {
+    return show(file, plugin);
+  } catch (const NotOurDatabase& error) {
+    return complain(file + " " + error.what(), kScanCannotGoOn);
+  } catch (const DatabaseError& error) {
+    return complain(file + " cannot be read: " + reasonInWords(error), kScanCannotGoOn);
+  }
+}
+
+}  // namespace scanner
