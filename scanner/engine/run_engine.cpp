@@ -38,7 +38,6 @@ constexpr double kSampleAtShareOfAge = 0.1;
 constexpr double kMeasureFilesEverySeconds = 0.25;
 constexpr double kMeasureFilesAtTimesItsCost = 10;
 constexpr double kLongestWindowInSeconds = 2;
-constexpr double kPatienceAfterTermInSeconds = 2;
 constexpr double kPatienceAfterInterruptInSeconds = 0.5;
 /// How long a process may take to end when it has been killed.
 constexpr double kPatienceAfterKillInSeconds = 5;
@@ -49,6 +48,7 @@ constexpr double kPatienceWithPipesInSeconds = 0.5;
 constexpr double kNearlyAllMemory = 0.875;
 constexpr int kSandboxSignalStatus = 128;
 constexpr std::size_t kReadBlock = 64 * 1024;
+constexpr std::size_t kMostBytesOfAToolFile = std::size_t{32} << 20;
 
 // Not passed on: each run has its own, or shall have none.
 constexpr const char* kOwnVariables[] = {
@@ -171,6 +171,7 @@ struct RunEngine::Implementation::ActiveRun {
   ActiveRun& operator=(const ActiveRun&) = delete;
   ~ActiveRun() {
     if (recordFile >= 0) close(recordFile);
+    for (const int file : toolFiles) close(file);
   }
 
   /// One of the two outputs.
@@ -183,7 +184,10 @@ struct RunEngine::Implementation::ActiveRun {
   };
 
   int openOutput(Output& output, bool isStandardError);
+  int makeFile(const std::string& path) const;
   void makeRecord();
+  void makeToolFiles();
+  void readToolFiles();
   void received(const Output& output, std::string_view bytes);
   void outputEnded(Output& output);
   void readRest(Output& output);
@@ -196,12 +200,15 @@ struct RunEngine::Implementation::ActiveRun {
   void noteActivity(double now);
   void noteLimitsOfTheSystem();
   std::string readRecord() const;
+  [[nodiscard]] const Limits& limits() const;
+  [[nodiscard]] std::string toolFile(const std::string& name) const { return scratch->path() + "/" + name; }
 
   Implementation& owner;
   Queued queued;
   std::unique_ptr<ScratchFolder> scratch;
   system::Mark mark;
   int recordFile = -1;
+  std::vector<int> toolFiles;
   int process = -1;
   bool isRunning = false;
   bool isPutOff = false;  ///< Could not be started now, and goes back to the queue.
@@ -255,7 +262,7 @@ int RunEngine::Implementation::ActiveRun::openOutput(Output& output, bool isStan
 
 void RunEngine::Implementation::ActiveRun::received(const Output& output, std::string_view bytes) {
   seen.outputBytes += bytes.size();
-  if (seen.outputBytes > owner.options.limits.outputInBytes) {
+  if (seen.outputBytes > limits().outputInBytes) {
     hit(LimitHit::kOutput);
     return;
   }
@@ -284,7 +291,7 @@ void RunEngine::Implementation::ActiveRun::readRest(Output& output) {
   if (!output.isOpen || output.endedAt > 0) return;
   if (uv_fileno(reinterpret_cast<uv_handle_t*>(&output.pipe), &descriptor) != 0) return;
   char block[kReadBlock];
-  while (seen.outputBytes <= owner.options.limits.outputInBytes) {
+  while (seen.outputBytes <= limits().outputInBytes) {
     const ssize_t count = read(descriptor, block, sizeof block);  // The pipe does not block.
     if (count < 0 && errno == EINTR) continue;
     if (count <= 0) return;
@@ -297,7 +304,9 @@ void RunEngine::Implementation::ActiveRun::hit(LimitHit limit) {
   seen.limitHit = limit;
   if (limit == LimitHit::kStep || limit == LimitHit::kRun || limit == LimitHit::kInterrupted) {
     terminatedAt = monotonicSeconds();
-    system::signalRun(process, owner.sandbox.has_value(), SIGTERM);
+    const bool isInterrupt = limit == LimitHit::kInterrupted;
+    const int signal = queued.job.tool && !isInterrupt ? queued.job.tool->endSignal : SIGTERM;
+    system::signalRun(process, owner.sandbox.has_value(), signal);
   } else {
     killNow();
   }
@@ -319,10 +328,40 @@ void RunEngine::Implementation::ActiveRun::giveUp() {
   seen.wallSeconds = endedAt - startedAt;
 }
 
+const Limits& RunEngine::Implementation::ActiveRun::limits() const {
+  return queued.job.limits ? *queued.job.limits : owner.options.limits;
+}
+
+int RunEngine::Implementation::ActiveRun::makeFile(const std::string& path) const {
+  const int file = open(path.c_str(), O_CREAT | O_EXCL | O_RDWR | O_CLOEXEC, 0600);
+  if (file < 0) throw std::system_error(errno, std::generic_category(), path);
+  return file;
+}
+
 void RunEngine::Implementation::ActiveRun::makeRecord() {
-  recordFile = open(scratch->record().c_str(), O_CREAT | O_EXCL | O_RDWR | O_CLOEXEC, 0600);
-  if (recordFile < 0 || ftruncate(recordFile, sizeof(FlightRecord)) != 0)
+  recordFile = makeFile(scratch->record());
+  if (ftruncate(recordFile, sizeof(FlightRecord)) != 0)
     throw std::system_error(errno, std::generic_category(), scratch->record());
+}
+
+void RunEngine::Implementation::ActiveRun::makeToolFiles() {
+  if (!queued.job.tool) return;
+  for (const std::string& name : queued.job.tool->files) toolFiles.push_back(makeFile(toolFile(name)));
+}
+
+/// By the descriptors, as the record.
+void RunEngine::Implementation::ActiveRun::readToolFiles() {
+  for (std::size_t i = 0; i < toolFiles.size(); ++i) {
+    std::string bytes;
+    char block[kReadBlock];
+    while (bytes.size() < kMostBytesOfAToolFile) {
+      const ssize_t count = pread(toolFiles[i], block, sizeof block, static_cast<off_t>(bytes.size()));
+      if (count <= 0) break;
+      bytes.append(block, static_cast<std::size_t>(count));
+    }
+    seen.toolFiles.push_back(std::move(bytes));
+    unlink(toolFile(queued.job.tool->files[i]).c_str());
+  }
 }
 
 /// By the descriptor that it was made with: the plug-in may put another file in its place.
@@ -342,14 +381,15 @@ void RunEngine::Implementation::ActiveRun::watch(double now) {
   }
   if (terminatedAt > 0) {
     const bool isInterrupt = seen.limitHit == LimitHit::kInterrupted;
-    const double patience = isInterrupt ? kPatienceAfterInterruptInSeconds : kPatienceAfterTermInSeconds;
+    const double patienceAfterTerm = queued.job.tool.value_or(Tool{}).patienceInSeconds;
+    const double patience = isInterrupt ? kPatienceAfterInterruptInSeconds : patienceAfterTerm;
     if (now - terminatedAt > patience) killNow();
     return;
   }
   const double age = now - startedAt;
   const double pause = std::clamp(age * kSampleAtShareOfAge, kSampleEverySeconds, kSampleSeldomInSeconds);
   if (now - sampledAt > pause) sample(now);
-  const Limits& limits = owner.options.limits;
+  const Limits& limits = this->limits();
   const double filesPause =
       std::max(kMeasureFilesEverySeconds, kMeasureFilesAtTimesItsCost * filesMeasuringSeconds);
   if (limits.filesInBytes > 0 && now - filesMeasuredAt > filesPause) {
@@ -375,7 +415,7 @@ void RunEngine::Implementation::ActiveRun::watchStep(double now) {
       stepSince = now;
     }
   }
-  if (now - stepSince <= owner.options.limits.stepInSeconds) return;
+  if (now - stepSince <= limits().stepInSeconds) return;
   noteActivity(now);
   hit(LimitHit::kStep);
 }
@@ -384,11 +424,11 @@ void RunEngine::Implementation::ActiveRun::sample(double now) {
   sampledAt = now;
   const system::Sample current = system::sampleRun(process, seen.wasSandboxed, false);
   processorTimes.push_back({now, current.processorSeconds});
-  const double window = std::min(kLongestWindowInSeconds, owner.options.limits.stepInSeconds / 2);
+  const double window = std::min(kLongestWindowInSeconds, limits().stepInSeconds / 2);
   while (processorTimes.size() > 2 && now - processorTimes[1].at >= window) processorTimes.pop_front();
   seen.peakMemoryInBytes = std::max(seen.peakMemoryInBytes, current.residentBytes);
   peakAddressSpaceInBytes = std::max(peakAddressSpaceInBytes, current.addressSpaceBytes);
-  const std::uint64_t most = owner.options.limits.memoryInBytes;
+  const std::uint64_t most = limits().memoryInBytes;
   if (most > 0 && current.residentBytes > most) hit(LimitHit::kMemory);
 }
 
@@ -414,9 +454,11 @@ void RunEngine::Implementation::ActiveRun::noteLimitsOfTheSystem() {
       isSignalled ? end.signal == SIGXFSZ : seen.wasSandboxed && end.status == kSandboxSignalStatus + SIGXFSZ;
   if (isFileSize) seen.limitHit = LimitHit::kFiles;
   const auto nearlyAll =
-      static_cast<std::uint64_t>(static_cast<double>(owner.options.limits.memoryInBytes) * kNearlyAllMemory);
+      static_cast<std::uint64_t>(static_cast<double>(limits().memoryInBytes) * kNearlyAllMemory);
   const bool hasFailed = isSignalled || end.status > 1;
-  const bool isMemoryScarce = seen.peakMemoryInBytes > nearlyAll || peakAddressSpaceInBytes > nearlyAll;
+  const bool hasAddressSpaceLimit = !queued.job.tool || !queued.job.tool->needsAddressSpace;
+  const bool isMemoryScarce =
+      seen.peakMemoryInBytes > nearlyAll || (hasAddressSpaceLimit && peakAddressSpaceInBytes > nearlyAll);
   if (hasFailed && nearlyAll > 0 && isMemoryScarce) seen.limitHit = LimitHit::kMemory;
 }
 
@@ -540,6 +582,10 @@ std::vector<std::string> RunEngine::Implementation::commandFor(ActiveRun& run) c
   const Job& job = run.queued.job;
   std::vector<std::string> command;
   if (sandbox) command = system::sandboxCommand(*sandbox, run.scratch->path(), run.scratch->sharedMemory());
+  if (job.tool) {
+    const std::vector<std::string> tool = job.tool->command(run.scratch->path());
+    command.insert(command.end(), tool.begin(), tool.end());
+  }
   command.push_back(job.program);
   if (job.isWorker) command.insert(command.end(), {"--record", run.scratch->record()});
   command.insert(command.end(), job.arguments.begin(), job.arguments.end());
@@ -563,6 +609,7 @@ void RunEngine::Implementation::start(Queued queued) {
   try {
     run = std::make_unique<ActiveRun>(*this, std::move(queued), takeScratch(), mark);
     if (run->queued.job.isWorker) run->makeRecord();
+    run->makeToolFiles();
   } catch (const std::system_error& error) {
     failed.end.reason = std::string("no scratch folder: ") + error.what();
     report(onEnd, failed);
@@ -573,8 +620,9 @@ void RunEngine::Implementation::start(Queued queued) {
   process.command = commandFor(*run);
   process.environment = environmentFor(*run);
   process.workingDirectory = run->scratch->home();
-  process.addressSpaceInBytes = options.limits.memoryInBytes;
-  process.fileSizeInBytes = options.limits.filesInBytes;
+  const std::optional<Tool>& tool = run->queued.job.tool;
+  process.addressSpaceInBytes = tool && tool->needsAddressSpace ? 0 : run->limits().memoryInBytes;
+  process.fileSizeInBytes = run->limits().filesInBytes;
   process.mark = mark;
   process.standardOutput = run->openOutput(run->standardOutput, false);
   process.standardError = run->openOutput(run->standardError, true);
@@ -589,7 +637,7 @@ void RunEngine::Implementation::start(Queued queued) {
   run->seen.wasSandboxed = sandbox.has_value();
   run->startedAt = run->stepSince = run->sampledAt = run->filesMeasuredAt = now;
   run->isRunning = run->process > 0;
-  run->seen.process = std::max(run->process, 0);
+  run->seen.process = tool ? 0 : std::max(run->process, 0);  // Which one a tool starts is not known.
   if (!run->isRunning) {
     // What another run takes up is this one's again when that has ended.
     run->isPutOff = isShortage && !active.empty();
@@ -693,6 +741,7 @@ void RunEngine::Implementation::finish(ActiveRun& run) {
   if (!run.queued.job.isWorker) seen.texts.push_back({0, false, std::move(run.wholeOutput)});
   for (PluginText& text : run.errorText.pieces()) seen.texts.push_back(std::move(text));
   seen.record = run.readRecord();
+  run.readToolFiles();
   const bool isUsed = !seen.leftBehind.unkillable.empty();
   if (run.recordFile >= 0 && !isUsed) unlink(run.scratch->record().c_str());
   if (isUsed) {

@@ -10,6 +10,7 @@
 // that is killed with SIGKILL.
 #pragma once
 
+#include <csignal>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -30,6 +31,16 @@ struct EngineOptions {
   bool keepDisplay = false;        ///< Whether DISPLAY and WAYLAND_DISPLAY pass.
 };
 
+/// A program that runs another one, such as a debugger.
+struct Tool {
+  /// The command that goes in front, its program's absolute path first, with its files in `folder`.
+  std::function<std::vector<std::string>(const std::string& folder)> command;
+  std::vector<std::string> files = {};  ///< Names of files that it writes in that folder: RunSeen::toolFiles.
+  bool needsAddressSpace = false;  ///< More than the memory limit: only what is in use counts against that.
+  int endSignal = SIGTERM;         ///< What it gets when a time limit is hit,
+  double patienceInSeconds = 2;    ///< and how long it may take to end then.
+};
+
 /// One process to run.
 struct Job {
   std::string program;  ///< Absolute path of the worker or the describer.
@@ -39,6 +50,8 @@ struct Job {
   bool isWorker = true;  ///< Writes a flight record and prints the protocol. Otherwise all of
                          ///< standard output is kept, up to the output limit, as one text.
   std::vector<std::string> environment = {};  ///< NAME=VALUE, added to the fixed one.
+  std::optional<Limits> limits = {};          ///< Instead of the engine's own.
+  std::optional<Tool> tool = {};              ///< Runs the program, in its place.
 };
 
 class RunEngine {

@@ -78,15 +78,16 @@ struct LeftBehind {
 struct RunSeen {
   End end;
   LimitHit limitHit = LimitHit::kNone;
-  std::optional<Activity> activity = {};  ///< With kStep and kRun.
-  std::vector<ProtocolLine> lines = {};   ///< In the order in which they came.
-  bool hasTextBesidesLines = false;       ///< The plug-in printed to standard output.
-  bool outputClosedEarly = false;         ///< Standard output was closed before the process ended.
-  std::vector<PluginText> texts = {};     ///< The last 64 KiB of each output.
-  std::uint64_t outputBytes = 0;          ///< Both outputs, all of it.
-  std::string record = {};                ///< The flight record, 4096 bytes; empty when there was none.
-  int process = 0;                        ///< Its number outside of a sandbox; 0 when it is not known.
-  double startedAt = 0;                   ///< Seconds since 1970.
+  std::optional<Activity> activity = {};    ///< With kStep and kRun.
+  std::vector<ProtocolLine> lines = {};     ///< In the order in which they came.
+  bool hasTextBesidesLines = false;         ///< The plug-in printed to standard output.
+  bool outputClosedEarly = false;           ///< Standard output was closed before the process ended.
+  std::vector<PluginText> texts = {};       ///< The last 64 KiB of each output.
+  std::uint64_t outputBytes = 0;            ///< Both outputs, all of it.
+  std::string record = {};                  ///< The flight record, 4096 bytes; empty when there was none.
+  std::vector<std::string> toolFiles = {};  ///< Of a Tool: the first 32 MiB of each of its files.
+  int process = 0;                          ///< Its number outside of a sandbox; 0 when it is not known.
+  double startedAt = 0;                     ///< Seconds since 1970.
   double wallSeconds = 0;
   double userSeconds = 0;
   double systemSeconds = 0;

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/events/event_json.h"
 
+#include <algorithm>
 #include <utility>
 
 #include <fmt/format.h>
@@ -159,8 +160,10 @@ Json expectedJson(const std::optional<Expectation>& expected) {
 
 Json repetitionsJson(const std::optional<Repetitions>& repetitions) {
   if (!repetitions) return nullptr;
-  return {
-      {"runs", repetitions->runs}, {"isFlaky", repetitions->isFlaky()}, {"verdicts", repetitions->verdicts}};
+  return {{"runs", repetitions->runs},
+          {"isFlaky", repetitions->isFlaky()},
+          {"flakeRate", repetitions->flakeRate()},
+          {"verdicts", repetitions->verdicts}};
 }
 
 Json comparisonJson(const std::optional<Comparison>& comparison) {
@@ -178,7 +181,10 @@ Json diagnosisJson(const std::optional<Diagnosis>& diagnosis) {
   if (!diagnosis) return nullptr;
   Json findings = Json::array();
   for (const Diagnosis::Finding& one : diagnosis->findings)
-    findings.push_back({{"kind", text(one.kind)}, {"text", text(one.text)}, {"frames", texts(one.frames)}});
+    findings.push_back({{"kind", text(one.kind)},
+                        {"text", text(one.text)},
+                        {"frames", texts(one.frames)},
+                        {"isInPlugin", one.isInPlugin}});
   return {{"tool", text(diagnosis->tool)},
           {"command", texts(diagnosis->command)},
           {"findings", findings},
@@ -192,10 +198,23 @@ Json shrunkJson(const std::optional<Shrunk>& shrunk) {
           {"tests", shrunk->tests},
           {"runs", shrunk->runs},
           {"isReproduced", shrunk->isReproduced},
-          {"command", texts(shrunk->command)}};
+          {"command", texts(shrunk->command)},
+          {"problem", shrunk->problem.empty() ? Json(nullptr) : text(shrunk->problem)}};
 }
 
 }  // namespace
+
+double Repetitions::flakeRate() const {
+  unsigned bad = 0;
+  for (const auto& [end, count] : verdicts) {
+    const auto isIts = [word = end.substr(0, end.find(' '))](const VerdictRow& row) {
+      return word == row.word;
+    };
+    const auto row = std::find_if(verdictTable().begin(), verdictTable().end(), isIts);
+    if (row == verdictTable().end() || !row->isGood) bad += count;
+  }
+  return runs > 0 ? static_cast<double>(bad) / runs : 0;
+}
 
 const char* nameOfChange(Comparison::Change change) {
   switch (change) {

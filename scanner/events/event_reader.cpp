@@ -336,7 +336,8 @@ Diagnosis readDiagnosis(const Value& value) {
   diagnosis.tool = value["tool"].text();
   diagnosis.command = value["command"].texts();
   value["findings"].forEach([&diagnosis](const Value& finding) {
-    diagnosis.findings.push_back({finding["kind"].text(), finding["text"].text(), finding["frames"].texts()});
+    diagnosis.findings.push_back({finding["kind"].text(), finding["text"].text(), finding["frames"].texts(),
+                                  finding["isInPlugin"].boolean()});
   });
   diagnosis.problem = value["problem"].textOrNull();
   diagnosis.report = value["report"].text();
@@ -350,6 +351,7 @@ Shrunk readShrunk(const Value& value) {
   shrunk.runs = value["runs"].whole<unsigned>();
   shrunk.isReproduced = value["isReproduced"].boolean();
   shrunk.command = value["command"].texts();
+  shrunk.problem = value["problem"].textOrNull();
   return shrunk;
 }
 

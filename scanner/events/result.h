@@ -2,6 +2,7 @@
 // The result of one plug-in, and the events of a scan. Plain values; reports are made of nothing else.
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 #include <map>
 #include <optional>
@@ -21,6 +22,8 @@ struct Repetitions {
   std::map<std::string, unsigned> verdicts = {};
 
   [[nodiscard]] bool isFlaky() const { return verdicts.size() > 1; }
+  /// The share of the runs that ended badly, from 0 to 1.
+  [[nodiscard]] double flakeRate() const;
 };
 
 /// What the list of expectations says of the plug-in.
@@ -53,24 +56,33 @@ struct Comparison {
 /// What a tool for finding errors (memcheck, gdb or a command of the user's) said of a further run.
 struct Diagnosis {
   struct Finding {
-    std::string kind;                      ///< The tool's word: "InvalidRead", "SIGSEGV".
-    std::string text;                      ///< One line for people.
-    std::vector<std::string> frames = {};  ///< Innermost first: "function (file:line)" or "module+0xoffset".
+    std::string kind;  ///< The tool's word: "InvalidRead", "SIGSEGV".
+    std::string text;  ///< One line for people.
+    /// Innermost first: "function (file:line)", "function (module+0xoffset)" or "module+0xoffset".
+    std::vector<std::string> frames = {};
+    /// False where neither the plug-in nor a library of its own had a part in it, as far as the tool can tell.
+    bool isInPlugin = true;
   };
   std::string tool;                       ///< "memcheck", "gdb", or the command's name.
   std::vector<std::string> command = {};  ///< What repeats the run under the tool.
   std::vector<Finding> findings = {};
-  std::string problem = {};  ///< Why there is no diagnosis: a sentence; empty where there is one.
-  std::string report = {};   ///< What the tool printed, its last 64 KiB.
+  std::string problem = {};  ///< Why there is no diagnosis, or what is missing in it: a sentence, or empty.
+  std::string report = {};   ///< What the tool said, its last 64 KiB.
+
+  /// Whether there is a finding that the plug-in has a part in.
+  [[nodiscard]] bool hasFindings() const {
+    return std::any_of(findings.begin(), findings.end(), [](const Finding& one) { return one.isInPlugin; });
+  }
 };
 
 /// The shortest list of tests that was found to fail in the same way.
 struct Shrunk {
-  std::string from;           ///< The tests that were run first: "0,3,3,1".
+  std::string from;           ///< The tests that were run first: "0,3,3,1". Empty where it failed before any.
   std::string tests;          ///< The list that was left of them; the same where it did not shrink.
   unsigned runs = 0;          ///< How many runs that took.
-  bool isReproduced = false;  ///< Whether running `from` again failed in the same way at all.
+  bool isReproduced = false;  ///< Whether any of them failed in the same way.
   std::vector<std::string> command = {};  ///< What repeats the failure.
+  std::string problem = {};               ///< Why this is not the shortest list: a sentence, or empty.
 };
 
 struct PluginResult {

@@ -46,8 +46,10 @@ constexpr const char* kTestTexts[] = {
     "inspect class info",     "inspect preset info", "inspect parameter info",
     "testing setting states", "inspect latency",     "inspect stream format",
 };
-/// The random tests begin behind this step.
+/// The random tests begin behind this step,
 constexpr int kLastFixedStep = 15;
+/// and those of a list behind this one.
+constexpr int kStepOfDescription = 1;
 /// The second instance is created in this step, and missed in a later one.
 constexpr int kStepOfRecreation = 14;
 constexpr const char* kLoadFailure = "!create and initialize failed -1";
@@ -147,9 +149,21 @@ RequestSeen requestFrom(const ReportedRequest& reported) {
   return request;
 }
 
+/// The tests of the steps behind the first, up to the last.
+std::vector<int> testsBetween(const RunSeen& seen, int first, int last) {
+  std::vector<int> tests;
+  for (const ProtocolLine& line : seen.lines) {
+    if (line.kind != ProtocolLine::Kind::kStep || line.number <= first || line.number > last) continue;
+    const auto* const test = std::find(std::begin(kTestTexts), std::end(kTestTexts), line.text);
+    if (test != std::end(kTestTexts)) tests.push_back(static_cast<int>(test - std::begin(kTestTexts)));
+  }
+  return tests;
+}
+
 class Judge {
  public:
-  Judge(const RunSeen& seen_, const Limits& limits_) : seen(seen_), limits(limits_), lines(readLines(seen_)) {
+  Judge(const RunSeen& seen_, const Limits& limits_, int listedTests_)
+      : seen(seen_), limits(limits_), listedTests(listedTests_), lines(readLines(seen_)) {
     readRecord();
   }
 
@@ -411,7 +425,7 @@ class Judge {
     }
     switch (record.verdict) {
       case kFlightPassed:
-        endedAs(Verdict::kPassed, status == kPassedStatus, lines.areWhole(kTotalOfAPlugin, kStepsOfAPass));
+        endedAs(Verdict::kPassed, status == kPassedStatus, areWholeLines());
         break;
       case kFlightShell:
         endedAs(Verdict::kShell, status == kShellStatus, lines.areWhole(kTotalOfAShell, kStepsOfAShell));
@@ -433,6 +447,12 @@ class Judge {
         exited(status);
         break;
     }
+  }
+
+  /// Whether the lines are those of a plug-in's whole run.
+  [[nodiscard]] bool areWholeLines() const {
+    if (listedTests == 0) return lines.areWhole(kTotalOfAPlugin, kStepsOfAPass);
+    return lines.areWhole(kStepOfDescription + listedTests, kStepOfDescription + listedTests);
   }
 
   /// The record says that the run went to its end as `verdict`. Lines and status have to say the same.
@@ -512,8 +532,7 @@ class Judge {
       contradict("a line came that was not due, or one in its place: " + lines.outOfTurn);
     }
     const bool isGoodStatus = status == kPassedStatus || status == kShellStatus;
-    const bool areWhole =
-        lines.areWhole(kTotalOfAPlugin, kStepsOfAPass) || lines.areWhole(kTotalOfAShell, kStepsOfAShell);
+    const bool areWhole = areWholeLines() || lines.areWhole(kTotalOfAShell, kStepsOfAShell);
     if (isGoodStatus && areWhole && !isAtItsEnd()) {
       contradict(hasRecord
                      ? "the lines are those of a whole run, the flight record says that it did not go to "
@@ -606,18 +625,15 @@ class Judge {
       }
     }
     std::string tests;
-    for (const ProtocolLine& line : seen.lines) {
-      if (line.kind != ProtocolLine::Kind::kStep || line.number <= kLastFixedStep) continue;
-      const auto* const test = std::find(std::begin(kTestTexts), std::end(kTestTexts), line.text);
-      if (test != std::end(kTestTexts)) {
-        tests += fmt::format("{}{}", tests.empty() ? "" : ",", test - std::begin(kTestTexts));
-      }
-    }
+    for (const int test : testsBetween(seen, listedTests > 0 ? kStepOfDescription : kLastFixedStep,
+                                       kStepsOfAPass + listedTests))
+      tests += fmt::format("{}{}", tests.empty() ? "" : ",", test);
     if (!tests.empty()) out.testsRun = tests;
   }
 
   const RunSeen& seen;
   const Limits& limits;
+  const int listedTests;  ///< 0 for the usual ones.
   const Lines lines;
   FlightReport record;
   bool hasRecord = false;
@@ -627,7 +643,11 @@ class Judge {
 
 }  // namespace
 
-Judgement judge(const RunSeen& seen, const Limits& limits) { return Judge(seen, limits).result(); }
+Judgement judge(const RunSeen& seen, const Limits& limits, std::size_t listedTests) {
+  return Judge(seen, limits, static_cast<int>(listedTests)).result();
+}
+
+std::vector<int> testsBegun(const RunSeen& seen, int lastStep) { return testsBetween(seen, 0, lastStep); }
 
 std::string nameOfSignal(int signal) {
   for (const SignalName& row : kSentSignals) {

@@ -7,6 +7,7 @@
 // result.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -59,8 +60,12 @@ struct Judgement {
   std::optional<std::string> testsRun = {};      ///< The random tests, for --tests: "0,3,1".
 };
 
-/// The verdict on a run.
-Judgement judge(const RunSeen& seen, const Limits& limits);
+/// The verdict on a run. `listedTests` is how many tests the worker was told to run; 0 for the usual ones.
+Judgement judge(const RunSeen& seen, const Limits& limits, std::size_t listedTests = 0);
+
+/// The tests that a run has begun, in order, up to and including this step: the numbers that the worker's --tests
+/// takes.
+std::vector<int> testsBegun(const RunSeen& seen, int lastStep);
 
 /// "SIGSEGV" for 11; "signal 77" for one without a name.
 std::string nameOfSignal(int signal);

@@ -16,6 +16,9 @@ constexpr std::size_t kTimeColumns = 8;
 constexpr std::size_t kIndent = 2;
 constexpr std::size_t kFewestColumns = 20;
 constexpr std::size_t kMostMendedNamed = 10;
+/// Of a tool's findings, and of the frames of each.
+constexpr std::size_t kMostFindings = 3;
+constexpr std::size_t kMostFrames = 5;
 
 constexpr const char* kGreen = "\x1b[32m";
 constexpr const char* kRed = "\x1b[31m";
@@ -124,11 +127,14 @@ void TerminalReport::ended(const PluginResult& result) {
   if (result.comparison && result.comparison->change == Comparison::Change::kMended &&
       ++mendedInAll <= kMostMendedNamed)
     mended.push_back(nameOf(result.run, false));
-  if (!isGood || isFlaky || changesByItself || !result.isWanted) {
+  const bool isExplained =
+      result.diagnosis && (!result.diagnosis->findings.empty() || !result.diagnosis->problem.empty());
+  if (!isGood || isFlaky || changesByItself || isExplained || !result.isWanted) {
     remarkable.push_back(result);
     // What it printed and the like is not shown, and would be kept for each of many.
     remarkable.back().seen.reset();
     remarkable.back().description.reset();
+    if (result.diagnosis) remarkable.back().diagnosis->report.clear();
   }
   if (options.isQuiet && result.isWanted) return;
 
@@ -149,6 +155,43 @@ void TerminalReport::ended(const PluginResult& result) {
   if (columnsOf(name) + remark.size() > room) remark.clear();
   print(coloured(line, result.judgement.verdict, result.isWanted && !isFlaky) + time +
         shortened(name, options.isTerminal ? room : name.size()) + remark + "\n");
+}
+
+std::string TerminalReport::indented(const std::string& text, std::size_t depth) const {
+  const std::size_t columns = options.columns > depth ? options.columns - depth : 1;
+  return std::string(depth, ' ') + wrapped(printable(text), columns, depth) + "\n";
+}
+
+std::string TerminalReport::diagnosisText(const Diagnosis& diagnosis) const {
+  std::string text;
+  std::size_t shown = 0;
+  for (const Diagnosis::Finding& finding : diagnosis.findings) {
+    if (shown++ == kMostFindings) break;
+    const char* place = finding.isInPlugin ? "" : ", not in the plug-in";
+    text += indented(fmt::format("{}{}: {}", diagnosis.tool, place, finding.text), kIndent);
+    for (std::size_t i = 0; i < std::min(finding.frames.size(), kMostFrames); ++i) {
+      const std::size_t depth = 2 * kIndent;
+      const std::size_t room = options.columns > depth ? options.columns - depth : 1;
+      text += std::string(depth, ' ') + shortened(printable(finding.frames[i]), room) + "\n";
+    }
+  }
+  const std::size_t more = diagnosis.findings.size() - std::min(diagnosis.findings.size(), kMostFindings);
+  if (more > 0) text += indented(fmt::format("{}: {} more of them", diagnosis.tool, more), kIndent);
+  if (!diagnosis.problem.empty()) text += indented(diagnosis.tool + ": " + diagnosis.problem, kIndent);
+  if (!diagnosis.command.empty())
+    text += "  " + printable("under " + diagnosis.tool + ": " + shellCommand(diagnosis.command)) + "\n";
+  return text;
+}
+
+std::string TerminalReport::shrunkText(const Shrunk& shrunk) const {
+  if (!shrunk.isReproduced) return indented("shortest list of tests: " + shrunk.problem, kIndent);
+  const auto count = [](const std::string& tests) {
+    return std::count(tests.begin(), tests.end(), ',') + (tests.empty() ? 0 : 1);
+  };
+  std::string text = fmt::format("shortest list of tests: {} of {}, found in {} {}", count(shrunk.tests),
+                                 count(shrunk.from), shrunk.runs, shrunk.runs == 1 ? "run" : "runs");
+  if (!shrunk.problem.empty()) text += "; " + shrunk.problem;
+  return indented(text, kIndent) + "  " + printable("shortest: " + shellCommand(shrunk.command)) + "\n";
 }
 
 void TerminalReport::ended(const ScanEnded& scan) {
@@ -179,10 +222,12 @@ void TerminalReport::ended(const ScanEnded& scan) {
       for (const auto& [end, count] : result.repetitions->verdicts) {
         ends += fmt::format("{}{} of {} {}", ends.empty() ? "" : ", ", count, result.repetitions->runs, end);
       }
-      add("flaky: " + ends);
+      add(fmt::format("flaky: {:.0f} % of the runs failed: {}", result.repetitions->flakeRate() * 100, ends));
     }
     if (const std::string change = changeInWords(result); !change.empty()) add(change);
     for (const std::string& contradiction : result.judgement.contradictions) add("note: " + contradiction);
+    if (result.diagnosis) block += diagnosisText(*result.diagnosis);
+    if (result.shrunk) block += shrunkText(*result.shrunk);
     if (!result.command.empty()) block += indent + printable("again: " + shellCommand(result.command)) + "\n";
     print(block);
   }

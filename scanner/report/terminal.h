@@ -42,6 +42,9 @@ class TerminalReport {
  private:
   std::string coloured(const std::string& text, Verdict verdict, bool isWanted) const;
   void print(const std::string& text);
+  std::string indented(const std::string& text, std::size_t depth) const;
+  std::string diagnosisText(const Diagnosis& diagnosis) const;
+  std::string shrunkText(const Shrunk& shrunk) const;
 
   TerminalOptions options;
   std::function<bool(const std::string&)> write;

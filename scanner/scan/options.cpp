@@ -44,6 +44,7 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
   std::uint64_t memoryInMiB = limits.memoryInBytes >> 20;
   std::string shard;
   std::string sandbox = "auto";
+  std::string under;
   bool hidesProgress = false;
 
   CLI::App app(kDescription, "vsttorture-scan");
@@ -70,6 +71,9 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
                  "Run each plug-in N times, from the second time on with other contents of fresh memory")
       ->check(CLI::Range(1, 10000))
       ->type_name("N");
+  app.add_option("--under", under, "Run each plug-in once more under memcheck, gdb or a COMMAND")
+      ->type_name("TOOL");
+  app.add_flag("--shrink", options.explain.shrinks, "Find the shortest list of tests that still fails");
   app.add_option("--skip", options.skipFile, "Do not run the plug-ins in this list")->type_name("FILE");
   app.add_option("--expect", options.expectFile, "How each plug-in is expected to end")->type_name("FILE");
   app.add_option("--shard", shard, "Only part K of N of the plug-ins")->check(checkShard)->type_name("K/N");
@@ -101,6 +105,13 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
       std::fprintf(stderr, "vsttorture-scan: %s\nvsttorture-scan --help says what there is.\n", error.what());
     }
     status = isQuestion ? kScanAsWanted : kScanWrongUse;
+    return std::nullopt;
+  }
+  try {
+    if (app.count("--under") > 0) options.explain.tool = findTool(under);
+  } catch (const UnusableTool& error) {
+    std::fprintf(stderr, "vsttorture-scan: %s\n", error.what());
+    status = kScanWrongUse;
     return std::nullopt;
   }
   limits.memoryInBytes = memoryInMiB << 20;

@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "scanner/engine/run_engine.h"
+#include "scanner/explain/explainer.h"
 #include "scanner/plan/run_list.h"
 
 namespace scanner {
@@ -24,6 +25,7 @@ struct ScanOptions {
   std::vector<std::string> paths = {};  ///< Empty: the default places.
   EngineOptions engine = {};
   unsigned repeat = 1;
+  ExplainOptions explain = {};
   std::string skipFile = {};
   std::string expectFile = {};
   Shard shard = {};

@@ -53,11 +53,19 @@ std::string optionsThatMatter(const ScanOptions& options) {
                                  limits.outputInBytes, limits.filesInBytes, options.repeat);
   if (options.describes) text += " describe";
   if (options.engine.keepDisplay) text += " display";
+  if (options.explain.shrinks) text += " shrink";
+  if (options.explain.tool) {
+    text += fmt::format(" under={}", options.explain.tool->name);
+    for (const std::string& argument : options.explain.tool->command) text += fmt::format(" \"{}\"", argument);
+    text += variable("VALGRIND_OPTS");
+  }
   return text + variable("LD_LIBRARY_PATH") + variable("LD_PRELOAD");
 }
 
 /// A report that shows more of a good result than its verdict.
-bool needsWholeResults(const ScanOptions& options) { return !options.jsonFile.empty(); }
+bool needsWholeResults(const ScanOptions& options) {
+  return !options.jsonFile.empty() || options.explain.tool.has_value();
+}
 
 }  // namespace
 

@@ -147,6 +147,7 @@ class Scan {
     double earlierSeconds = 0;  ///< How long a run took in an earlier scan; 0 for unknown.
     std::optional<std::vector<Child>> children = {};  ///< Of a shell that could be described.
     bool isStopped = false;  ///< It was interrupted, so that the result is not whole.
+    std::vector<std::string> environment = {};  ///< Of the run that speaks for it.
   };
   using Plugin = std::shared_ptr<UnderWay>;
 
@@ -169,6 +170,7 @@ class Scan {
   void makeEngine() {
     engine = std::make_unique<RunEngine>(options.engine);
     engine->onTick([this] { showProgress(); });
+    explainer.emplace(*engine, options.explain, options.engine.limits);
   }
 
   void begin(const FindResult& found) {
@@ -197,7 +199,9 @@ class Scan {
       std::optional<PluginResult> result = remembering.resultOf(one);
       if (result) {
         result->otherNames = otherNames[one.run.bundle];
-        result->command = commandOf(one.run);
+        const bool hasVariable = result->command.size() > 2 && result->command.front() == "env";
+        result->command.resize(hasVariable ? 2 : 0);
+        for (const std::string& argument : commandOf(one.run)) result->command.push_back(argument);
         deliver(*result);
       } else {
         start({one.run, one.answer.wallSeconds}, isUrgent);
@@ -254,22 +258,40 @@ class Scan {
     PluginResult& result = plugin->result;
     const Judgement judgement = judge(seen, options.engine.limits);
     const bool isFirst = plugin->runsDone++ == 0;
+    plugin->isStopped = seen.limitHit == LimitHit::kInterrupted;
+    if (plugin->isStopped && !isFirst) {  // It says nothing; the earlier ones do.
+      deliver(plugin);
+      return;
+    }
     if (options.repeat > 1) countRepetition(result, judgement);
     // Of several runs the first that is not good speaks for the plug-in.
     if (isFirst || (rowOf(result.judgement.verdict).isGood && !rowOf(judgement.verdict).isGood)) {
       result.judgement = judgement;
       result.seen = seen;
+      if (!isFirst) {
+        plugin->environment = {memoryFilling(plugin->runsDone - 1)};
+        result.command = commandOf(result.run);
+        result.command.insert(result.command.begin(), {"env", plugin->environment.front()});
+      }
     }
-    plugin->isStopped = seen.limitHit == LimitHit::kInterrupted;
     if (plugin->runsDone < options.repeat && !plugin->isStopped) {
       startRepetition(plugin, true);
       return;
     }
+    if (plugin->isStopped) {
+      deliver(plugin);
+    } else {
+      explainer->explain(result, plugin->environment, [this, plugin] { explained(plugin); });
+    }
+  }
+
+  void explained(const Plugin& plugin) {
+    const PluginResult& result = plugin->result;
     const bool isShell = result.judgement.verdict == Verdict::kShell;
     const bool isDescribable =
         isShell || (options.describes && result.judgement.verdict != Verdict::kNotLoadable &&
                     result.judgement.verdict != Verdict::kRefused);
-    if (isDescribable && !plugin->isStopped) {
+    if (isDescribable) {
       describe(plugin, isShell);
     } else {
       deliver(plugin);
@@ -356,7 +378,8 @@ class Scan {
   void deliver(PluginResult& result, const UnderWay* plugin = nullptr) {
     const bool isGood = rowOf(result.judgement.verdict).isGood;
     const bool isFlaky = result.repetitions && result.repetitions->isFlaky();
-    result.isWanted = isGood && !isFlaky;
+    const bool hasFindings = result.diagnosis && result.diagnosis->hasFindings();
+    result.isWanted = isGood && !isFlaky && !hasFindings;
     const auto rows = expected.matching(result.run.bundle, result.run.child);
     for (const PluginRow* one : rows) rowsMet.insert(one->line);
     const PluginRow* row = rows.empty() ? nullptr : rows.front();
@@ -436,8 +459,9 @@ class Scan {
   std::map<std::string, std::vector<std::string>> otherNames;
   Remembering remembering;
   TimeLeft timeLeft;
-  std::unique_ptr<RunEngine> engine;  ///< Made when something has to be run.
-  std::vector<Plugin> underWay;       ///< Started and not yet delivered.
+  std::unique_ptr<RunEngine> engine;   ///< Made when something has to be run,
+  std::optional<Explainer> explainer;  ///< and this with it.
+  std::vector<Plugin> underWay;        ///< Started and not yet delivered.
   std::set<unsigned> rowsMet;
   std::map<std::string, std::size_t> counts;
   std::size_t total = 0;
