@@ -2,9 +2,9 @@
 #include "scanner/explain/memcheck.h"
 
 #include <algorithm>
+#include <cctype>
 #include <cstdlib>
 #include <map>
-#include <set>
 #include <sstream>
 
 #include <fmt/format.h>
@@ -88,10 +88,15 @@ const Frame* innermostOfPlugin(const std::vector<Frame>& frames) {
 /// One line. Addresses in memory are left out: they are others in each run.
 std::string textOf(const Error& error) {
   constexpr std::string_view kAddress = "Address 0x";
+  constexpr std::uint64_t kSmallestAddress = 4096;
   std::string more = error.more;
   if (more.rfind(kAddress, 0) == 0) {
+    const std::uint64_t address = std::strtoull(more.c_str() + kAddress.size(), nullptr, 16);
     const std::size_t is = more.find(" is ");
     if (is != std::string::npos) more = more.substr(is + 4);
+    if (address < kSmallestAddress) more = "through a null pointer";
+  } else if (!more.empty()) {
+    more[0] = static_cast<char>(std::tolower(static_cast<unsigned char>(more[0])));
   }
   if (!more.empty()) more = ": " + more;
   const Frame* origin = innermostOfPlugin(error.origin);
