@@ -151,6 +151,8 @@ void TerminalReport::ended(const PluginResult& result) {
   const std::size_t used = columnsOf(line) + columnsOf(time);
   const std::size_t room = options.columns > used ? options.columns - used : 1;
   std::string remark = isExpected && !isGood ? "  as expected" : "";
+  if (isGood && result.diagnosis && result.diagnosis->hasFindings())
+    remark = "  with findings of " + printable(result.diagnosis->tool);
   if (result.isRemembered) remark += "  (remembered)";
   if (columnsOf(name) + remark.size() > room) remark.clear();
   print(coloured(line, result.judgement.verdict, result.isWanted && !isFlaky) + time +

@@ -112,7 +112,7 @@ passed  /usr/lib/vst/mended.so
   again: /usr/lib/vsttorture-worker /usr/lib/vst/mended.so
 exited  /usr/lib/vst/flaky.so
   ended the process with status 0
-  flaky: 1 of 3 exited at 4, 2 of 3 passed
+  flaky: 33 % of the runs failed: 1 of 3 exited at 4, 2 of 3 passed
   again: /usr/lib/vsttorture-worker /usr/lib/vst/flaky.so
 wrong_architecture  /usr/lib/vst/arm.so
   built for Linux on aarch64
@@ -135,6 +135,70 @@ TEST(TerminalReport, FitsInto40ColumnsButForCommands) {
   }
   EXPECT_THAT(text, HasSubstr("crashed     oscilloscope.so\n"));
   EXPECT_THAT(text, HasSubstr("wrong_architecture arm.so\n"));
+}
+
+TEST(TerminalReport, ShowsWhatAToolFoundInAPluginThatPassed) {
+  Terminal terminal(60);
+  PluginResult one = result(Verdict::kPassed, "/lib/vst/a.so");
+  one.isWanted = false;
+  one.diagnosis.emplace();
+  one.diagnosis->tool = "memcheck";
+  one.diagnosis->command = {"valgrind", "worker", "/lib/vst/a b.so"};
+  one.diagnosis->findings = {
+      {"InvalidRead",
+       "Invalid read of size 1: 0 bytes after a block",
+       {"strlen", "a.so+0x1", "b", "c", "d", "e"}},
+      {"UninitValue", "Use", {"clearsAVeryLargeBlockOfMemoryByALengthThatWasNeverSet (file.cpp:123)"}, false},
+      {"UninitValue", "Use", {}},
+      {"UninitValue", "Use", {}}};
+  one.diagnosis->problem = "memcheck was ended before the run was";
+  terminal.report().ended(one);
+  EXPECT_EQ(terminal.take(), "passed         1.2 s  /lib/vst/a.so  with findings of memcheck\n");
+  terminal.report().ended(ScanEnded());
+  EXPECT_EQ(terminal.take(),
+            R"(
+passed  /lib/vst/a.so
+  memcheck: Invalid read of size 1: 0 bytes after a block
+    strlen
+    a.so+0x1
+    b
+    c
+    d
+  memcheck, not in the plug-in: Use
+    clearsAVeryLargeB...LengthThatWasNeverSet (file.cpp:123)
+  memcheck: Use
+  memcheck: 1 more of them
+  memcheck: memcheck was ended before the run was
+  under memcheck: valgrind worker '/lib/vst/a b.so'
+  again: /usr/lib/vsttorture-worker /lib/vst/a.so
+
+0 results, in 0.0 s
+)");
+}
+
+TEST(TerminalReport, ShowsTheShortestListOfTestsAndItsCommand) {
+  Terminal terminal(60);
+  PluginResult one = result(Verdict::kCrashed, "/lib/vst/a.so", "cause");
+  one.shrunk = Shrunk{"0,1,2,3,3,4", "3,3,4", 11, true, {"worker", "--tests", "3,3,4", "/lib/vst/a.so"}};
+  terminal.report().ended(one);
+  one.shrunk = Shrunk{"0,3", "0,3", 2, false, one.command, "it did not fail again"};
+  terminal.report().ended(one);
+  terminal.take();
+  terminal.report().ended(ScanEnded());
+  EXPECT_EQ(terminal.take(),
+            R"(
+crashed  /lib/vst/a.so
+  cause
+  shortest list of tests: 3 of 6, found in 11 runs
+  shortest: worker --tests 3,3,4 /lib/vst/a.so
+  again: /usr/lib/vsttorture-worker /lib/vst/a.so
+crashed  /lib/vst/a.so
+  cause
+  shortest list of tests: it did not fail again
+  again: /usr/lib/vsttorture-worker /lib/vst/a.so
+
+0 results, in 0.0 s
+)");
 }
 
 TEST(TerminalReport, ShowsOnlyWhatIsNotAsWantedWhenQuiet) {

@@ -77,6 +77,54 @@ TEST_P(RunEngineTest, AJobsVariableReplacesOursAndTheDisplayIsNotPassed) {
   unsetenv("ENGINE_TEST");
 }
 
+TEST_P(RunEngineTest, AToolRunsTheProgramAndItsFilesAreReadAndGone) {
+  Job job = shellJob("echo program \"$0\"");
+  job.tool.emplace();
+  job.tool->files = {"first", "second"};
+  job.tool->command = [](const std::string& where) {
+    const std::string script = "echo tool; echo a > $0/first; echo b > $0/second; \"$@\"";
+    return std::vector<std::string>{"/bin/sh", "-c", script, where};
+  };
+  const RunSeen seen = run(job);
+  EXPECT_EQ(textOf(seen), "tool\nprogram /bin/sh\n");
+  EXPECT_THAT(seen.toolFiles, ElementsAre("a\n", "b\n"));
+  EXPECT_EQ(seen.leftBehind.fileCount, 0U);
+  EXPECT_EQ(seen.process, 0);
+}
+
+TEST_P(RunEngineTest, AJobsLimitsCountInsteadOfTheEngines) {
+  options.limits.runInSeconds = 60;
+  Job job = shellJob("exec sleep 30");
+  job.limits = options.limits;
+  job.limits->runInSeconds = 0.2;
+  EXPECT_EQ(run(job).limitHit, LimitHit::kRun);
+}
+
+TEST_P(RunEngineTest, AtATimeLimitAToolGetsItsSignalAndItsPatience) {
+  options.limits.runInSeconds = 0.3;
+  Job job = shellJob("true");
+  job.tool.emplace();
+  job.tool->endSignal = SIGINT;
+  job.tool->patienceInSeconds = 20;
+  job.tool->command = [](const std::string&) {
+    const std::string script = "trap 'kill $!; sleep 2.5; echo interrupted; exit 4' INT; sleep 30 & wait";
+    return std::vector<std::string>{"/bin/sh", "-c", script};
+  };
+  const RunSeen seen = run(job);
+  EXPECT_EQ(textOf(seen), "interrupted\n");
+  EXPECT_EQ(seen.end.status, 4);
+}
+
+TEST_P(RunEngineTest, AToolMayHaveMoreAddressSpaceThanTheLimit) {
+  options.limits.memoryInBytes = std::uint64_t{64} << 20;
+  Job job = shellJob("ulimit -v");
+  EXPECT_EQ(textOf(run(job)), "65536\n");
+  job.tool.emplace();
+  job.tool->needsAddressSpace = true;
+  job.tool->command = [](const std::string&) { return std::vector<std::string>{"/usr/bin/env"}; };
+  EXPECT_EQ(textOf(run(job)), "unlimited\n");
+}
+
 TEST_P(RunEngineTest, FilesThatAreLeftAreListedAndRemoved) {
   const RunSeen seen =
       run(shellJob("echo 1 > \"$HOME/.config/a\"; mkdir \"$TMPDIR/d\"; echo 2 > \"$TMPDIR/d/b\""));

@@ -744,6 +744,28 @@ TEST(Judge, ListsTheTestsThatWereDrawnInTheFormOfTheWorkersOption) {
   EXPECT_EQ(judge(SeenRun::in(15).result(), Limits()).testsRun, std::nullopt);
 }
 
+TEST(Judge, ARunWithAListOfTestsPassesAtItsOwnLastStep) {
+  SeenRun run = SeenRun::in(0);
+  run.line(ProtocolLine::Kind::kTotal, 3).lines(1, 3).recordStep(3).request(3, 1);
+  run.requestReturned().phase(5).verdict(1).exits(0);
+
+  EXPECT_EQ(judge(run.result(), Limits(), 2).verdict, Verdict::kPassed);
+  EXPECT_EQ(judge(run.result(), Limits(), 2).testsRun, "0,1");
+  EXPECT_EQ(judge(run.result(), Limits(), 3).verdict, Verdict::kExited);
+  EXPECT_EQ(judge(run.result(), Limits()).verdict, Verdict::kExited);
+  EXPECT_EQ(judge(SeenRun::passed().result(), Limits(), 64).verdict, Verdict::kExited);
+}
+
+TEST(TestsBegun, AreThoseOfTheStepsUpToTheLastInTheFormOfTheWorkersOption) {
+  SeenRun run = SeenRun::in(15);
+  run.line(Kind::kStep, 16, "testing setting states").line(Kind::kStep, 17, "inspect class info");
+
+  EXPECT_THAT(testsBegun(run.result(), 17), testing::ElementsAre(0, 1, 2, 3, 4, 5, 5, 4, 3, 2, 1, 0, 3, 0));
+  EXPECT_THAT(testsBegun(run.result(), 15), testing::SizeIs(12));
+  EXPECT_THAT(testsBegun(run.result(), 5), testing::ElementsAre(0, 1, 2, 3));
+  EXPECT_THAT(testsBegun(run.result(), 1), testing::IsEmpty());
+}
+
 TEST(Judge, TimesEachStepFromTheRecord) {
   const Judgement judgement = judge(SeenRun::in(3).exits(9).result(), Limits());
 
