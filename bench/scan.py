@@ -3,14 +3,15 @@
 """Holds the cost of vsttorture-scan against bare runs of vsttorture on the same plug-ins.
 
     cmake --preset bench && cmake --build --preset bench
-    bench/scan.py [--build build/bench] [--copies 200] [--rounds 7] [--modules FOLDER]
+    bench/scan.py [--build build/bench] [--copies 200] [--rounds 7] [--modules [FOLDER...]]
     bench/scan.py --sizes 1000 2500 5000 10000 [--build build/bench] [--jobs 2]
 
 A round is: all plug-ins run one after the other without the scan; scanned with -j 1, without and with sandbox;
 scanned with -j 2 without sandbox. Wall and processor time (user and system, of all processes) are taken of each; the
 medians of all rounds are printed. What a scan of one plug-in costs beyond its run is the start of the scan, which
 is taken off where the cost of a run is told. Bare runs write to /dev/null, which is the least that they can cost.
-Plug-ins are copies of the sample effect, or with --modules those below that folder. A ratio follows each table.
+Plug-ins are copies of the sample effect, or with --modules those in these folders, or all of
+this machine. A ratio follows each table.
 
 With --sizes it scans so many copies of the plug-in that answers nothing, once each, and prints wall time, time for each
 plug-in and the scan's own peak memory. They are copies, since hard links are one plug-in to the scan. No scan uses
@@ -53,6 +54,8 @@ class Bench:
         self.scan = os.path.join(build, "vsttorture-scan")
         self.tool = os.path.join(build, "vsttorture")
         self.null_plugin = os.path.join(build, "plugins", "null_plugin.so")
+        usage = subprocess.run([self.scan, "--help"], stdout=subprocess.PIPE, text=True, check=True).stdout
+        self.fresh = ["--cache", "off"] if "--cache" in usage else []
 
     def run_bare(self, plugins):
         silent = [(os.POSIX_SPAWN_OPEN, number, "/dev/null", os.O_RDWR, 0) for number in range(3)]
@@ -61,7 +64,7 @@ class Bench:
             os.waitpid(process, 0)
 
     def run_scan(self, options, plugins):
-        process = subprocess.run([self.scan, "--cache=off", *options, "--quiet", "--no-progress", "--", *plugins],
+        process = subprocess.run([self.scan, *self.fresh, *options, "--quiet", "--no-progress", "--", *plugins],
                                  stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE,
                                  check=False)
         if process.returncode not in (0, 1):
@@ -71,9 +74,9 @@ class Bench:
         options = WAYS[way]
         return measured(lambda: self.run_bare(plugins) if options is None else self.run_scan(options, plugins))
 
-    def modules_below(self, folder):
-        """The modules that can be run here, as the scan finds them."""
-        events = subprocess.run([self.scan, "--cache=off", "--sandbox=off", "--no-progress", "--json", "-", folder],
+    def modules_in(self, folders):
+        """The modules that can be run here, as the scan finds them; without folders those of this machine."""
+        events = subprocess.run([self.scan, *self.fresh, "--sandbox=off", "--no-progress", "--json", "-", *folders],
                                 stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, check=False).stdout
         started = [json.loads(line) for line in events.splitlines() if b'"run_started"' in line]
         return sorted({event["plugin"]["bundle"] for event in started if event["plugin"]["child"] is None})
@@ -82,7 +85,7 @@ class Bench:
     def peak_of_scan(self, options, folder):
         """Wall seconds of a scan, and the peak of its own resident memory in bytes, without that of its children."""
         begin = time.perf_counter()
-        process = subprocess.Popen([self.scan, "--cache=off", *options, "--quiet", "--no-progress", folder],
+        process = subprocess.Popen([self.scan, *self.fresh, *options, "--quiet", "--no-progress", folder],
                                    stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL)
         peak = 0
         while process.poll() is None:
@@ -119,7 +122,7 @@ def main():
     parser.add_argument("--build", default="build/bench")
     parser.add_argument("--copies", type=int, default=200)
     parser.add_argument("--rounds", type=int, default=7)
-    parser.add_argument("--modules")
+    parser.add_argument("--modules", nargs="*", metavar="FOLDER")
     parser.add_argument("--sizes", type=int, nargs="+", metavar="COUNT")
     parser.add_argument("--jobs", type=int, default=2, help="with --sizes: runs at a time")
     arguments = parser.parse_args()
@@ -128,8 +131,8 @@ def main():
         compare_sizes(bench, arguments.sizes, arguments.jobs)
         return
     with tempfile.TemporaryDirectory(prefix="scan-bench-") as folder:
-        if arguments.modules:
-            plugins = bench.modules_below(arguments.modules)
+        if arguments.modules is not None:
+            plugins = bench.modules_in(arguments.modules)
         else:
             sample = pathlib.Path(arguments.build, "plugins", "well_behaved_effect.so")
             plugins = [shutil.copy(sample, os.path.join(folder, f"{number}.so"))

@@ -167,6 +167,8 @@ class WrongUse(ScanTest):
 
     @unittest.skipIf(list(pathlib.Path("/usr").glob("lib/*/vsttorture/vsttorture-worker")), "workers are installed")
     def test_no_worker(self):
+        if SCAN.read_bytes().startswith(b"#!"):
+            self.skipTest("a script stands in front of the program, for its sanitizer")
         shutil.copy(SCAN, self.folder / "alone")
         result = subprocess.run([self.folder / "alone", PLUGINS / EFFECT], env=self.environment(), text=True,
                                 capture_output=True, timeout=60, check=False)

@@ -11,9 +11,10 @@ if(VSTTORTURE_SANITIZE)
     file(WRITE ${sanitized_scan_folder}/options.${program} "detect_leaks=0\n")
   endforeach()
   # %b is the name of the program that reads the option. A status of 99 is none of the scan's own.
+  # What has been freed is kept back for a while, but not so much that the memory of a long scan is not flat.
   # No run has a limit of memory: the sanitizer reserves terabytes of addresses.
   file(CONFIGURE OUTPUT ${sanitized_scan_folder}/vsttorture-scan.in @ONLY CONTENT [[#!/bin/sh
-export ASAN_OPTIONS=use_sigaltstack=0:exitcode=99:include_if_exists=@sanitized_scan_folder@/options.%b
+export ASAN_OPTIONS=use_sigaltstack=0:exitcode=99:quarantine_size_mb=4:include_if_exists=@sanitized_scan_folder@/options.%b
 export LSAN_OPTIONS=suppressions=@PROJECT_SOURCE_DIR@/tests/lsan_suppressions.txt:print_suppressions=0
 export TSAN_OPTIONS=report_signal_unsafe=0:atexit_sleep_ms=0:exitcode=99
 case ${1-} in
