@@ -54,8 +54,6 @@ class Bench:
         self.scan = os.path.join(build, "vsttorture-scan")
         self.tool = os.path.join(build, "vsttorture")
         self.null_plugin = os.path.join(build, "plugins", "null_plugin.so")
-        usage = subprocess.run([self.scan, "--help"], stdout=subprocess.PIPE, text=True, check=True).stdout
-        self.fresh = ["--cache", "off"] if "--cache" in usage else []
 
     def run_bare(self, plugins):
         silent = [(os.POSIX_SPAWN_OPEN, number, "/dev/null", os.O_RDWR, 0) for number in range(3)]
@@ -64,7 +62,7 @@ class Bench:
             os.waitpid(process, 0)
 
     def run_scan(self, options, plugins):
-        process = subprocess.run([self.scan, *self.fresh, *options, "--quiet", "--no-progress", "--", *plugins],
+        process = subprocess.run([self.scan, "--cache=off", *options, "--quiet", "--no-progress", "--", *plugins],
                                  stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE,
                                  check=False)
         if process.returncode not in (0, 1):
@@ -76,7 +74,7 @@ class Bench:
 
     def modules_in(self, folders):
         """The modules that can be run here, as the scan finds them; without folders those of this machine."""
-        events = subprocess.run([self.scan, *self.fresh, "--sandbox=off", "--no-progress", "--json", "-", *folders],
+        events = subprocess.run([self.scan, "--cache=off", "--sandbox=off", "--no-progress", "--json", "-", *folders],
                                 stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, check=False).stdout
         started = [json.loads(line) for line in events.splitlines() if b'"run_started"' in line]
         return sorted({event["plugin"]["bundle"] for event in started if event["plugin"]["child"] is None})
@@ -85,7 +83,7 @@ class Bench:
     def peak_of_scan(self, options, folder):
         """Wall seconds of a scan, and the peak of its own resident memory in bytes, without that of its children."""
         begin = time.perf_counter()
-        process = subprocess.Popen([self.scan, *self.fresh, *options, "--quiet", "--no-progress", folder],
+        process = subprocess.Popen([self.scan, "--cache=off", *options, "--quiet", "--no-progress", folder],
                                    stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL)
         peak = 0
         while process.poll() is None:

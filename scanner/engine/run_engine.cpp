@@ -46,6 +46,8 @@ constexpr double kPatienceWithPipesInSeconds = 0.5;
 /// So much of the limit, used by a run that failed, is what it failed of: the allocation that would have exceeded it
 /// was refused.
 constexpr double kNearlyAllMemory = 0.875;
+/// No process can use more addresses: a limit of so many is none.
+constexpr std::uint64_t kAddressesOfAProcess = std::uint64_t{1} << 47;
 constexpr int kSandboxSignalStatus = 128;
 constexpr std::size_t kReadBlock = 64 * 1024;
 constexpr std::size_t kMostBytesOfAToolFile = std::size_t{32} << 20;
@@ -621,7 +623,9 @@ void RunEngine::Implementation::start(Queued queued) {
   process.environment = environmentFor(*run);
   process.workingDirectory = run->scratch->home();
   const std::optional<Tool>& tool = run->queued.job.tool;
-  process.addressSpaceInBytes = tool && tool->needsAddressSpace ? 0 : run->limits().memoryInBytes;
+  const std::uint64_t memory = run->limits().memoryInBytes;
+  const bool isUnlimited = memory >= kAddressesOfAProcess || (tool && tool->needsAddressSpace);
+  process.addressSpaceInBytes = isUnlimited ? 0 : memory;
   process.fileSizeInBytes = run->limits().filesInBytes;
   process.mark = mark;
   process.standardOutput = run->openOutput(run->standardOutput, false);

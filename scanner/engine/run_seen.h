@@ -64,15 +64,15 @@ struct PluginText {
 };
 
 struct LeftBehind {
-  unsigned processes = 0;  ///< That had to be killed after the run. Not known of one in a sandbox.
-  /// Those that SIGKILL did not end in time: as long as the kernel waits for a device or a file system, it ends no
-  /// process. They and the scratch folder are left as they are.
-  std::vector<int> unkillable = {};
-  std::string folder = {};         ///< The scratch folder, where it was left.
+  unsigned processes = 0;          ///< That had to be killed after the run. Not known of one in a sandbox.
   unsigned sharedMemory = 0;       ///< Segments of System V shared memory that had to be removed.
   std::vector<std::string> files;  ///< In the scratch folder, relative to it; the first 100.
   std::uint64_t fileCount = 0;
   std::uint64_t fileBytes = 0;
+  /// Processes that SIGKILL did not end in time: as long as the kernel waits for a device or a file system, it ends no
+  /// process. They and the scratch folder are left as they are.
+  std::vector<int> unkillable = {};
+  std::string folder = {};  ///< The scratch folder, where it was left.
 };
 
 struct RunSeen {
