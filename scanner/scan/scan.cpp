@@ -2,12 +2,9 @@
 #include "scanner/scan/scan.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <chrono>
 #include <csignal>
-#include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <map>
 #include <memory>
 #include <set>
@@ -15,7 +12,6 @@
 
 #include <fmt/format.h>
 #include <nlohmann/json.hpp>
-#include <sys/ioctl.h>
 #include <sys/utsname.h>
 #include <unistd.h>
 
@@ -25,6 +21,7 @@
 #include "scanner/report/terminal.h"
 #include "scanner/scan/json_stream.h"
 #include "scanner/scan/remembering.h"
+#include "scanner/scan/text_output.h"
 #include "scanner/scan/workers.h"
 
 namespace scanner {
@@ -42,52 +39,6 @@ double secondsSince1970() {
 std::string machineName() {
   utsname names = {};
   return uname(&names) == 0 ? names.nodename : "";
-}
-
-TerminalOptions terminalOptions(const ScanOptions& options, int descriptor) {
-  TerminalOptions terminal;
-  terminal.isTerminal = isatty(descriptor) != 0;
-  const char* noColour = std::getenv("NO_COLOR");
-  const char* kind = std::getenv("TERM");
-  const bool isDumb = kind != nullptr && std::strcmp(kind, "dumb") == 0;
-  terminal.hasColours = terminal.isTerminal && !isDumb && (noColour == nullptr || *noColour == '\0');
-  terminal.showsProgress = terminal.isTerminal && !isDumb && options.showsProgress;
-  terminal.isQuiet = options.isQuiet;
-  winsize size = {};
-  if (terminal.isTerminal && ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col > 0)
-    terminal.columns = size.ws_col;
-  else if (!terminal.isTerminal)
-    terminal.columns = 100;
-  return terminal;
-}
-
-/// Writes all of a text; false once that has failed.
-class TextOutput {
- public:
-  explicit TextOutput(int descriptor_) : descriptor(descriptor_) {}
-
-  bool write(const std::string& text) {
-    std::size_t written = 0;
-    while (!hasFailed && written < text.size()) {
-      const ssize_t count = ::write(descriptor, text.data() + written, text.size() - written);
-      if (count < 0 && errno == EINTR) continue;
-      if (count < 0) {
-        hasFailed = true;
-        reason = std::strerror(errno);
-      } else {
-        written += static_cast<std::size_t>(count);
-      }
-    }
-    return !hasFailed;
-  }
-
-  int descriptor;
-  bool hasFailed = false;
-  std::string reason;
-};
-
-void complain(const std::string& sentence) {
-  std::fprintf(stderr, "vsttorture-scan: %s\n", printable(sentence).c_str());
 }
 
 class Scan {
