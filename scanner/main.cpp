@@ -8,6 +8,7 @@
 
 #include "scanner/scan/history_command.h"
 #include "scanner/scan/options.h"
+#include "scanner/scan/report_command.h"
 #include "scanner/scan/scan.h"
 
 namespace {
@@ -26,6 +27,7 @@ void occupyStandardDescriptors() {
 int main(int argc, char** argv) {
   occupyStandardDescriptors();
   if (argc > 1 && std::strcmp(argv[1], "history") == 0) return scanner::historyCommand(argc, argv);
+  if (argc > 1 && std::strcmp(argv[1], "report") == 0) return scanner::reportCommand(argc - 1, argv + 1);
   int status = scanner::kScanAsWanted;
   const std::optional<scanner::ScanOptions> options = scanner::readOptions(argc, argv, status);
   return options ? scanner::scan(*options) : status;

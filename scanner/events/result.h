@@ -92,7 +92,7 @@ struct PluginResult {
   std::optional<RunSeen> seen = {};             ///< Nothing where no process was started.
   std::optional<Repetitions> repetitions = {};  ///< With --repeat.
   std::optional<Expectation> expected = {};     ///< With --expect, where a row matches.
-  bool isWanted = true;                         ///< Good, or as expected.
+  bool isWanted = true;                         ///< Good, as expected, or known from the baseline.
   std::optional<std::string> description = {};  ///< With --describe: the object that the describer printed.
   std::vector<std::string> command = {};        ///< What repeats the run.
   bool isRemembered = false;                    ///< From an earlier scan; no process was started.

@@ -14,7 +14,8 @@ namespace {
 
 constexpr const char* kDescription =
     "Tortures VST 2.x plug-ins, each in a process of its own, and says which of them fail, where and why.\n"
-    "Without a path: the folders in VST_PATH, else those in which hosts look for plug-ins.";
+    "Without a path: the folders in VST_PATH, else those in which hosts look for plug-ins.\n"
+    "vsttorture-scan report --help: reports of recorded scans.";
 
 constexpr const char* kFooter =
     "Status: 0 every plug-in as wanted, 1 not, 2 wrong use, 3 the scan could not go on, 130 interrupted.\n"
@@ -89,22 +90,16 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
   app.add_flag("--fresh", options.isFresh, "Run again what is remembered");
   app.add_option("--json", options.jsonFile, "Write each event as one line of JSON; - is standard output")
       ->type_name("FILE");
+  addReportOptions(app, options.reports, options.baselineFile);
   app.add_flag("--quiet", options.isQuiet, "No line for a plug-in that ended as it should");
   app.add_flag("--no-progress", hidesProgress, "No progress line");
   app.add_option("--workers", options.workerFolders, "Look for vsttorture-worker in this folder first")
       ->type_name("FOLDER")
       ->allow_extra_args(false);  // What follows is a path again.
 
-  try {
-    app.parse(argc, argv);
-  } catch (const CLI::ParseError& error) {
-    const bool isQuestion = error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success);
-    if (isQuestion) {
-      app.exit(error);
-    } else {
-      std::fprintf(stderr, "vsttorture-scan: %s\nvsttorture-scan --help says what there is.\n", error.what());
-    }
-    status = isQuestion ? kScanAsWanted : kScanWrongUse;
+  if (!parseCommandLine(app, argc, argv, status)) return std::nullopt;
+  if (!useStandardOutputOnce(options.jsonFile, options.reports)) {
+    status = kScanWrongUse;
     return std::nullopt;
   }
   try {
@@ -121,6 +116,38 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
                                                    : SandboxUse::kAuto;
   options.showsProgress = !hidesProgress;
   return options;
+}
+
+void addReportOptions(CLI::App& app, ReportFiles& reports, std::string& baselineFile) {
+  app.add_option("--junit", reports.junit,
+                 "Write a JUnit report, for CI systems, at the end; - is standard output")
+      ->type_name("FILE");
+  app.add_option("--baseline", baselineFile,
+                 "Only what is new compared with this record of --json is a failure")
+      ->type_name("FILE");
+}
+
+bool parseCommandLine(CLI::App& app, int argc, const char* const* argv, int& status) {
+  try {
+    app.parse(argc, argv);
+    return true;
+  } catch (const CLI::ParseError& error) {
+    const bool isQuestion = error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success);
+    if (isQuestion) {
+      app.exit(error);
+    } else {
+      std::fprintf(stderr, "vsttorture-scan: %s\n%s --help says what there is.\n", error.what(),
+                   app.get_name().c_str());
+    }
+    status = isQuestion ? kScanAsWanted : kScanWrongUse;
+    return false;
+  }
+}
+
+bool useStandardOutputOnce(const std::string& jsonFile, const ReportFiles& reports) {
+  if (jsonFile != "-" || !reports.useStandardOutput()) return true;
+  std::fprintf(stderr, "vsttorture-scan: only one report can go to standard output\n");
+  return false;
 }
 
 }  // namespace scanner

@@ -9,6 +9,11 @@
 #include "scanner/engine/run_engine.h"
 #include "scanner/explain/explainer.h"
 #include "scanner/plan/run_list.h"
+#include "scanner/scan/whole_reports.h"
+
+namespace CLI {
+class App;
+}
 
 namespace scanner {
 
@@ -33,6 +38,8 @@ struct ScanOptions {
   std::string jsonFile = {};   ///< "-" for standard output.
   std::string cacheFile = {};  ///< Where results are remembered; empty for the default, "off" for nowhere.
   bool isFresh = false;        ///< Nothing is taken from earlier scans, but all is remembered.
+  ReportFiles reports = {};
+  std::string baselineFile = {};
   bool isQuiet = false;
   bool showsProgress = true;
   std::vector<std::string> workerFolders = {};  ///< Looked into before the usual ones.
@@ -41,5 +48,14 @@ struct ScanOptions {
 /// Reads the command line. Where there is nothing to scan (--help, --version, a mistake) the options are
 /// missing, the text is printed, and `status` is what to end with.
 std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& status);
+
+/// The options that scans and `vsttorture-scan report` share.
+void addReportOptions(CLI::App& app, ReportFiles& reports, std::string& baselineFile);
+
+/// Parses; false where that is all there is to do, as with --help or a mistake, which is printed.
+bool parseCommandLine(CLI::App& app, int argc, const char* const* argv, int& status);
+
+/// False, with a sentence printed, where more than one of them is to be written to standard output.
+bool useStandardOutputOnce(const std::string& jsonFile, const ReportFiles& reports);
 
 }  // namespace scanner

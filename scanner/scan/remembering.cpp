@@ -56,7 +56,8 @@ std::string optionsThatMatter(const ScanOptions& options) {
   if (options.explain.shrinks) text += " shrink";
   if (options.explain.tool) {
     text += fmt::format(" under={}", options.explain.tool->name);
-    for (const std::string& argument : options.explain.tool->command) text += fmt::format(" \"{}\"", argument);
+    for (const std::string& argument : options.explain.tool->command)
+      text += fmt::format(" \"{}\"", argument);
     text += variable("VALGRIND_OPTS");
   }
   return text + variable("LD_LIBRARY_PATH") + variable("LD_PRELOAD");

@@ -19,9 +19,11 @@
 #include "scanner/find/find_modules.h"
 #include "scanner/plan/time_left.h"
 #include "scanner/report/terminal.h"
+#include "scanner/scan/baseline_file.h"
 #include "scanner/scan/json_stream.h"
 #include "scanner/scan/remembering.h"
 #include "scanner/scan/text_output.h"
+#include "scanner/scan/whole_reports.h"
 #include "scanner/scan/workers.h"
 
 namespace scanner {
@@ -45,9 +47,12 @@ class Scan {
  public:
   explicit Scan(const ScanOptions& options_)
       : options(options_),
-        output(options.jsonFile == "-" ? STDERR_FILENO : STDOUT_FILENO),
+        output(options.jsonFile == "-" || options.reports.useStandardOutput() ? STDERR_FILENO
+                                                                              : STDOUT_FILENO),
         terminal(terminalOptions(options, output.descriptor),
                  [this](const std::string& text) { return output.write(text); }),
+        baseline(options.baselineFile, notes),
+        wholeReports(options.reports),
         remembering(options, [this](const std::string& sentence) {
           terminal.clearProgress();
           complain(sentence);
@@ -97,7 +102,7 @@ class Scan {
     unsigned runsDone = 0;
     double earlierSeconds = 0;  ///< How long a run took in an earlier scan; 0 for unknown.
     std::optional<std::vector<Child>> children = {};  ///< Of a shell that could be described.
-    bool isStopped = false;  ///< It was interrupted, so that the result is not whole.
+    bool isStopped = false;                     ///< It was interrupted, so that the result is not whole.
     std::vector<std::string> environment = {};  ///< Of the run that speaks for it.
   };
   using Plugin = std::shared_ptr<UnderWay>;
@@ -139,8 +144,10 @@ class Scan {
                                               : "none (" + engine->whyNotSandboxed() + ")";
     started.plugins = total;
     started.notes = notes;
+    baseline.begin(found.modules, started);
     json.write(eventLine(started));
     terminal.started(started);
+    wholeReports.begin(started);
     remembering.begin(started);
   }
 
@@ -341,15 +348,19 @@ class Scan {
       result.expected = Expectation{row->verdict, row->step, row->reason, isMet};
       result.isWanted = isMet && !isFlaky;
     }
+    if (plugin != nullptr || result.isRemembered) remembering.compareWithLast(result);
+    if (plugin != nullptr && !plugin->isStopped) remembering.save(result, plugin->children);
+    // Where there is a baseline, it is what reports compare with.
+    baseline.apply(result);
     ++done;
     ++counts[rowOf(result.judgement.verdict).word];
     if (!result.isWanted) ++unwanted;
-    if (plugin != nullptr || result.isRemembered) remembering.compareWithLast(result);
-    if (plugin != nullptr && !plugin->isStopped) remembering.save(result, plugin->children);
     if (json.isOpen()) json.write(eventLine(result));
     terminal.ended(result);
+    wholeReports.add(result);
     // With nobody left to read what comes out, there is nothing to run for.
-    const bool isJsonLost = options.jsonFile.empty() || !json.problem().empty();
+    const bool isJsonLost =
+        (options.jsonFile.empty() || !json.problem().empty()) && !wholeReports.areWanted();
     if (output.hasFailed && isJsonLost && engine) engine->stop();
   }
 
@@ -378,6 +389,14 @@ class Scan {
       complain("the report could not be written: " + output.reason);
       ended.status = kScanCannotGoOn;
     }
+    for (const std::string& note : isWhole ? baseline.goneChildren() : std::vector<std::string>()) {
+      complain(note);
+      wholeReports.addNote(note);
+    }
+    for (const std::string& problem : wholeReports.finish(ended)) {
+      complain("a report could not be written: " + problem);
+      ended.status = kScanCannotGoOn;
+    }
     json.write(eventLine(ended));
     if (!json.problem().empty()) {
       complain("the results could not be written: " + json.problem());
@@ -401,12 +420,14 @@ class Scan {
   }
 
   const ScanOptions& options;
+  std::vector<std::string> notes;
   JsonStream json;
   TextOutput output;
   TerminalReport terminal;
   PluginList skipped;
   PluginList expected;
-  std::vector<std::string> notes;
+  BaselineInUse baseline;
+  WholeReports wholeReports;
   std::map<std::string, std::vector<std::string>> otherNames;
   Remembering remembering;
   TimeLeft timeLeft;
