@@ -266,6 +266,12 @@ void RunEngine::Implementation::ActiveRun::received(const Output& output, std::s
   seen.outputBytes += bytes.size();
   if (seen.outputBytes > limits().outputInBytes) {
     hit(LimitHit::kOutput);
+    // It may take a moment to end, and print all the while.
+    for (Output* one : {&standardOutput, &standardError}) {
+      if (!one->isOpen || one->endedAt > 0) continue;
+      one->endedAt = monotonicSeconds();
+      uv_read_stop(reinterpret_cast<uv_stream_t*>(&one->pipe));
+    }
     return;
   }
   if (output.isStandardError) {

@@ -53,28 +53,37 @@ unsigned openSockets(int process) {
 
 void adoptOrphans() { prctl(PR_SET_CHILD_SUBREAPER, 1); }
 
+namespace {
+
+bool isIn(const std::vector<int>& processes, int process) {
+  return std::find(processes.begin(), processes.end(), process) != processes.end();
+}
+
+/// Reaps an orphan that has ended; kills any other with all of its descendants.
+void endOrphan(int orphan, const Marks& marks, Orphans& orphans) {
+  if (const std::optional<ProcessEnd> ended = reapIfEnded(orphan)) {
+    addUsage(orphans.used, *ended);
+    return;
+  }
+  orphans.left.push_back(orphan);
+  std::vector<int> family = descendantsOf(orphan);
+  family.push_back(orphan);
+  for (const int process : family) {
+    if (killIfMarked(process, marks) && !isIn(orphans.killed, process)) orphans.killed.push_back(process);
+  }
+}
+
+}  // namespace
+
 Orphans killOrphans(const Marks& marks, const std::vector<int>& living) {
   Orphans orphans;
-  std::vector<int>& killed = orphans.killed;
-  const auto isIn = [](const std::vector<int>& processes, int process) {
-    return std::find(processes.begin(), processes.end(), process) != processes.end();
-  };
   // A process that is killed may have started another one just before, and takes a moment to end.
   for (const auto end = std::chrono::steady_clock::now() + kPatience;;) {
     orphans.left.clear();
     for (const int child : childrenOf(getpid())) {
       if (isIn(living, child)) continue;
       const Mark mark = markOf(child);
-      if (mark < marks.first || mark > marks.last) continue;
-      if (const std::optional<ProcessEnd> ended = reapIfEnded(child)) {
-        addUsage(orphans.used, *ended);
-        continue;
-      }
-      orphans.left.push_back(child);
-      for (const int process : descendantsOf(child)) {
-        if (killIfMarked(process, marks) && !isIn(killed, process)) killed.push_back(process);
-      }
-      if (killIfMarked(child, marks) && !isIn(killed, child)) killed.push_back(child);
+      if (mark >= marks.first && mark <= marks.last) endOrphan(child, marks, orphans);
     }
     if (orphans.left.empty() || std::chrono::steady_clock::now() > end) break;
     usleep(kRoundInMicroseconds);

@@ -33,6 +33,7 @@ void takeDefaultSignals() {
 
 std::vector<char*> pointersTo(const std::vector<std::string>& texts) {
   std::vector<char*> pointers;
+  pointers.reserve(texts.size() + 1);
   for (const std::string& text : texts) pointers.push_back(const_cast<char*>(text.c_str()));
   pointers.push_back(nullptr);
   return pointers;
@@ -65,6 +66,7 @@ rlimit& usualDescriptorLimit() {
   if (start.fileSizeInBytes > 0) limit(RLIMIT_FSIZE, start.fileSizeInBytes);
   if (chdir(start.workingDirectory.c_str()) == 0) execve(command[0], command, environment);
   const int error = errno;
+  // NOLINTNEXTLINE(clang-analyzer-unix.Vfork): a system call that changes no memory of the parent's
   [[maybe_unused]] const ssize_t written = write(failure, &error, sizeof error);
   _exit(127);
 }

@@ -15,7 +15,8 @@ std::string pathOf(const std::string& program) {
   const char* path = std::getenv("PATH");
   std::istringstream folders(path == nullptr ? "/usr/bin:/bin" : path);
   for (std::string folder; std::getline(folders, folder, ':');) {
-    const std::string file = folder + "/" + program;
+    std::string file = folder;
+    file.append("/").append(program);
     if (!folder.empty() && access(file.c_str(), X_OK) == 0) return file;
   }
   return {};

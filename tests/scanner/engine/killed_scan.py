@@ -20,7 +20,8 @@ import tempfile
 import time
 
 SECONDS_TO_CLEAN_UP = 1.0
-LONGEST_LIFE_IN_SECONDS = 0.4
+LEAST_LONGEST_LIFE_IN_SECONDS = 0.4
+LONGEST_LIFE_IN_STARTS = 2  # With a sanitizer, or on a busy machine, a start takes longer.
 UNRULY = ["fork", "fork_in_own_session", "fork_twice", "fork_twice_without_environment", "ignore_termination", "burn"]
 
 
@@ -43,7 +44,23 @@ def problems_after_kill(world, token):
     return problems
 
 
-def kill_once(scan, world, token, draw):
+def seconds_of_a_start(scan, world):
+    """How long a scan takes until it has written its first event."""
+    events = world / "events"
+    begin = time.monotonic()
+    process = subprocess.Popen(
+        [scan, "--no-progress", "--sandbox=auto", "--json", str(events),
+         str(world / "plugins" / "01_well_behaved_effect.so")],
+        env=dict(os.environ, TMPDIR=str(world / "tmp")), stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+        stderr=subprocess.DEVNULL)
+    while process.poll() is None and not (events.exists() and events.stat().st_size):
+        time.sleep(0.005)
+    seconds = time.monotonic() - begin
+    process.wait()
+    return seconds
+
+
+def kill_once(scan, world, token, draw, longest_life):
     """Starts a scan, kills it, and returns what is wrong a second later."""
     events = world / "events"
     events.unlink(missing_ok=True)
@@ -52,7 +69,7 @@ def kill_once(scan, world, token, draw):
     process = subprocess.Popen(
         [scan, "-j", "4", "--no-progress", f"--sandbox={sandbox}", "--json", str(events), str(world / "plugins")],
         env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
-    time.sleep(draw.random() * LONGEST_LIFE_IN_SECONDS)
+    time.sleep(draw.random() * longest_life)
     process.kill()
     process.wait()
     end = time.monotonic() + SECONDS_TO_CLEAN_UP
@@ -87,8 +104,10 @@ def main():
         for number in range(30):
             name = "unruly" if number % 3 == 0 else "well_behaved_effect"
             shutil.copy(arguments.plugins / f"{name}.so", world / "plugins" / f"{number:02}_{name}.so")
+        scan = os.path.abspath(arguments.scan)
+        longest_life = max(LEAST_LONGEST_LIFE_IN_SECONDS, LONGEST_LIFE_IN_STARTS * seconds_of_a_start(scan, world))
         for number in range(arguments.times):
-            found, written = kill_once(os.path.abspath(arguments.scan), world, f"{world.name}-{number}", draw)
+            found, written = kill_once(scan, world, f"{world.name}-{number}", draw, longest_life)
             begun += written > 0
             problems += [f"kill {number}: {problem}" for problem in found]
     for problem in problems:
