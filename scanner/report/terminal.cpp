@@ -59,13 +59,20 @@ std::string secondsInWords(double seconds) {
   return fmt::format("{:.1f} h", seconds / 3600);
 }
 
+bool isGoodWord(const std::string& word) {
+  const std::vector<VerdictRow>& rows = verdictTable();
+  return std::any_of(rows.begin(), rows.end(),
+                     [&](const VerdictRow& row) { return row.isGood && word == row.word; });
+}
+
 /// What has changed since the last scan, in a sentence; empty for nothing.
 std::string changeInWords(const PluginResult& result) {
   if (!result.comparison || result.judgement.verdict == Verdict::kNotRun) return {};
   const std::optional<Comparison::Earlier>& earlier = result.comparison->earlier;
-  const std::string before = !earlier        ? std::string()
-                             : earlier->step ? fmt::format("{} at {}", earlier->verdict, *earlier->step)
-                                             : earlier->verdict;
+  const std::string before = !earlier ? std::string()
+                             : earlier->step && !isGoodWord(earlier->verdict)
+                                 ? fmt::format("{} at {}", earlier->verdict, *earlier->step)
+                                 : earlier->verdict;
   switch (result.comparison->change) {
     case Comparison::Change::kNew:
       return earlier ? "new: it was \"" + before + "\" before" : "new: it was not there before";

@@ -6,7 +6,6 @@
 The tests of the class Events also check each event against docs/schema/, with the Python package jsonschema. When
 these alone are asked for and the package is missing, the status is 77.
 """
-import argparse
 import json
 import os
 import pathlib
@@ -16,9 +15,11 @@ import shutil
 import signal
 import subprocess
 import sys
-import tempfile
 import time
 import unittest
+
+import scan_test_case
+from scan_test_case import EFFECT, PLAIN, ROOT, ScanTest
 
 try:
     import jsonschema
@@ -26,71 +27,9 @@ except ImportError:
     jsonschema = None
 
 NOTHING_TO_CHECK_WITH = 77
-ROOT = pathlib.Path(__file__).resolve().parent.parent.parent
 SCHEMAS = ROOT / "docs/schema"
 SCAN = PLUGINS = None  # From the command line.
-EFFECT = "well_behaved_effect.so"
-PLAIN = ["--cache", "off", "--sandbox", "off"]
 SET_SAMPLE_RATE = "dispatch:10"
-
-
-class ScanTest(unittest.TestCase):
-    def setUp(self):
-        folder = tempfile.TemporaryDirectory(prefix="vsttorture-scan-test-")
-        self.addCleanup(folder.cleanup)
-        self.folder = pathlib.Path(folder.name)
-        (self.folder / "home").mkdir()
-
-    def environment(self, **more):
-        return {"HOME": str(self.folder / "home"), "PATH": "/usr/bin:/bin", "LC_ALL": "C",
-                "TMPDIR": str(self.folder), **more}
-
-    def scan(self, *arguments, environment=None, sandbox="off", cache="off", **more):
-        """One scan: its status, standard output and standard error. Nothing is remembered unless `cache` names a
-        file, or is None for the default one, which is in a home of the test's own."""
-        if sandbox:
-            arguments = ["--sandbox", sandbox, *arguments]
-        if cache:
-            arguments = ["--cache", cache, *arguments]
-        more.setdefault("stdout", subprocess.PIPE)
-        more.setdefault("cwd", self.folder)
-        return subprocess.run([SCAN, *map(str, arguments)], env=self.environment(**(environment or {})),
-                              stdin=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True, errors="surrogateescape",
-                              timeout=120, check=False, **more)
-
-    def events(self, *arguments, status=None, **more):
-        """The events of one scan."""
-        result = self.scan("--json", "-", *arguments, **more)
-        if status is not None:
-            self.assertEqual(result.returncode, status, result.stderr)
-        return [json.loads(line) for line in result.stdout.split("\n")[:-1]]
-
-    def results(self, *arguments, **more):
-        """{name: plugin_ended}, the name being that of the file, with #CHILD."""
-        results = {}
-        for event in self.events(*arguments, **more):
-            if event["event"] == "plugin_ended":
-                child = event["plugin"]["child"]
-                name = os.path.basename(event["plugin"]["bundle"]) + (f"#{child}" if child is not None else "")
-                self.assertNotIn(name, results)
-                results[name] = event
-        return results
-
-    def verdicts(self, *arguments, **more):
-        return {name: event["verdict"] for name, event in self.results(*arguments, **more).items()}
-
-    def write(self, name, text):
-        path = self.folder / name
-        path.write_text(text)
-        return path
-
-    def copies(self, count):
-        """A folder with copies of the effect, each a file of its own."""
-        folder = self.folder / "copies"
-        folder.mkdir()
-        for number in range(count):
-            shutil.copy(PLUGINS / EFFECT, folder / f"{number:03}.so")
-        return folder
 
 
 class Surroundings(ScanTest):
@@ -101,7 +40,7 @@ class Surroundings(ScanTest):
 
     def test_two_scans_at_once_are_told_apart(self):
         folder = self.copies(20)
-        arguments = [SCAN, "--sandbox=off", "-j", "4", "--no-progress", "--json", "-", folder]
+        arguments = [SCAN, *PLAIN, "-j", "4", "--no-progress", "--json", "-", folder]
         scans = [subprocess.Popen(arguments, env=self.environment(), stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
                                   stderr=subprocess.DEVNULL) for _ in range(2)]
         for scan in scans:
@@ -544,11 +483,8 @@ class Events(ScanTest):
 
 def main():
     global SCAN, PLUGINS
-    parser = argparse.ArgumentParser()
-    parser.add_argument("--scan", required=True, type=pathlib.Path)
-    parser.add_argument("--plugins", required=True, type=pathlib.Path)
-    options, rest = parser.parse_known_args()
-    SCAN, PLUGINS = options.scan.resolve(), options.plugins.resolve()
+    rest = scan_test_case.read_arguments(sys.argv[1:])
+    SCAN, PLUGINS = scan_test_case.SCAN, scan_test_case.PLUGINS
     if jsonschema is None and rest == ["Events"]:
         print("the Python package jsonschema is not installed")
         return NOTHING_TO_CHECK_WITH

@@ -1,12 +1,13 @@
 # SPDX-License-Identifier: MIT
-"""Kills vsttorture-scan with SIGKILL at random moments: nothing of it may be left a second later.
+"""Kills vsttorture-scan with SIGKILL at random moments: nothing of it may be left a second later but its results.
 
     killed_scan.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--times 15] [--seed N]
 
 Each scan runs plug-ins that pass, that never end, and that leave processes with sessions of their own behind, some of
 them without any environment. A second after the kill there must be no process that has run since with one of their
-names, no scratch folder, and the file of events must end at a whole line. Prints the seed first, so that the same
-moments can be had again.
+names, no scratch folder, and the file of events must end at a whole line. The database must be whole, and the next
+scan must remember each result that was reported, and run the others. Prints the seed first, so that the same moments
+can be had again.
 """
 import argparse
 import json
@@ -14,6 +15,7 @@ import os
 import pathlib
 import random
 import shutil
+import sqlite3
 import subprocess
 import sys
 import tempfile
@@ -22,6 +24,8 @@ import time
 SECONDS_TO_CLEAN_UP = 1.0
 LEAST_LONGEST_LIFE_IN_SECONDS = 0.4
 LONGEST_LIFE_IN_STARTS = 2  # With a sanitizer, or on a busy machine, a start takes longer.
+PLUGINS = 30
+JOBS = 4
 UNRULY = ["fork", "fork_in_own_session", "fork_twice", "fork_twice_without_environment", "ignore_termination", "burn"]
 
 
@@ -49,7 +53,7 @@ def seconds_of_a_start(scan, world):
     events = world / "events"
     begin = time.monotonic()
     process = subprocess.Popen(
-        [scan, "--no-progress", "--sandbox=auto", "--json", str(events),
+        [scan, "--no-progress", "--cache=off", "--sandbox=auto", "--json", str(events),
          str(world / "plugins" / "01_well_behaved_effect.so")],
         env=dict(os.environ, TMPDIR=str(world / "tmp")), stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
         stderr=subprocess.DEVNULL)
@@ -60,30 +64,73 @@ def seconds_of_a_start(scan, world):
     return seconds
 
 
+def results_in(events):
+    """{bundle: whether it was remembered}, and what is wrong with the lines."""
+    written = events.read_bytes() if events.exists() else b""
+    results, problems = {}, []
+    for line in written.splitlines(keepends=True):
+        try:
+            event = json.loads(line)
+        except ValueError:
+            problems.append(f"no whole event: {line!r}")
+            continue
+        if event["event"] == "plugin_ended":
+            results[event["plugin"]["bundle"]] = event["isRemembered"]
+    if written and not written.endswith(b"\n"):
+        problems.append("the events do not end at a whole line")
+    return results, problems
+
+
+def problems_of_database(file):
+    if not file.exists():
+        return []  # Killed before it was made.
+    try:
+        database = sqlite3.connect(file)
+        found = database.execute("PRAGMA integrity_check").fetchall()
+        database.close()
+    except sqlite3.Error as error:
+        return [f"the database: {error}"]
+    return [] if found == [("ok",)] else [f"the database: {found}"]
+
+
+def problems_of_next_scan(command, environment, events, known):
+    """A scan to its end: it must take what is known from the database, and run the rest."""
+    ended = subprocess.run(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+                           stderr=subprocess.PIPE, timeout=120, check=False)
+    results, problems = results_in(events)
+    if ended.returncode not in (0, 1) or ended.stderr:
+        problems.append(f"the next scan ended with {ended.returncode}: {ended.stderr!r}")
+    if len(results) != PLUGINS:
+        problems.append(f"the next scan has {len(results)} results")
+    problems += [f"not remembered: {bundle}" for bundle in known if not results.get(bundle)]
+    # One more may have been saved, and not been reported, for each that can end at a time.
+    if sum(results.values()) > len(known) + JOBS:
+        problems.append(f"{sum(results.values())} remembered after {len(known)} results")
+    return problems
+
+
 def kill_once(scan, world, token, draw, longest_life):
-    """Starts a scan, kills it, and returns what is wrong a second later."""
-    events = world / "events"
+    """Starts a scan, kills it, and returns what is wrong a second later, and how many results there were."""
+    events, database = world / "events", world / "cache/results.sqlite"
     events.unlink(missing_ok=True)
+    shutil.rmtree(database.parent, ignore_errors=True)
     environment = dict(os.environ, TMPDIR=str(world / "tmp"), UNRULY=draw.choice(UNRULY), UNRULY_TOKEN=token)
     sandbox = draw.choice(["off", "off", "auto"])
-    process = subprocess.Popen(
-        [scan, "-j", "4", "--no-progress", f"--sandbox={sandbox}", "--json", str(events), str(world / "plugins")],
-        env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL, stderr=subprocess.DEVNULL)
+    command = [scan, "-j", str(JOBS), "--no-progress", "--step-limit=0.3", f"--sandbox={sandbox}",
+               "--cache", str(database), "--json", str(events), str(world / "plugins")]
+    process = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+                               stderr=subprocess.DEVNULL)
     time.sleep(draw.random() * longest_life)
     process.kill()
     process.wait()
     end = time.monotonic() + SECONDS_TO_CLEAN_UP
     while (problems := problems_after_kill(world, token)) and time.monotonic() < end:
         time.sleep(0.02)
-    written = events.read_bytes() if events.exists() else b""
-    for line in written.splitlines(keepends=True):
-        try:
-            json.loads(line)
-        except ValueError:
-            problems.append(f"no whole event: {line!r}")
-    if written and not written.endswith(b"\n"):
-        problems.append("the events do not end at a whole line")
-    return [f"{environment['UNRULY']}, sandbox {sandbox}: {problem}" for problem in problems], len(written)
+    begun = events.exists()
+    known, found = results_in(events)
+    problems += found + problems_of_database(database)
+    problems += problems_of_next_scan(command, environment, events, known)
+    return [f"{environment['UNRULY']}, sandbox {sandbox}: {problem}" for problem in problems], begun, len(known)
 
 
 def main():
@@ -96,23 +143,25 @@ def main():
     print(f"seed {arguments.seed}", flush=True)
     draw = random.Random(arguments.seed)
     problems = []
-    begun = 0
+    begun = in_the_middle = 0
     with tempfile.TemporaryDirectory(prefix="killed-scan-") as folder:
         world = pathlib.Path(folder)
         (world / "tmp").mkdir()
         (world / "plugins").mkdir()
-        for number in range(30):
+        for number in range(PLUGINS):
             name = "unruly" if number % 3 == 0 else "well_behaved_effect"
             shutil.copy(arguments.plugins / f"{name}.so", world / "plugins" / f"{number:02}_{name}.so")
         scan = os.path.abspath(arguments.scan)
         longest_life = max(LEAST_LONGEST_LIFE_IN_SECONDS, LONGEST_LIFE_IN_STARTS * seconds_of_a_start(scan, world))
         for number in range(arguments.times):
-            found, written = kill_once(scan, world, f"{world.name}-{number}", draw, longest_life)
-            begun += written > 0
+            found, has_begun, known = kill_once(scan, world, f"{world.name}-{number}", draw, longest_life)
+            begun += has_begun
+            in_the_middle += 0 < known < PLUGINS
             problems += [f"kill {number}: {problem}" for problem in found]
     for problem in problems:
         print(problem)
-    print(f"{arguments.times} kills, {begun} of them after the scan had begun, {len(problems)} problems")
+    print(f"{arguments.times} kills, {begun} of them after the scan had begun, {in_the_middle} between two "
+          f"results, {len(problems)} problems")
     # If every kill came before anything ran, nothing was tested.
     return 1 if problems or begun < arguments.times / 4 else 0
 

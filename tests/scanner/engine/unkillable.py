@@ -75,8 +75,8 @@ def main():
         shutil.copy(arguments.plugins / "unruly.so", plugin)
         for number in range(1, 7):
             shutil.copy(arguments.plugins / "well_behaved_effect.so", world / "plugins" / f"{number}.so")
-        command = [arguments.scan.resolve(), "-j", "2", "--step-limit", "3", "--no-progress", "--json", "-",
-                   *arguments.options, world / "plugins"]
+        command = [arguments.scan.resolve(), "-j", "2", "--step-limit", "3", "--cache=off", "--no-progress",
+                   "--json", "-", *arguments.options, world / "plugins"]
         environment = dict(os.environ, TMPDIR=str(world / "tmp"), UNRULY="ignore_termination")
         scan = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
                                 stderr=subprocess.DEVNULL)
