@@ -27,9 +27,7 @@ class UsesFreshMemory : public SamplePlugin {
   }
 
  private:
-  static Description describe() {
-    return {"Uses fresh memory", fourCharacterCode('U', 's', 'F', 'M')};
-  }
+  static Description describe() { return {"Uses fresh memory", fourCharacterCode('U', 's', 'F', 'M')}; }
 
   __attribute__((noinline)) void lookAtTheBlock() const {
     volatile int* volatile nowhere = nullptr;

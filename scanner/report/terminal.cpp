@@ -161,7 +161,7 @@ void TerminalReport::ended(const PluginResult& result) {
   if (isGood && result.diagnosis && result.diagnosis->hasFindings())
     remark = "  with findings of " + printable(result.diagnosis->tool);
   if (result.isRemembered) remark += "  (remembered)";
-  if (columnsOf(name) + remark.size() > room) remark.clear();
+  if (options.isTerminal && columnsOf(name) + remark.size() > room) remark.clear();
   print(coloured(line, result.judgement.verdict, result.isWanted && !isFlaky) + time +
         shortened(name, options.isTerminal ? room : name.size()) + remark + "\n");
 }

@@ -119,8 +119,8 @@ PluginResult fullResult() {
   result.command = {"/usr/lib/vsttorture-worker", "it's"};
   result.isRemembered = true;
   result.comparison = Comparison{Comparison::Change::kStillFailing, Comparison::Earlier{"crashed", 5, 1.25}};
-  result.diagnosis =
-      Diagnosis{"memcheck", {"valgrind"}, {{"InvalidRead", "of size 4", {"f (a.c:1)", "b.so+0x1"}, false}}, "", "r"};
+  result.diagnosis = Diagnosis{
+      "memcheck", {"valgrind"}, {{"InvalidRead", "of size 4", {"f (a.c:1)", "b.so+0x1"}, false}}, "", "r"};
   result.shrunk = Shrunk{"0,3,3,1", "3", 7, true, {"worker", "--tests", "3"}, "why"};
   return result;
 }

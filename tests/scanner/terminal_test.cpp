@@ -138,7 +138,7 @@ TEST(TerminalReport, FitsInto40ColumnsButForCommands) {
 }
 
 TEST(TerminalReport, ShowsWhatAToolFoundInAPluginThatPassed) {
-  Terminal terminal(60);
+  Terminal terminal(70);
   PluginResult one = result(Verdict::kPassed, "/lib/vst/a.so");
   one.isWanted = false;
   one.diagnosis.emplace();
@@ -165,7 +165,7 @@ passed  /lib/vst/a.so
     c
     d
   memcheck, not in the plug-in: Use
-    clearsAVeryLargeB...LengthThatWasNeverSet (file.cpp:123)
+    clearsAVeryLargeBlock...oryByALengthThatWasNeverSet (file.cpp:123)
   memcheck: Use
   memcheck: 1 more of them
   memcheck: memcheck was ended before the run was
