@@ -17,6 +17,8 @@ import sys
 import tempfile
 
 SOURCE = pathlib.Path(__file__).resolve().parents[2]
+sys.path.insert(0, str(SOURCE / "tests" / "shared"))
+import page_commands  # noqa: E402
 PAGE = SOURCE / "docs" / "WHEN_A_PLUGIN_FAILS.md"
 LIMIT_IN_SECONDS = 120
 NOTHING_TO_RUN = 77
@@ -49,10 +51,10 @@ RECIPES = {
 
 def commands_of_the_page():
     """{heading: its commands}, without headings that have none."""
-    sections = re.findall(r"^## (.+)\n((?:(?!## ).*\n?)*)", PAGE.read_text(), re.MULTILINE)
-    commands = {heading: "".join(re.findall(r"^```sh\n(.*?)^```$", text, re.MULTILINE | re.DOTALL))
-                for heading, text in sections}
-    return {heading: text for heading, text in commands.items() if text}
+    found = collections.defaultdict(str)
+    for command in page_commands.commands(PAGE):
+        found[command.heading] += command.text
+    return dict(found)
 
 
 def plugin_source():

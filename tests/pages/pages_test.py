@@ -1,0 +1,148 @@
+# SPDX-License-Identifier: MIT
+"""Types what docs/BREAKS_MY_SESSION.md, docs/IN_YOUR_CI.md and docs/IN_YOUR_HOST.md tell their readers to type, and
+compares what is seen with what the pages show.
+
+    pages_test.py --build build/release PAGE...
+
+The reader's machine is a folder: a home with sample plug-ins, and the programs in its path. Times, dates, offsets and
+the number of processors may differ from what the page shows, and lines may be broken elsewhere. Every block of a page
+is run, except for the commands in NOT_RUN. Exits with 77 when a program that the page needs is missing, or with 1 if
+VSTTORTURE_DEBUGGERS=required is in the environment.
+"""
+import argparse
+import os
+import pathlib
+import re
+import shutil
+import subprocess
+import sys
+import tempfile
+
+SOURCE = pathlib.Path(__file__).resolve().parents[2]
+sys.path.insert(0, str(SOURCE / "tests" / "shared"))
+import page_commands  # noqa: E402
+
+NOTHING_TO_RUN = 77
+LIMIT_IN_SECONDS = 300
+PROGRAMS = ["vsttorture", "vsttorture-worker", "vsttorture-describe", "vsttorture-scan"]
+MARK = "\x1e"
+
+# What cannot be run here, and what is tested in its place.
+NOT_RUN = {
+}
+
+
+class World:
+    """A machine of one reader. Its folder is the root of what the reader sees."""
+
+    def __init__(self, folder, build):
+        self.folder, self.build = pathlib.Path(folder), pathlib.Path(build).resolve()
+        self.home = self.folder / "home/me"
+        self.plugins = self.home / ".vst"
+        self.plugins.mkdir(parents=True)
+        (self.folder / "tmp").mkdir()
+        (self.folder / "usr/bin").mkdir(parents=True)
+        for program in PROGRAMS:
+            (self.folder / "usr/bin" / program).symlink_to(self.build / program)
+
+    def put(self, sample, path):
+        """A copy of a sample plug-in, at this path in the home."""
+        path = self.home / path
+        path.parent.mkdir(parents=True, exist_ok=True)
+        shutil.copy(self.build / "plugins" / sample, path)
+
+    def environment(self):
+        # faulty.so crashes while it is bypassed; the other plug-ins do not look at these variables.
+        return {"HOME": str(self.home), "VST_PATH": str(self.plugins), "TMPDIR": str(self.folder / "tmp"),
+                "PATH": f"{self.folder}/usr/bin:/usr/bin:/bin", "LC_ALL": "C.UTF-8", "USER": "me",
+                "FAULT_KIND": "null_store", "FAULT_PLACE": "dispatch:44"}
+
+    def run(self, commands):
+        """[(output, status)], of the commands typed one after the other into one shell."""
+        script = "".join(f"{command.text}\nstatus_of_page=$?; printf '{MARK}%d{MARK}' $status_of_page; (exit $status_of_page)\n" for command in commands)
+        # One processor: plug-ins then end in the same order each time.
+        done = subprocess.run(["taskset", "--cpu-list", str(min(os.sched_getaffinity(0))), "bash", "-c", script],
+                              cwd=self.home, env=self.environment(), text=True, errors="replace",
+                              stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.STDOUT,
+                              timeout=LIMIT_IN_SECONDS, check=False)
+        parts = done.stdout.split(MARK)
+        seen = [(self.as_the_reader_sees(output), int(status)) for output, status in zip(parts[::2], parts[1::2])]
+        assert len(seen) == len(commands), f"the shell ended early:\n{done.stdout}"
+        return seen
+
+    def as_the_reader_sees(self, output):
+        for path, name in [(self.build, "/usr/bin"), (self.folder, "")]:
+            output = output.replace(str(path), name)
+        return output
+
+
+def musician(world):
+    world.put("well_behaved_effect.so", ".vst/chorus.so")
+    world.put("faulty.so", ".vst/delay.so")
+    world.put("well_behaved_instrument.so", ".vst/organ.so")
+    world.put("shell.so", ".vst/rack.so")
+
+
+def maker_of_a_host(world):
+    musician(world)
+    (world.home / "examples").symlink_to(SOURCE / "docs/examples")
+
+
+# page: what is on the reader's machine, and the programs that the page needs.
+PAGES = {
+    "BREAKS_MY_SESSION": (musician, []),
+    "IN_YOUR_HOST": (maker_of_a_host, ["c++", "jq", "sqlite3"]),
+}
+
+VARIABLE = [(r"\b\d+(\.\d+)? (s|ms|min)\b", "# s"), (r"\+0x[0-9a-f]+", "+0x#"), (r"\b\d{4}-\d\d-\d\d\b", "DATE"),
+            (r"\b\d\d:\d\d(:\d\d)?\b", "TIME"), (r"\b\d+ at a time", "# at a time"),
+            (r"sandbox: (bubblewrap|none( \([^)]*\))?)", "sandbox: #")]
+
+
+def comparable(text):
+    text = " ".join(text.split())
+    for pattern, instead in VARIABLE:
+        text = re.sub(pattern, instead, text)
+    return text
+
+
+def is_as_shown(shown, output):
+    """Whether the output is what the page shows; each of its lines "..." stands for any number of lines."""
+    parts = [comparable(part) for part in re.split(r"^\.\.\.$", shown, flags=re.MULTILINE)]
+    pattern = ".*".join(re.escape(part) for part in parts)
+    return re.fullmatch(pattern.replace(r"\ .*", r"\ ?.*"), comparable(output), re.DOTALL) is not None
+
+
+def problems(page, world, prepare):
+    commands = [command for command in page_commands.commands(SOURCE / "docs" / f"{page}.md")
+                if command.text not in NOT_RUN]
+    assert commands, page
+    prepare(world)
+    for command, (output, status) in zip(commands, world.run(commands)):
+        if command.shown is not None and not is_as_shown(command.shown, output):
+            yield f"{page}, {command.heading}: $ {command.text}\nthe page shows\n{command.shown}\nseen is\n{output}"
+        if command.shown is None and status != 0:
+            yield f"{page}, {command.heading}: status {status} of\n{command.text}\n{output}"
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--build", required=True)
+    parser.add_argument("pages", nargs="+", metavar="PAGE", choices=PAGES)
+    options = parser.parse_args()
+    failed = False
+    for page in options.pages:
+        prepare, tools = PAGES[page]
+        missing = [tool for tool in tools if not shutil.which(tool)]
+        if missing:
+            print(f"left out: {page} needs {' and '.join(missing)}")
+            return 1 if os.environ.get("VSTTORTURE_DEBUGGERS") == "required" else NOTHING_TO_RUN
+        with tempfile.TemporaryDirectory(prefix="vsttorture-page-") as folder:
+            for problem in problems(page, World(folder, options.build), prepare):
+                print(problem, end="\n\n")
+                failed = True
+    return 1 if failed else 0
+
+
+if __name__ == "__main__":
+    sys.exit(main())
