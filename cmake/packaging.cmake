@@ -23,7 +23,15 @@ install(PROGRAMS docs/examples/try_plugin.py docs/examples/explain_plugin.py
 if(TARGET vsttorture-scan)
   install(TARGETS vsttorture-scan RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT vsttorture)
   install(FILES docs/vsttorture-scan.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT vsttorture)
-  install(FILES docs/VERDICTS.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT vsttorture)
+  install(FILES docs/VERDICTS.md docs/BREAKS_MY_SESSION.md docs/IN_YOUR_CI.md docs/IN_YOUR_HOST.md
+          DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT vsttorture)
+  install(FILES docs/examples/read_scan.cpp DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)
+  install(PROGRAMS docs/examples/read_scan.py DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)
+  install(PROGRAMS docs/examples/ci/torture.sh DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples/ci COMPONENT vsttorture)
+  install(FILES docs/examples/ci/github-workflow.yml docs/examples/ci/gitlab-ci.yml
+          DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples/ci COMPONENT vsttorture)
+  install(PROGRAMS docs/examples/many_machines/scan_array.sh docs/examples/many_machines/scan_on_hosts.sh
+          DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples/many_machines COMPONENT vsttorture)
   install(FILES docs/schema/scan-events.schema.json DESTINATION ${CMAKE_INSTALL_DOCDIR}/schema COMPONENT vsttorture)
   install(FILES completions/vsttorture-scan.bash DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
           RENAME vsttorture-scan COMPONENT vsttorture)

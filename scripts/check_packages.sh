@@ -131,7 +131,19 @@ Recommends: bubblewrap"
 drwxr-xr-x root/root ./usr/share/bash-completion/
 drwxr-xr-x root/root ./usr/share/bash-completion/completions/
 -rw-r--r-- root/root ./usr/share/bash-completion/completions/vsttorture-scan
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/BREAKS_MY_SESSION.md
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/IN_YOUR_CI.md
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/IN_YOUR_HOST.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/VERDICTS.md
+drwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/ci/
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/examples/ci/github-workflow.yml
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/examples/ci/gitlab-ci.yml
+-rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/ci/torture.sh
+drwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/many_machines/
+-rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/many_machines/scan_array.sh
+-rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/many_machines/scan_on_hosts.sh
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/examples/read_scan.cpp
+-rwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/read_scan.py
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/schema/scan-events.schema.json
 -rw-r--r-- root/root ./usr/share/man/man1/vsttorture-scan.1.gz
 "

@@ -36,7 +36,10 @@ COPIES = {
 SCAN_PROGRAM = "bin/vsttorture-scan"
 COPIES_FOR_SCAN = {
     "share/bash-completion/completions/vsttorture-scan": "completions/vsttorture-scan.bash",
-    "share/doc/vsttorture/VERDICTS.md": "docs/VERDICTS.md",
+    **{f"share/doc/vsttorture/{name}": f"docs/{name}" for name in (
+        "BREAKS_MY_SESSION.md", "IN_YOUR_CI.md", "IN_YOUR_HOST.md", "VERDICTS.md", "examples/ci/github-workflow.yml",
+        "examples/ci/gitlab-ci.yml", "examples/ci/torture.sh", "examples/many_machines/scan_array.sh",
+        "examples/many_machines/scan_on_hosts.sh", "examples/read_scan.cpp", "examples/read_scan.py")},
     "share/doc/vsttorture/schema/scan-events.schema.json": "docs/schema/scan-events.schema.json",
     "share/man/man1/vsttorture-scan.1": "docs/vsttorture-scan.1",
 }
@@ -61,9 +64,7 @@ class Install(unittest.TestCase):
                  for path in root.rglob("*") if not path.is_dir()}
         copies = {**COPIES, **(COPIES_FOR_SCAN if has_scan else {})}
         programs = PROGRAMS + ([SCAN_PROGRAM] if has_scan else [])
-        executable = {*programs, "share/doc/vsttorture/examples/explain_plugin.py",
-                      "share/doc/vsttorture/examples/try_plugin.py"}
-        self.assertEqual(found, {f"{prefix}{name}": 0o755 if name in executable else 0o644
+        self.assertEqual(found, {f"{prefix}{name}": 0o755 if self.is_executable(name) else 0o644
                                  for name in [*programs, *copies]})
         for name, source in copies.items():
             self.assertEqual((root / f"{prefix}{name}").read_bytes(), (SOURCE / source).read_bytes())
@@ -77,6 +78,9 @@ class Install(unittest.TestCase):
             run = self.run_on_sample_plugin(root / f"{prefix}{SCAN_PROGRAM}")
             self.assertEqual((run.returncode, run.stdout.splitlines()[-1].split(", in ")[0]),
                              (0, "1 result: 1 passed"))
+
+    def is_executable(self, name):
+        return name.startswith("bin/") or ("/examples/" in name and name.endswith((".py", ".sh")))
 
     def run_on_sample_plugin(self, program):
         return subprocess.run([program, sample_plugin], stdout=subprocess.PIPE, text=True, check=False)

@@ -7,7 +7,7 @@ compares what is seen with what the pages show.
 The reader's machine is a folder: a home with sample plug-ins, and the programs in its path. Times, dates, offsets and
 the number of processors may differ from what the page shows, and lines may be broken elsewhere. Every block of a page
 is run, except for the commands in NOT_RUN. Exits with 77 when a program that the page needs is missing, or with 1 if
-VSTTORTURE_DEBUGGERS=required is in the environment.
+VSTTORTURE_PAGES=required is in the environment.
 """
 import argparse
 import os
@@ -59,7 +59,8 @@ class World:
 
     def run(self, commands):
         """[(output, status)], of the commands typed one after the other into one shell."""
-        script = "".join(f"{command.text}\nstatus_of_page=$?; printf '{MARK}%d{MARK}' $status_of_page; (exit $status_of_page)\n" for command in commands)
+        mark = f"status=$?; printf '{MARK}%d{MARK}' $status; (exit $status)"  # The next command may ask for $?.
+        script = "".join(f"{command.text}\n{mark}\n" for command in commands)
         # One processor: plug-ins then end in the same order each time.
         done = subprocess.run(["taskset", "--cpu-list", str(min(os.sched_getaffinity(0))), "bash", "-c", script],
                               cwd=self.home, env=self.environment(), text=True, errors="replace",
@@ -136,7 +137,7 @@ def main():
         missing = [tool for tool in tools if not shutil.which(tool)]
         if missing:
             print(f"left out: {page} needs {' and '.join(missing)}")
-            return 1 if os.environ.get("VSTTORTURE_DEBUGGERS") == "required" else NOTHING_TO_RUN
+            return 1 if os.environ.get("VSTTORTURE_PAGES") == "required" else NOTHING_TO_RUN
         with tempfile.TemporaryDirectory(prefix="vsttorture-page-") as folder:
             for problem in problems(page, World(folder, options.build), prepare):
                 print(problem, end="\n\n")
