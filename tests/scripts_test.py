@@ -235,6 +235,15 @@ class Scan(Script):
             self.root / "build/release", "--target vsttorture-scan vsttorture-worker vsttorture-describe",
             ("-DVSTTORTURE_SCAN=ON", "-DVSTTORTURE_WERROR=OFF")))
 
+    def test_a_scan_gets_the_32_bit_workers_and_the_other_commands_do_not(self):
+        worker = self.root / "build/x86/vsttorture-worker"
+        worker.parent.mkdir(parents=True)
+        worker.touch(mode=0o755)
+        for arguments, output in [(["a folder"], f"scan --workers {worker.parent} a folder\n"),
+                                  (["history"], "scan history\n"), (["report", "a"], "scan report a\n")]:
+            with self.subTest(arguments=arguments):
+                self.assertEqual(self.start("scan", *arguments)[0], output)
+
     def test_without_a_sandbox_it_says_so_and_goes_on(self):
         self.take_away_for_good("bwrap")
         _, messages, status, _ = self.start("scan")

@@ -10,6 +10,7 @@ is run, except for the commands in NOT_RUN. Exits with 77 when a program that th
 VSTTORTURE_PAGES=required is in the environment.
 """
 import argparse
+import collections
 import os
 import pathlib
 import re
@@ -27,8 +28,13 @@ LIMIT_IN_SECONDS = 300
 PROGRAMS = ["vsttorture", "vsttorture-worker", "vsttorture-describe", "vsttorture-scan"]
 MARK = "\x1e"
 
-# What cannot be run here, and what is tested in its place.
+# What cannot be run here, and what stands in for it.
 NOT_RUN = {
+    "sudo apt install ./vsttorture_0.2.0_amd64.deb ./vsttorture-workers_0.2.0_amd64.deb\n":
+        "scripts/check_packages.sh installs the packages",
+    "git clone REPOSITORY vsttorture && cd vsttorture && ./scan --help\n":
+        "the programs are built; tests/scripts_test.py tests ./scan",
+    "git clone REPOSITORY vsttorture": "the reader's home has this checkout under that name",
 }
 
 
@@ -80,8 +86,25 @@ class World:
 def musician(world):
     world.put("well_behaved_effect.so", ".vst/chorus.so")
     world.put("faulty.so", ".vst/delay.so")
+    world.put("exits_in_test.so", ".vst/old_synth.so")
     world.put("well_behaved_instrument.so", ".vst/organ.so")
     world.put("shell.so", ".vst/rack.so")
+
+
+def update_the_delay(world):
+    world.put("well_behaved_effect.so", ".vst/delay.so")
+
+
+def maker_of_a_plugin(world):
+    """What is built is good the first time and then no more."""
+    (world.home / "vsttorture").symlink_to(SOURCE)
+    make = world.folder / "usr/bin/make"
+    make.write_text(f"""#!/bin/sh
+        mkdir -p build && cd build || exit
+        sample=well_behaved_effect
+        [ ! -e my_plugin.so ] || sample=faulty
+        cp {world.build}/plugins/$sample.so new && mv new my_plugin.so""")
+    make.chmod(0o755)
 
 
 def maker_of_a_host(world):
@@ -89,10 +112,13 @@ def maker_of_a_host(world):
     (world.home / "examples").symlink_to(SOURCE / "docs/examples")
 
 
-# page: what is on the reader's machine, and the programs that the page needs.
+# prepares: puts on the reader's machine what is there at first. tools: programs that the page needs. meanwhile: what
+# happens before the commands below a heading.
+Page = collections.namedtuple("Page", "prepares tools meanwhile")
 PAGES = {
-    "BREAKS_MY_SESSION": (musician, []),
-    "IN_YOUR_HOST": (maker_of_a_host, ["c++", "jq", "sqlite3"]),
+    "BREAKS_MY_SESSION": Page(musician, ["gdb"], {"The second time": update_the_delay}),
+    "IN_YOUR_CI": Page(maker_of_a_plugin, ["gdb"], {}),
+    "IN_YOUR_HOST": Page(maker_of_a_host, ["c++", "jq", "sqlite3"], {}),
 }
 
 VARIABLE = [(r"\b\d+(\.\d+)? (s|ms|min)\b", "# s"), (r"\+0x[0-9a-f]+", "+0x#"), (r"\b\d{4}-\d\d-\d\d\b", "DATE"),
@@ -114,16 +140,20 @@ def is_as_shown(shown, output):
     return re.fullmatch(pattern.replace(r"\ .*", r"\ ?.*"), comparable(output), re.DOTALL) is not None
 
 
-def problems(page, world, prepare):
-    commands = [command for command in page_commands.commands(SOURCE / "docs" / f"{page}.md")
-                if command.text not in NOT_RUN]
-    assert commands, page
-    prepare(world)
-    for command, (output, status) in zip(commands, world.run(commands)):
-        if command.shown is not None and not is_as_shown(command.shown, output):
-            yield f"{page}, {command.heading}: $ {command.text}\nthe page shows\n{command.shown}\nseen is\n{output}"
-        if command.shown is None and status != 0:
-            yield f"{page}, {command.heading}: status {status} of\n{command.text}\n{output}"
+def problems(name, world):
+    page = PAGES[name]
+    commands = page_commands.commands(SOURCE / "docs" / f"{name}.md")
+    headings = list(dict.fromkeys(command.heading for command in commands))
+    assert headings and not page.meanwhile.keys() - set(headings), headings
+    page.prepares(world)
+    for heading in headings:
+        page.meanwhile.get(heading, lambda world: None)(world)
+        section = [command for command in commands if command.heading == heading and command.text not in NOT_RUN]
+        for command, (output, status) in zip(section, world.run(section)):
+            if command.shown is not None and not is_as_shown(command.shown, output):
+                yield f"{name}, {heading}: $ {command.text}\nthe page shows\n{command.shown}\nseen is\n{output}"
+            if command.shown is None and status != 0:
+                yield f"{name}, {heading}: status {status} of\n{command.text}\n{output}"
 
 
 def main():
@@ -132,14 +162,13 @@ def main():
     parser.add_argument("pages", nargs="+", metavar="PAGE", choices=PAGES)
     options = parser.parse_args()
     failed = False
-    for page in options.pages:
-        prepare, tools = PAGES[page]
-        missing = [tool for tool in tools if not shutil.which(tool)]
+    for name in options.pages:
+        missing = [tool for tool in PAGES[name].tools if not shutil.which(tool)]
         if missing:
-            print(f"left out: {page} needs {' and '.join(missing)}")
+            print(f"left out: {name} needs {' and '.join(missing)}")
             return 1 if os.environ.get("VSTTORTURE_PAGES") == "required" else NOTHING_TO_RUN
         with tempfile.TemporaryDirectory(prefix="vsttorture-page-") as folder:
-            for problem in problems(page, World(folder, options.build), prepare):
+            for problem in problems(name, World(folder, options.build)):
                 print(problem, end="\n\n")
                 failed = True
     return 1 if failed else 0
