@@ -7,6 +7,10 @@ _vsttorture_scan() {
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$current")
       return
       ;;
+    --under)
+      mapfile -t COMPREPLY < <(compgen -W "memcheck gdb" -- "$current")
+      return
+      ;;
     --skip | --expect | --cache | --json)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -f -- "$current")
@@ -22,7 +26,7 @@ _vsttorture_scan() {
       ;;
   esac
   if [[ $current == -* ]]; then
-    mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --skip --expect --shard
+    mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --under --shrink --skip --expect --shard
       --sandbox --describe --display --cache --fresh --json --quiet --no-progress --workers --help --version" -- "$current")
   else
     compopt -o filenames

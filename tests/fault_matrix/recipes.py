@@ -23,12 +23,18 @@ PAGE = SOURCE / "docs" / "WHEN_A_PLUGIN_FAILS.md"
 LIMIT_IN_SECONDS = 120
 NOTHING_TO_RUN = 77
 
-# shows: what must be printed, in this order, as regular expressions.
+# tools: what must be installed; the scan must have been built. shows: what must be printed, in this order, as regular expressions.
 Recipe = collections.namedtuple("Recipe", "heading tools kind shows")
 IN_STEP_6 = "6, inspect latency\n"
 DISPATCHER = r"Faulty::dispatch\("
 
+SCAN = "vsttorture-scan"
+
 RECIPES = {
+    "scan": Recipe("Let the scan explain it", [SCAN, "gdb", "valgrind"], "heap_corruption",
+                   [r"crashed +.*my_plugin\.so", "SIGABRT in effGetTailSize", r"gdb: SIGABRT in .*writeBehindABlock",
+                    "shortest list of tests: 1 of 5, found in 1 run", "--tests 4 .*my_plugin.so",
+                    "memcheck: Invalid write of size 1", "valgrind --tool=memcheck"]),
     "crash": Recipe("Find the place of a crash", ["gdb"], "null_store",
                     [IN_STEP_6, "received signal SIGSEGV", r"#0 .*storeToAddressZero\(\)", DISPATCHER]),
     "throw": Recipe("Find what is thrown", ["gdb"], "throw_int",
@@ -68,6 +74,9 @@ def run(recipe, commands, program, plugins):
     """All that the commands print, on both outputs in their order, and the last status."""
     with tempfile.TemporaryDirectory(prefix="recipe.") as folder:
         subprocess.run(["strip", "-o", f"{folder}/vsttorture", program], check=True)
+        if SCAN in recipe.tools:
+            for name in (SCAN, "vsttorture-worker", "vsttorture-describe"):
+                shutil.copy(f"{os.path.dirname(program)}/{name}", folder)
         shutil.copy(f"{plugins}/faulty.so", f"{folder}/my_plugin.so")
         pathlib.Path(folder, "my_plugin.cpp").write_text(plugin_source())
         environment = {"HOME": folder, "LC_ALL": "C", "PATH": f"{folder}:/usr/bin:/bin",
@@ -102,7 +111,9 @@ def main():
         print(f"headings without a test, or without commands: {sorted(untested)}")
         return 1
     for recipe in [RECIPES[name] for name in arguments.names]:
-        missing = [tool for tool in recipe.tools if shutil.which(tool) is None]
+        build = os.path.dirname(os.path.abspath(arguments.program))
+        missing = [tool for tool in recipe.tools
+                   if not (os.path.exists(f"{build}/{tool}") if tool == SCAN else shutil.which(tool))]
         if missing:
             print(f"left out: {recipe.heading} needs {' and '.join(missing)}")
             return 1 if os.environ.get("VSTTORTURE_DEBUGGERS") == "required" else NOTHING_TO_RUN
