@@ -65,7 +65,7 @@ std::string optionsThatMatter(const ScanOptions& options) {
 
 /// A report that shows more of a good result than its verdict.
 bool needsWholeResults(const ScanOptions& options) {
-  return !options.jsonFile.empty() || options.explain.tool.has_value();
+  return !options.jsonFile.empty() || options.reports.areWanted() || options.explain.tool.has_value();
 }
 
 }  // namespace
