@@ -23,7 +23,7 @@ install(PROGRAMS docs/examples/try_plugin.py docs/examples/explain_plugin.py
 if(TARGET vsttorture-scan)
   install(TARGETS vsttorture-scan RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT vsttorture)
   install(FILES docs/vsttorture-scan.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT vsttorture)
-  install(FILES docs/VERDICTS.md docs/BREAKS_MY_SESSION.md docs/IN_YOUR_CI.md docs/IN_YOUR_HOST.md
+  install(FILES docs/VERDICTS.md docs/RESULTS_DATABASE.md docs/BREAKS_MY_SESSION.md docs/IN_YOUR_CI.md docs/IN_YOUR_HOST.md
           DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT vsttorture)
   install(FILES docs/examples/read_scan.cpp DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)
   install(PROGRAMS docs/examples/read_scan.py DESTINATION ${CMAKE_INSTALL_DOCDIR}/examples COMPONENT vsttorture)

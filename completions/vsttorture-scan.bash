@@ -2,6 +2,10 @@
 # Completion of vsttorture-scan's options, values and paths for bash.
 _vsttorture_scan() {
   local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
+  if [[ ${COMP_WORDS[1]} == history && $COMP_CWORD -gt 1 && $current == -* ]]; then
+    mapfile -t COMPREPLY < <(compgen -W "--cache --help" -- "$current")
+    return
+  fi
   case $previous in
     --sandbox)
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$current")
@@ -31,6 +35,7 @@ _vsttorture_scan() {
   else
     compopt -o filenames
     mapfile -t COMPREPLY < <(compgen -f -- "$current")
+    ((COMP_CWORD > 1)) || mapfile -t -O "${#COMPREPLY[@]}" COMPREPLY < <(compgen -W "history" -- "$current")
   fi
 }
 complete -F _vsttorture_scan vsttorture-scan

@@ -134,6 +134,7 @@ drwxr-xr-x root/root ./usr/share/bash-completion/completions/
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/BREAKS_MY_SESSION.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/IN_YOUR_CI.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/IN_YOUR_HOST.md
+-rw-r--r-- root/root ./usr/share/doc/vsttorture/RESULTS_DATABASE.md
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/VERDICTS.md
 drwxr-xr-x root/root ./usr/share/doc/vsttorture/examples/ci/
 -rw-r--r-- root/root ./usr/share/doc/vsttorture/examples/ci/github-workflow.yml
@@ -225,7 +226,7 @@ drwxr-xr-x root/root ./usr/share/doc/vsttorture-workers/
   done
   if [[ $architecture == amd64 ]]; then
     subject=/usr/bin/vsttorture-scan
-    check_program "$unpacked/usr/bin/vsttorture-scan" "libc.so.6 libfmt.so.9 libgcc_s.so.1 libstdc++.so.6 libuv.so.1"
+    check_program "$unpacked/usr/bin/vsttorture-scan" "libc.so.6 libfmt.so.9 libgcc_s.so.1 libpugixml.so.1 libsqlite3.so.0 libstdc++.so.6 libuv.so.1"
   fi
 }
 

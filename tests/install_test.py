@@ -37,7 +37,8 @@ SCAN_PROGRAM = "bin/vsttorture-scan"
 COPIES_FOR_SCAN = {
     "share/bash-completion/completions/vsttorture-scan": "completions/vsttorture-scan.bash",
     **{f"share/doc/vsttorture/{name}": f"docs/{name}" for name in (
-        "BREAKS_MY_SESSION.md", "IN_YOUR_CI.md", "IN_YOUR_HOST.md", "VERDICTS.md", "examples/ci/github-workflow.yml",
+        "BREAKS_MY_SESSION.md", "IN_YOUR_CI.md", "IN_YOUR_HOST.md", "RESULTS_DATABASE.md",
+        "VERDICTS.md", "examples/ci/github-workflow.yml",
         "examples/ci/gitlab-ci.yml", "examples/ci/torture.sh", "examples/many_machines/scan_array.sh",
         "examples/many_machines/scan_on_hosts.sh", "examples/read_scan.cpp", "examples/read_scan.py")},
     "share/doc/vsttorture/schema/scan-events.schema.json": "docs/schema/scan-events.schema.json",

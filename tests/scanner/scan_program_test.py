@@ -372,6 +372,8 @@ class Completion(ScanTest):
         self.assertEqual(self.completions("--skip", "well_behaved_e"), [EFFECT])
         self.assertEqual(self.completions("well_behaved_e"), [EFFECT])
         self.assertEqual(self.completions("--repeat", ""), [])
+        self.assertEqual(self.completions("hist"), ["history"])
+        self.assertEqual(self.completions("history", "--"), ["--cache", "--help"])
 
     def test_every_option_of_the_help_is_completed_and_in_the_manual(self):
         options = set(re.findall(r"(?<![\w-])--[a-z-]+", self.scan("--help").stdout))

@@ -231,6 +231,84 @@ TEST(TerminalReport, WritesNoControlCodesWithoutATerminal) {
   EXPECT_THAT(wholeReport(terminal), Not(HasSubstr("\x1b")));
 }
 
+// ---- What has changed -------------------------------------------------------------------------------------
+
+PluginResult changed(Verdict verdict, Comparison::Change change, const std::string& earlier) {
+  PluginResult one = result(verdict, "/lib/a.so", "step 5: SIGSEGV");
+  one.command.clear();
+  one.comparison.emplace();
+  one.comparison->change = change;
+  if (!earlier.empty()) one.comparison->earlier = Comparison::Earlier{earlier, 5, 1700000000};
+  return one;
+}
+
+struct ChangeCase {
+  const char* name;
+  Verdict verdict;
+  Comparison::Change change;
+  const char* earlier;
+  const char* line;
+};
+class TerminalReportChanges : public ::testing::TestWithParam<ChangeCase> {};
+
+TEST_P(TerminalReportChanges, AreToldInOneLine) {
+  Terminal terminal;
+  const ChangeCase& row = GetParam();
+  terminal.report().ended(changed(row.verdict, row.change, row.earlier));
+  terminal.take();
+  terminal.report().ended(ScanEnded());
+  EXPECT_EQ(terminal.take(), std::string("\n") + rowOf(row.verdict).word +
+                                 "  /lib/a.so\n  step 5: SIGSEGV\n" + row.line + "\n0 results, in 0.0 s\n");
+}
+
+using C = Comparison::Change;
+INSTANTIATE_TEST_SUITE_P(
+    Table, TerminalReportChanges,
+    ::testing::Values(
+        ChangeCase{"New", Verdict::kCrashed, C::kNew, "passed", "  new: it was \"passed\" before\n"},
+        ChangeCase{"NewInAnotherWay", Verdict::kCrashed, C::kNew, "hung",
+                   "  new: it was \"hung at 5\" before\n"},
+        ChangeCase{"NewForTheFirstTime", Verdict::kCrashed, C::kNew, "", "  new: it was not there before\n"},
+        ChangeCase{"StillFailing", Verdict::kCrashed, C::kStillFailing, "crashed", "  still failing\n"},
+        ChangeCase{"Flaky", Verdict::kCrashed, C::kFlaky, "passed",
+                   "  flaky: it was \"passed\" before, and nothing has changed since\n"},
+        ChangeCase{"FlakyAndNowGood", Verdict::kPassed, C::kFlaky, "crashed",
+                   "  flaky: it was \"crashed at 5\" before, and nothing has changed since\n"},
+        ChangeCase{"NotRunIsNoChangeOfThePlugin", Verdict::kNotRun, C::kNew, "passed", ""},
+        ChangeCase{"NoChange", Verdict::kCrashed, C::kNone, "crashed", ""}),
+    [](const auto& parameter) { return std::string(parameter.param.name); });
+
+TEST(TerminalReport, NamesTheFirstTenThatAreMended) {
+  Terminal terminal(200);
+  for (int i = 0; i < 12; ++i) {
+    PluginResult one = changed(Verdict::kPassed, Comparison::Change::kMended, "crashed");
+    one.run.bundle = "/lib/" + std::to_string(i) + ".so";
+    terminal.report().ended(one);
+  }
+  terminal.take();
+  terminal.report().ended(ScanEnded());
+  EXPECT_EQ(
+      terminal.take(),
+      "mended: 0.so, 1.so, 2.so, 3.so, 4.so, 5.so, 6.so, 7.so, 8.so, 9.so and 2 more\n0 results, in 0.0 s\n");
+}
+
+TEST(TerminalReport, MarksWhatIsRememberedAndCountsIt) {
+  Terminal terminal;
+  PluginResult one = result(Verdict::kPassed, "/lib/a.so");
+  one.isRemembered = true;
+  terminal.report().ended(one);
+  EXPECT_EQ(terminal.take(), "passed                /lib/a.so  (remembered)\n");
+  ScanEnded ended;
+  ended.counts = {{"passed", 2}};
+  terminal.report().ended(ended);
+  EXPECT_EQ(terminal.take(), "2 results: 2 passed, in 0.0 s; 1 remembered\n");
+  ended.counts = {{"passed", 1}};
+  terminal.report().ended(ended);
+  EXPECT_EQ(terminal.take(), "1 result: 1 passed, in 0.0 s; all remembered\n");
+}
+
+// ---- Progress ---------------------------------------------------------------------------------------------
+
 TEST(TerminalReport, ProgressStandsInPlaceAndMakesRoomForALine) {
   Terminal terminal;
   terminal.report().progress(3, 200, 71.5, {"a.so", "shell.so #1 One"});
