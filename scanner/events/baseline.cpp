@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <set>
+#include <utility>
 
 #include "scanner/events/comparison.h"
 #include "scanner/events/event_json.h"
@@ -14,13 +15,32 @@ bool isFlaky(const PluginResult& result) { return result.repetitions && result.r
 
 bool isUnmet(const PluginResult& result) { return result.expected && !result.expected->isMet; }
 
-bool hasFindings(const PluginResult& result) { return result.diagnosis && result.diagnosis->hasFindings(); }
+/// How many findings of the plug-in there are of each kind.
+std::map<std::string, std::size_t> findingsByKind(const PluginResult& result) {
+  std::map<std::string, std::size_t> counts;
+  if (!result.diagnosis) return counts;
+  for (const Diagnosis::Finding& finding : result.diagnosis->findings) {
+    if (finding.isInPlugin) ++counts[result.diagnosis->tool + " " + finding.kind];
+  }
+  return counts;
+}
+
+/// Whether there are no more findings of any kind than before. Their frames say less: they change with every build.
+bool areFindingsKnown(const PluginResult& now, const PluginResult& earlier) {
+  const std::map<std::string, std::size_t> before = findingsByKind(earlier);
+  for (const auto& [kind, count] : findingsByKind(now)) {
+    const auto found = before.find(kind);
+    if (found == before.end() || found->second < count) return false;
+  }
+  return true;
+}
 
 bool isKnown(const PluginResult& now, const PluginResult& earlier) {
   if (isFlaky(now)) return isFlaky(earlier);
   if (now.judgement.verdict != earlier.judgement.verdict) return false;
-  if (hasFindings(now)) return hasFindings(earlier);
-  return now.comparison->change == Comparison::Change::kStillFailing || (isUnmet(now) && isUnmet(earlier));
+  if (!rowOf(now.judgement.verdict).isGood)
+    return now.comparison->change == Comparison::Change::kStillFailing;
+  return (!isUnmet(now) || isUnmet(earlier)) && areFindingsKnown(now, earlier);
 }
 
 bool isBelow(const std::string& path, const std::string& folder) {
@@ -41,7 +61,8 @@ Baseline::Baseline(const std::vector<PluginResult>& all) {
     if (one.seen) kept.seen.emplace().startedAt = one.seen->startedAt;
     kept.repetitions = one.repetitions;
     kept.expected = one.expected;
-    if (hasFindings(one)) kept.diagnosis.emplace().findings = one.diagnosis->findings;
+    kept.diagnosis = one.diagnosis;
+    if (kept.diagnosis) kept.diagnosis->report.clear();
     results[keyOf(one.run)] = std::move(kept);
   }
 }

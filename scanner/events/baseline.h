@@ -24,7 +24,8 @@ class Baseline {
   explicit Baseline(const std::vector<PluginResult>& results);
 
   /// Fills PluginResult::comparison. A result that is not wanted becomes wanted where it is known from the baseline:
-  /// a failure with the same verdict, a flaky plug-in that was flaky, an expectation that was not met in the same way.
+  /// a failure with the same verdict, a flaky plug-in that was flaky, an expectation that was not met in the same way,
+  /// no more findings of a tool than there were.
   void apply(PluginResult& result) const;
 
   /// The plug-ins of the baseline that are not in `now` although a scan of these places and this part would have

@@ -21,7 +21,6 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-constexpr int kFormat = 1;
 constexpr std::size_t kMostQuoted = 40;  ///< Bytes of a text that a problem repeats.
 
 /// What is wrong with a line. Never leaves this file.
@@ -398,7 +397,7 @@ PluginResult readResult(const Value& event) {
 
 ScanStarted readScanStarted(const Value& event) {
   const auto format = event["format"].whole<int>();
-  if (format != kFormat) throw NoEvent(fmt::format("its format is {}, not {}", format, kFormat));
+  if (format != kEventFormat) throw NoEvent(fmt::format("its format is {}, not {}", format, kEventFormat));
   ScanStarted started;
   started.version = event["version"].text();
   started.time = event["time"].measure();

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/report/junit.h"
 
+#include <algorithm>
 #include <cmath>
 #include <ctime>
 #include <map>
@@ -120,6 +121,15 @@ bool isFlaky(const PluginResult& result) { return result.repetitions && result.r
 
 bool isUnmet(const PluginResult& result) { return result.expected && !result.expected->isMet; }
 
+/// "2 findings of memcheck: Invalid read of size 4"
+std::string findingsInWords(const Diagnosis& diagnosis) {
+  const auto isInPlugin = [](const Diagnosis::Finding& finding) { return finding.isInPlugin; };
+  const auto& all = diagnosis.findings;
+  const auto count = std::count_if(all.begin(), all.end(), isInPlugin);
+  return fmt::format("{} {} of {}: {}", count, count == 1 ? "finding" : "findings", diagnosis.tool,
+                     std::find_if(all.begin(), all.end(), isInPlugin)->text);
+}
+
 /// One line: why it failed.
 std::string messageOf(const PluginResult& result) {
   std::vector<std::string> parts;
@@ -130,6 +140,8 @@ std::string messageOf(const PluginResult& result) {
         endInWords(rowOf(result.judgement.verdict).word,
                    result.judgement.step > 0 ? std::optional(result.judgement.step) : std::nullopt)));
   if (!result.judgement.cause.empty()) parts.push_back(result.judgement.cause);
+  if (rowOf(result.judgement.verdict).isGood && result.diagnosis && result.diagnosis->hasFindings())
+    parts.push_back(findingsInWords(*result.diagnosis));
   if (parts.empty()) parts.emplace_back(rowOf(result.judgement.verdict).meaning);
   return printable(fmt::format("{}", fmt::join(parts, "; ")));
 }
@@ -161,12 +173,16 @@ std::string detailsOf(const PluginResult& result) {
   if (result.diagnosis) {
     add(result.diagnosis->tool, result.diagnosis->problem);
     for (const Diagnosis::Finding& finding : result.diagnosis->findings) {
-      add(result.diagnosis->tool, finding.kind + ": " + finding.text);
+      add(result.diagnosis->tool,
+          finding.kind + ": " + finding.text + (finding.isInPlugin ? "" : " (not of the plug-in)"));
       for (const std::string& frame : finding.frames) text += "    " + printable(frame) + "\n";
     }
   }
-  if (result.shrunk && result.shrunk->isReproduced)
-    add("shortest list of tests", fmt::format("{} (of {})", result.shrunk->tests, result.shrunk->from));
+  if (result.shrunk) {
+    if (result.shrunk->isReproduced)
+      add("shortest list of tests", fmt::format("{} (of {})", result.shrunk->tests, result.shrunk->from));
+    add("shortest list of tests", result.shrunk->problem);
+  }
   if (!result.command.empty()) add("again", shellCommand(result.command));
   if (result.shrunk && !result.shrunk->command.empty()) add("shorter", shellCommand(result.shrunk->command));
   if (result.diagnosis && !result.diagnosis->command.empty())

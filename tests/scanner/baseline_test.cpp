@@ -25,6 +25,16 @@ PluginResult unmet(PluginResult result) {
   return result;
 }
 
+/// Passed, but memcheck has found something.
+PluginResult found(const std::vector<std::string>& kinds) {
+  PluginResult result = resultOf("/lib/a.so", Verdict::kPassed);
+  result.diagnosis.emplace();
+  result.diagnosis->tool = "memcheck";
+  for (const std::string& kind : kinds) result.diagnosis->findings.push_back({kind, "text", {}});
+  result.isWanted = kinds.empty();
+  return result;
+}
+
 const PluginResult kPassed = resultOf("/lib/a.so", Verdict::kPassed);
 const PluginResult kCrashedAt5 = resultOf("/lib/a.so", Verdict::kCrashed, 5);
 const PluginResult kCrashedAt9 = resultOf("/lib/a.so", Verdict::kCrashed, 9);
@@ -58,7 +68,12 @@ INSTANTIATE_TEST_SUITE_P(
                       Case{"IsFlakyNow", kCrashedAt5, flaky(kCrashedAt5), Change::kFlaky, false},
                       Case{"IsStillFlaky", flaky(kCrashedAt5), flaky(kCrashedAt9), Change::kFlaky, true},
                       Case{"ExpectationIsNotMetNow", kPassed, unmet(kPassed), Change::kNone, false},
-                      Case{"ExpectationIsStillNotMet", unmet(kPassed), unmet(kPassed), Change::kNone, true}),
+                      Case{"ExpectationIsStillNotMet", unmet(kPassed), unmet(kPassed), Change::kNone, true},
+                      Case{"SomethingIsFoundNow", kPassed, found({"InvalidRead"}), Change::kNone, false},
+                      Case{"TheSameIsFound", found({"InvalidRead", "Leak"}), found({"InvalidRead"}),
+                           Change::kNone, true},
+                      Case{"MoreIsFound", found({"InvalidRead"}), found({"InvalidRead", "InvalidRead"}),
+                           Change::kNone, false}),
     [](const auto& one) { return std::string(one.param.name); });
 
 TEST(Baseline, APluginThatItDoesNotHaveIsNew) {

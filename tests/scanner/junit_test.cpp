@@ -188,6 +188,21 @@ TEST(JunitReport, WhatAToolFoundAndTheShortestListAreInTheFailure) {
                         "shorter: worker --tests 3\nwith gdb: gdb --args\n"));
 }
 
+TEST(JunitReport, APassInWhichAToolFoundSomethingFailsWithWhatItFound) {
+  PluginResult result = resultOf("/lib/a.so", Verdict::kPassed);
+  result.isWanted = false;
+  result.diagnosis.emplace();
+  result.diagnosis->tool = "memcheck";
+  result.diagnosis->findings = {{"UninitValue", "Use", {}, false},
+                                {"InvalidRead", "Invalid read of size 4", {}}};
+  const Junit junit({result}, 1);
+  EXPECT_STREQ(junit.test().child("failure").attribute("message").value(),
+               "1 finding of memcheck: Invalid read of size 4");
+  EXPECT_THAT(
+      junit.test().child("failure").text().get(),
+      HasSubstr("memcheck: UninitValue: Use (not of the plug-in)\nmemcheck: InvalidRead: Invalid read"));
+}
+
 TEST(JunitReport, AScanThatIsNotWholeHasATestThatIsAnError) {
   const auto lastTest = [](const Junit& junit) {
     EXPECT_EQ(junit.counts(), "2 tests, 0 failures, 1 errors, 0 skipped");
