@@ -6,6 +6,10 @@ _vsttorture_scan() {
     mapfile -t COMPREPLY < <(compgen -W "--cache --help" -- "$current")
     return
   fi
+  if [[ ${COMP_WORDS[1]} == report && $COMP_CWORD -gt 1 && $current == -* ]]; then
+    mapfile -t COMPREPLY < <(compgen -W "--json --junit --baseline --quiet --help" -- "$current")
+    return
+  fi
   case $previous in
     --sandbox)
       mapfile -t COMPREPLY < <(compgen -W "auto required off" -- "$current")
@@ -15,7 +19,7 @@ _vsttorture_scan() {
       mapfile -t COMPREPLY < <(compgen -W "memcheck gdb" -- "$current")
       return
       ;;
-    --skip | --expect | --cache | --json)
+    --skip | --expect | --baseline | --cache | --json | --junit)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -f -- "$current")
       return
@@ -30,12 +34,14 @@ _vsttorture_scan() {
       ;;
   esac
   if [[ $current == -* ]]; then
-    mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --under --shrink --skip --expect --shard
-      --sandbox --describe --display --cache --fresh --json --quiet --no-progress --workers --help --version" -- "$current")
+    mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --under --shrink --skip --expect
+      --baseline --shard --sandbox --describe --display --cache --fresh --json --junit --quiet --no-progress --workers
+      --help --version" -- "$current")
   else
     compopt -o filenames
     mapfile -t COMPREPLY < <(compgen -f -- "$current")
-    ((COMP_CWORD > 1)) || mapfile -t -O "${#COMPREPLY[@]}" COMPREPLY < <(compgen -W "history" -- "$current")
+    ((COMP_CWORD > 1)) ||
+      mapfile -t -O "${#COMPREPLY[@]}" COMPREPLY < <(compgen -W "history report" -- "$current")
   fi
 }
 complete -F _vsttorture_scan vsttorture-scan

@@ -6,7 +6,6 @@
 The tests of the class Junit read the XML with the Python package junitparser. When these alone are asked for and the
 package is missing, the status is 77.
 """
-import argparse
 import json
 import os
 import pathlib
@@ -19,7 +18,9 @@ import time
 import unittest
 
 import scan_program_test
-from scan_program_test import EFFECT, NOTHING_TO_CHECK_WITH, SET_SAMPLE_RATE, ScanTest
+import scan_test_case
+from scan_program_test import NOTHING_TO_CHECK_WITH, SET_SAMPLE_RATE
+from scan_test_case import EFFECT, PLAIN, ScanTest
 
 try:
     import junitparser
@@ -32,7 +33,7 @@ TIMES = {"time", "wallSeconds"}
 
 
 def plugins():
-    return scan_program_test.PLUGINS
+    return scan_test_case.PLUGINS
 
 
 def without_times(event):
@@ -55,7 +56,7 @@ class ReportTest(ScanTest):
     def report(self, *arguments, **more):
         more.setdefault("stdout", subprocess.PIPE)
         more.setdefault("stdin", subprocess.DEVNULL)
-        return subprocess.run([scan_program_test.SCAN, "report", *map(str, arguments)], env=self.environment(),
+        return subprocess.run([scan_test_case.SCAN, "report", *map(str, arguments)], env=self.environment(),
                               cwd=self.folder, stderr=subprocess.PIPE, text=True, timeout=60, check=False, **more)
 
     def merged(self, *files, status):
@@ -201,7 +202,13 @@ class WrongUse(ReportTest):
         self.assert_ends("--lunch", "--lunch", good)
         self.assert_ends("standard input can be read once only", "-", "-")
         self.assert_ends("only one report can go to standard output", "--json", "-", "--junit", "-", good)
-        self.assertIn("vsttorture-scan report [OPTIONS] FILE...", self.report("--help").stdout)
+
+    def test_every_option_of_the_help_is_completed(self):
+        text = self.report("--help").stdout
+        self.assertIn("vsttorture-scan report [OPTIONS] FILE...", text)
+        complete = scan_program_test.Completion.completions
+        self.assertEqual(set(complete(self, "report", "--")), set(re.findall(r"(?<![\w-])--[a-z]+", text)) | {"--help"})
+        self.assertEqual(complete(self, "rep"), ["report"])
 
     def test_nothing_is_written(self):
         earlier = self.write("results.xml", "earlier\n")
@@ -233,7 +240,7 @@ class Files(ReportTest):
     def test_a_disk_that_becomes_full_leaves_the_earlier_report(self):
         results = self.record("results", plugins())
         earlier = self.write("report.xml", "earlier\n")
-        command = ["bash", "-c", 'trap "" XFSZ; ulimit -f 2; exec "$@"', "bash", scan_program_test.SCAN, "report",
+        command = ["bash", "-c", 'trap "" XFSZ; ulimit -f 2; exec "$@"', "bash", scan_test_case.SCAN, "report",
                    "--junit", earlier, results]
         result = subprocess.run(command, env=self.environment(), capture_output=True, text=True, timeout=60, check=False)
         self.assertEqual(result.returncode, 3)
@@ -419,9 +426,9 @@ class Junit(ReportTest):
 
     def test_an_interrupted_scan_writes_what_was_seen(self):
         process = subprocess.Popen(
-            [scan_program_test.SCAN, "--sandbox", "off", "--cache", "off", "-j", "1", "--junit", "report.xml", "--json",
-             "results", plugins() / EFFECT, plugins() / "faulty.so"], cwd=self.folder, stdin=subprocess.DEVNULL,
-            env=self.environment(FAULT_KIND="hang", FAULT_PLACE=SET_SAMPLE_RATE), stdout=subprocess.DEVNULL)
+            [scan_test_case.SCAN, *PLAIN, "-j", "1", "--junit", "report.xml", "--json", "results", plugins() / EFFECT,
+             plugins() / "faulty.so"], cwd=self.folder, stdin=subprocess.DEVNULL, stdout=subprocess.DEVNULL,
+            env=self.environment(FAULT_KIND="hang", FAULT_PLACE=SET_SAMPLE_RATE))
         results = self.folder / "results"
         while not (results.exists() and re.search("run_started.*faulty", results.read_text())):
             self.assertIsNone(process.poll())
@@ -434,14 +441,11 @@ class Junit(ReportTest):
 
 
 def main():
-    parser = argparse.ArgumentParser()
-    parser.add_argument("--scan", required=True, type=pathlib.Path)
-    parser.add_argument("--plugins", required=True, type=pathlib.Path)
-    options, rest = parser.parse_known_args()
+    rest = scan_test_case.read_arguments(sys.argv[1:])
+    scan_program_test.PLUGINS = scan_test_case.PLUGINS
     if junitparser is None and rest == ["Junit"]:
         print("the Python package junitparser is not installed")
         return NOTHING_TO_CHECK_WITH
-    scan_program_test.SCAN, scan_program_test.PLUGINS = options.scan.resolve(), options.plugins.resolve()
     program = unittest.main(argv=[sys.argv[0], *rest], exit=False)
     return 0 if program.result.wasSuccessful() else 1
 
