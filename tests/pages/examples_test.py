@@ -134,7 +134,7 @@ class Torture(Example):
 class CiFiles(unittest.TestCase):
     """The files around torture.sh run the script that is tested here, and keep the folders that it uses."""
 
-    CALL = "vsttorture/docs/examples/ci/torture.sh build/my_plugin.so"
+    CALL = ".torture/vsttorture/docs/examples/ci/torture.sh build/my_plugin.so"
 
     def test_github(self):
         (job,) = yaml.safe_load((EXAMPLES / "ci/github-workflow.yml").read_text())["jobs"].values()

@@ -98,6 +98,8 @@ class ManyMachines(unittest.TestCase):
         self.seen_as = self.folder / "machine"
         self.seen_as.mkdir()
         self.output = self.folder / "results"
+        # Without a cache: what changed since an earlier scan is a matter of each machine.
+        self.arguments = ["--cache", "off", self.seen_as / "plugins"]
         self.user = pwd.getpwuid(os.getuid()).pw_name
 
     def make_machine(self, name):
@@ -133,7 +135,7 @@ class ManyMachines(unittest.TestCase):
     def one_machine(self):
         """The events of a scan of everything on a machine of its own."""
         machine = self.make_machine("alone")
-        arguments = ["--quiet", "--json", "-", self.seen_as / "plugins"]
+        arguments = ["--quiet", "--json", "-", *self.arguments]
         return read_events(self.run_here(*machine, "vsttorture-scan", *arguments, status=1).stdout)
 
     def check_merged(self, one, machines):
@@ -182,7 +184,7 @@ class Hosts(ManyMachines):
         environment = self.environment(PARALLEL_SSH=self.ssh, PARALLEL_HOME=self.folder / "parallel",
                                        TMPDIR=self.folder)
         environment["PATH"] = f"{self.folder}/alone/bin:{SYSTEM_PATH}"
-        return self.run_here(EXAMPLES / "scan_on_hosts.sh", "host1,host2", "4", self.output, self.seen_as / "plugins",
+        return self.run_here(EXAMPLES / "scan_on_hosts.sh", "host1,host2", "4", self.output, *self.arguments,
                              env=environment, **more)
 
     def test_the_merged_report_of_two_hosts_is_that_of_one(self):
@@ -291,7 +293,7 @@ class JobArray(ManyMachines):
     def test_the_merged_report_of_a_job_array_is_that_of_one_machine(self):
         one = self.one_machine()
         self.run_here("sbatch", "--wait", "--array=1-4", "--output", self.logs / "task-%a", EXAMPLES / "scan_array.sh",
-                      self.output, self.seen_as / "plugins", env=self.environment_of_slurm, cwd=self.folder)
+                      self.output, *self.arguments, env=self.environment_of_slurm, cwd=self.folder)
         self.check_merged(one, set(self.NODES))
 
 

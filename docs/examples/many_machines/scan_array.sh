@@ -8,6 +8,8 @@
 # RESULTS is a folder that all nodes share; the events of task K go to part-K.jsonl there. ARGUMENT...: options and
 # folders for vsttorture-scan. Every node has vsttorture-scan in its path, and the same plug-ins at the same paths.
 #
+# Where the homes of the nodes are on a network file system, add --cache off: SQLite's locks do not work there.
+#
 # A plug-in that fails is a result and no failure of the task: the array counts as failed only when a part of the scan
 # is missing. Other batch systems differ in the three variables.
 #SBATCH --job-name=vsttorture-scan

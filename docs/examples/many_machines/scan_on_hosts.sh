@@ -12,6 +12,8 @@
 # ARGUMENT...: options and folders for vsttorture-scan. Every host has vsttorture-scan in its path, and the same
 # plug-ins at the same paths. Without folders each host looks where hosts look.
 #
+# Where the homes of the hosts are on a network file system, add --cache off: SQLite's locks do not work there.
+#
 # Standard output is the merged report. Status: that of the merged scan, 0 for all as wanted and 1 for something not;
 # 3 when a part is missing.
 set -euo pipefail
