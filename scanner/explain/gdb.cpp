@@ -9,6 +9,10 @@
 #include <optional>
 #include <set>
 #include <sstream>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
 
 #include <fmt/format.h>
 
@@ -20,12 +24,13 @@ namespace {
 constexpr const char* kBackTrace = "bt 40";
 constexpr std::size_t kMostBytesOfReport = 64 * 1024;
 
-/// Where a module lies in memory.
-struct Extent {
+/// A part of memory that holds a part of a file.
+struct Mapping {
   std::uint64_t begin = 0;
   std::uint64_t end = 0;
+  std::uint64_t base = 0;  ///< Where the file's beginning lies.
+  std::string path;
 };
-using Extents = std::map<std::string, Extent>;  ///< By the module's path.
 
 bool isBlank(char c) { return c == ' ' || c == '\t'; }
 
@@ -44,8 +49,9 @@ std::optional<std::uint64_t> takeAddress(std::string_view& text) {
   return std::strtoull(digits.c_str(), nullptr, 16);
 }
 
-/// A line of "info proc mappings": begin, end, size, offset, rights, path. The first of a path has its beginning.
-void readMapping(std::string_view line, Extents& extents) {
+/// A line of "info proc mappings": begin, end, size, offset, rights, path. The first mapping of a module has its
+/// beginning; a file that is no module may be mapped anywhere, and several times.
+void readMapping(std::string_view line, std::vector<Mapping>& mappings) {
   std::string_view rest = withoutBlanks(line);
   std::uint64_t numbers[4] = {};
   for (std::uint64_t& number : numbers) {
@@ -56,9 +62,11 @@ void readMapping(std::string_view line, Extents& extents) {
   }
   const std::size_t slash = rest.find('/');
   if (slash == std::string_view::npos) return;
-  Extent& extent =
-      extents.try_emplace(std::string(rest.substr(slash)), Extent{numbers[0] - numbers[3], 0}).first->second;
-  extent.end = std::max(extent.end, numbers[1]);
+  Mapping mapping{numbers[0], numbers[1], numbers[0] - numbers[3], std::string(rest.substr(slash))};
+  const auto earlier = std::find_if(mappings.rbegin(), mappings.rend(),
+                                    [&](const Mapping& other) { return other.path == mapping.path; });
+  if (earlier != mappings.rend() && numbers[3] != 0) mapping.base = earlier->base;
+  mappings.push_back(std::move(mapping));
 }
 
 /// "#1  0x00007f in function (...) at file.c:12", "#0  function (...) at file.c:12", "#2  0x00007f in ?? () from
@@ -108,16 +116,16 @@ struct Log {
 };
 
 /// gdb names no module where it knows the file, nor for the program itself. The mappings know all.
-void findModules(std::vector<Frame>& frames, const Extents& extents) {
+void findModules(std::vector<Frame>& frames, const std::vector<Mapping>& mappings) {
   // A function that was inlined has the address of the one that it was inlined into.
   for (std::size_t i = frames.size(); i-- > 1;) {
     if (frames[i - 1].address == 0) frames[i - 1].address = frames[i].address;
   }
   for (Frame& frame : frames) {
-    for (const auto& [path, extent] : extents) {
-      if (frame.address < extent.begin || frame.address >= extent.end) continue;
-      frame.module = path;
-      frame.offset = frame.address - extent.begin;
+    for (const Mapping& mapping : mappings) {
+      if (frame.address < mapping.begin || frame.address >= mapping.end) continue;
+      frame.module = mapping.path;
+      frame.offset = frame.address - mapping.base;
     }
   }
   // Where the way back is lost, what follows is nowhere.
@@ -129,7 +137,7 @@ Log readLog(std::string_view text) {
   constexpr std::string_view kSignal = " received signal ";
   constexpr std::string_view kInstruction = "=> ";
   Log log;
-  Extents extents;
+  std::vector<Mapping> mappings;
   std::istringstream lines{std::string(text)};
   bool isInStack = false;
   for (std::string line; std::getline(lines, line);) {
@@ -152,7 +160,7 @@ Log readLog(std::string_view text) {
     } else if (line.rfind("[Inferior ", 0) == 0) {
       log.end = line;
     } else {
-      readMapping(line, extents);
+      readMapping(line, mappings);
       std::istringstream words(line);
       std::string name;
       std::string value;
@@ -162,7 +170,7 @@ Log readLog(std::string_view text) {
   // Of a frame that stands at the beginning of a line gdb shows no address.
   if (!log.stacks.empty() && log.stacks.back().front().address == 0)
     log.stacks.back().front().address = log.programCounter;
-  for (std::vector<Frame>& stack : log.stacks) findModules(stack, extents);
+  for (std::vector<Frame>& stack : log.stacks) findModules(stack, mappings);
   return log;
 }
 

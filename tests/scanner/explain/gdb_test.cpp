@@ -63,6 +63,18 @@ TEST(ReadGdb, ASignalHasItsPlaceItsInstructionAndTheRegistersThatItReachesThroug
   EXPECT_EQ(diagnosis.problem, "");
 }
 
+TEST(ReadGdb, AFileThatIsMappedBeforeAndBehindThePluginIsNotTakenForIt) {
+  const std::string record = "     0x1000     0x0  rw-s   /var/tmp/scratch/record\n";
+  const Diagnosis diagnosis = read(std::string("Program received signal SIGSEGV, Segmentation fault.\n"
+                                               "#0  0x00007fff00004123 in Effect::bypass() ()\n"
+                                               "=> 0x7fff00004123:\tud2\n") +
+                                       kMappings + "      0x7ffe00000000     0x7ffe00001000" + record +
+                                       "      0x7fff20000000     0x7fff20001000" + record,
+                                   ended(Verdict::kCrashed, SIGSEGV));
+  ASSERT_EQ(diagnosis.findings.size(), 1U);
+  EXPECT_EQ(diagnosis.findings[0].text, "SIGSEGV in Effect::bypass() (a plug-in.so+0x4123), at ud2");
+}
+
 TEST(ReadGdb, AFrameAtTheBeginningOfALineGetsItsModuleFromTheProgramCounter) {
   const Diagnosis diagnosis =
       read(std::string("Catchpoint 1 (call to syscall exit_group), __GI__exit (...) at _exit.c:30\n"
