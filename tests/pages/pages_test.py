@@ -92,6 +92,8 @@ def musician(world):
 
 
 def update_the_delay(world):
+    page = (world.home / "plug-ins.html").read_text()  # Of the heading before.
+    assert "old_synth.so" in page, page
     world.put("well_behaved_effect.so", ".vst/delay.so")
 
 
@@ -123,7 +125,7 @@ PAGES = {
 
 VARIABLE = [(r"\b\d+(\.\d+)? (s|ms|min)\b", "# s"), (r"\+0x[0-9a-f]+", "+0x#"), (r"\b\d{4}-\d\d-\d\d\b", "DATE"),
             (r"\b\d\d:\d\d(:\d\d)?\b", "TIME"), (r"\b\d+ at a time", "# at a time"),
-            (r"sandbox: (bubblewrap|none( \([^)]*\))?)", "sandbox: #")]
+            (r"\b0\.\d+\.\d+\b", "VERSION"), (r"sandbox: (bubblewrap|none( \([^)]*\))?)", "sandbox: #")]
 
 
 def comparable(text):
