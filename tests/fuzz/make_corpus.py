@@ -121,9 +121,9 @@ FULL = {**ENDED, **SEEN, "plugin": {**PLUGIN, "child": -7, "childName": "c"}, "v
         "hangs": "busy", "expected": {"verdict": "passed", "step": None, "reason": "", "isMet": False},
         "repetitions": {"runs": 2, "isFlaky": True, "verdicts": {"passed": 1, "hung at 5": 1}},
         "comparison": {"change": "new", "earlier": {"verdict": "passed", "step": None, "time": 1}},
-        "diagnosis": {"tool": "gdb", "command": ["gdb"], "findings": [{"kind": "k", "text": "t", "frames": ["f"]}],
-                      "problem": None, "report": "r"},
-        "shrunk": {"from": "0,3", "tests": "3", "runs": 2, "isReproduced": True, "command": ["w"]},
+        "diagnosis": {"tool": "gdb", "command": ["gdb"], "problem": None,
+                      "findings": [{"kind": "k", "text": "t", "frames": ["f"], "isInPlugin": True}], "report": "r"},
+        "shrunk": {"from": "0,3", "tests": "3", "runs": 2, "isReproduced": True, "command": ["w"], "problem": None},
         "description": {"name": "n", "children": []}}
 
 

@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include <cmath>
+#include <fstream>
+#include <iterator>
 #include <limits>
 #include <map>
 #include <string>
@@ -207,6 +209,15 @@ TEST(ReadEvent, EveryLineOfRealScansIsWrittenAgainToTheByte) {
     const std::vector<std::string> all = lines(runProgram(SCAN, call).standardOutput);
     EXPECT_GE(all.size(), 4U);
     for (const std::string& line : all) expectReadBack(line + "\n");
+  }
+}
+
+TEST(ReadEvent, TheSeedsOfItsFuzzTargetAreEvents) {
+  for (const char* name : {"everything", "not_run", "parameter", "run_started", "scan_ended", "scan_started"}) {
+    std::ifstream file(std::string(SEEDS) + "/" + name);
+    const std::string line((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
+    std::string problem;
+    EXPECT_TRUE(readEvent(line, &problem)) << name << ": " << problem;
   }
 }
 
