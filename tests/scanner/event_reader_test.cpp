@@ -213,7 +213,8 @@ TEST(ReadEvent, EveryLineOfRealScansIsWrittenAgainToTheByte) {
 }
 
 TEST(ReadEvent, TheSeedsOfItsFuzzTargetAreEvents) {
-  for (const char* name : {"everything", "not_run", "parameter", "run_started", "scan_ended", "scan_started"}) {
+  for (const char* name :
+       {"everything", "not_run", "parameter", "run_started", "scan_ended", "scan_started"}) {
     std::ifstream file(std::string(SEEDS) + "/" + name);
     const std::string line((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
     std::string problem;

@@ -22,10 +22,14 @@ import scan_test_case
 from scan_program_test import NOTHING_TO_CHECK_WITH, SET_SAMPLE_RATE
 from scan_test_case import EFFECT, PLAIN, ScanTest
 
+# Another Python than Debian's can use Debian's package, but does not look there.
+DEBIANS_PACKAGES = "/usr/lib/python3/dist-packages"
+sys.path.append(DEBIANS_PACKAGES)
 try:
     import junitparser
 except ImportError:
     junitparser = None
+sys.path.remove(DEBIANS_PACKAGES)
 
 CRASH = {"FAULT_KIND": "null_store", "FAULT_PLACE": SET_SAMPLE_RATE}
 EXIT = {"FAULT_KIND": "exit", "FAULT_PLACE": SET_SAMPLE_RATE}
