@@ -120,6 +120,13 @@ class Torture(Example):
         self.torture()
         self.assertEqual(sorted(path.name for path in reports.iterdir()), ["junit.xml", "scan.html", "scan.jsonl"])
 
+    def test_without_the_program_it_says_what_is_missing(self):
+        script = self.folder / "torture.sh"
+        shutil.copy(self.SCRIPT, script)
+        done = self.run_program(script, self.plugin, PATH="/usr/bin:/bin")
+        self.assertEqual(done.returncode, 3)
+        self.assertIn("torture.sh: vsttorture-scan is not installed", done.stdout)
+
     def test_wrong_use_and_a_plugin_that_was_not_built_change_no_baseline(self):
         self.assertEqual(self.run_program(self.SCRIPT).returncode, 2)
         self.build_plugin("well_behaved_effect.so")

@@ -32,6 +32,10 @@ fi
 state=${TORTURE_STATE:-.torture}
 reports=${TORTURE_REPORTS:-torture-reports}
 scan=$(command -v vsttorture-scan) || scan=$(dirname "$0")/../../../scan
+if [ ! -x "$scan" ]; then
+  echo "torture.sh: vsttorture-scan is not installed, and $scan is not there" >&2
+  exit 3
+fi
 
 rm -rf "$reports"
 mkdir -p "$reports" "$state" || exit 3
