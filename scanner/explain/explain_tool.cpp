@@ -5,6 +5,7 @@
 #include <filesystem>
 #include <sstream>
 
+#include <fmt/format.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -38,8 +39,8 @@ std::string pathOf(const std::string& program) {
 ExplainTool knownTool(ExplainTool::Kind kind, const std::string& name, const std::string& program) {
   const std::string path = pathOf(program);
   if (path.empty()) {
-    throw UnusableTool("--under " + name + ": there is no " + program + " in PATH; Debian's package " +
-                       program + " has it");
+    throw UnusableTool(fmt::format("--under {}: there is no {} in PATH; Debian's package {} has it", name,
+                                   program, program));
   }
   return {kind, name, {path}};
 }

@@ -18,7 +18,7 @@ namespace {
 constexpr int kLastFixedStep = 15;
 constexpr std::uint64_t kTimesTheMemory = 4;
 constexpr double kPatienceWithGdbInSeconds = 30;
-constexpr std::size_t kMostBytesOfReport = 64 * 1024;
+constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
 
 std::string listText(const std::vector<int>& tests) { return fmt::format("{}", fmt::join(tests, ",")); }
 

@@ -22,7 +22,7 @@ namespace scanner {
 namespace {
 
 constexpr const char* kBackTrace = "bt 40";
-constexpr std::size_t kMostBytesOfReport = 64 * 1024;
+constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
 
 /// A part of memory that holds a part of a file.
 struct Mapping {
@@ -128,9 +128,9 @@ void findModules(std::vector<Frame>& frames, const std::vector<Mapping>& mapping
       frame.offset = frame.address - mapping.base;
     }
   }
-  // Where the way back is lost, what follows is nowhere.
+  // Where gdb loses its way back it takes what it finds on the stack for addresses.
   const auto isNowhere = [](const Frame& frame) { return frame.module.empty() && frame.function.empty(); };
-  while (frames.size() > 1 && isNowhere(frames.back())) frames.pop_back();
+  frames.erase(std::remove_if(frames.begin() + 1, frames.end(), isNowhere), frames.end());
 }
 
 Log readLog(std::string_view text) {
@@ -174,19 +174,18 @@ Log readLog(std::string_view text) {
   return log;
 }
 
-/// The values of those registers that the instruction names: "with rdi = 0x0".
+/// The values of those registers that the instruction names, of one that reaches into memory those that say where:
+/// " with rdi = 0x0".
 std::string registersIn(const std::string& instruction, const std::map<std::string, std::string>& registers) {
   std::string text;
   std::set<std::string> seen;
-  // Of one that reaches into memory those that say where.
   const std::size_t open = instruction.find('(');
-  const std::size_t close = instruction.find(')');
-  if (open != std::string::npos && close != std::string::npos && (open > 0 || close + 1 < instruction.size()))
-    return registersIn(instruction.substr(open + 1, close - open - 1), registers);
-  for (std::size_t at = instruction.find('%'); at != std::string::npos; at = instruction.find('%', at + 1)) {
-    std::size_t end = at + 1;
-    while (end < instruction.size() && std::isalnum(static_cast<unsigned char>(instruction[end])) != 0) ++end;
-    const std::string name = instruction.substr(at + 1, end - at - 1);
+  const std::size_t begin = open == std::string::npos ? 0 : open;
+  const std::size_t end = std::min(instruction.find(')', begin), instruction.size());
+  for (std::size_t at = instruction.find('%', begin); at < end; at = instruction.find('%', at + 1)) {
+    std::size_t behind = at + 1;
+    while (behind < end && std::isalnum(static_cast<unsigned char>(instruction[behind])) != 0) ++behind;
+    const std::string name = instruction.substr(at + 1, behind - at - 1);
     const auto value = registers.find(name);
     if (value == registers.end() || !seen.insert(name).second) continue;
     text += fmt::format("{} {} = {}", text.empty() ? " with" : ",", name, value->second);

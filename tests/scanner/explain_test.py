@@ -6,10 +6,8 @@
 Each command that a result names is run, and must show the same. What needs valgrind or gdb is skipped where these are
 not installed, or fails with VSTTORTURE_DEBUGGERS=required in the environment.
 """
-import argparse
 import json
 import os
-import pathlib
 import shutil
 import signal
 import subprocess
@@ -17,10 +15,9 @@ import sys
 import time
 import unittest
 
-import scan_program_test
-from scan_program_test import EFFECT, ScanTest
+import scan_test_case
+from scan_test_case import EFFECT, ScanTest
 
-PLUGINS = None  # From the command line.
 TAIL_SIZE = "dispatch:52"  # Asked for in step 6, by test 4.
 
 
@@ -34,7 +31,7 @@ class ExplainTest(ScanTest):
         return {"FAULT_KIND": kind, "FAULT_PLACE": place}
 
     def result(self, plugin, *arguments, status=1, **more):
-        return self.results(*arguments, PLUGINS / plugin, status=status, **more)[plugin]
+        return self.results(*arguments, scan_test_case.PLUGINS / plugin, status=status, **more)[plugin]
 
     def run_command(self, command, environment=None):
         """A command of a result: its status and both outputs."""
@@ -61,7 +58,7 @@ class Shrink(ExplainTest):
     def test_a_failure_that_needs_a_history_of_tests_keeps_that_alone(self):
         # The sample fails in about every second random part.
         for _ in range(40):
-            result = self.results("--shrink", PLUGINS / "crashes_after_two_states.so")["crashes_after_two_states.so"]
+            result = self.results("--shrink", scan_test_case.PLUGINS / "crashes_after_two_states.so")["crashes_after_two_states.so"]
             if result["verdict"] == "crashed":
                 break
         self.assertEqual(result["verdict"], "crashed")
@@ -106,7 +103,7 @@ class Shrink(ExplainTest):
             #include <unistd.h>
             #include <dlfcn.h>
             void *VSTPluginMain(void *host) {{
-              void *(*next)(void *) = dlsym(dlopen("{PLUGINS / 'faulty.so'}", RTLD_NOW), "VSTPluginMain");
+              void *(*next)(void *) = dlsym(dlopen("{scan_test_case.PLUGINS / 'faulty.so'}", RTLD_NOW), "VSTPluginMain");
               return next(host);
             }}
             __attribute__((constructor)) static void begin(void) {{
@@ -123,7 +120,7 @@ class Shrink(ExplainTest):
         self.assertIsNone(self.result(EFFECT, "--shrink", status=0)["shrunk"])
 
     def test_people_see_the_list_and_the_command(self):
-        report = self.report("--shrink", PLUGINS / "faulty.so", environment=self.fault("null_store"))
+        report = self.report("--shrink", scan_test_case.PLUGINS / "faulty.so", environment=self.fault("null_store"))
         self.assertRegex(report, r"  shortest list of tests: 1 of 5, found in 1 run\n"
                                  r"  shortest: \S+/vsttorture-worker --tests 4 \S+/faulty\.so\n")
 
@@ -138,7 +135,7 @@ class Repeat(ExplainTest):
         self.assertEqual(result["command"][0], "env")
         self.assertEqual(self.run_command(result["command"])[0], 7)
         self.assertIn("flaky: 80 % of the runs failed: 4 of 5 crashed at 6, 1 of 5 passed\n",
-                      self.report("--repeat", "5", PLUGINS / "uses_fresh_memory.so"))
+                      self.report("--repeat", "5", scan_test_case.PLUGINS / "uses_fresh_memory.so"))
 
     def test_its_list_is_shrunk_with_the_same_memory(self):
         shrunk = self.result("uses_fresh_memory.so", "--repeat", "2", "--shrink")["shrunk"]
@@ -153,7 +150,7 @@ class WrongTools(ExplainTest):
                                ("no-such-tool -x", "there is no program no-such-tool"), ("", "there is no command"),
                                ("sh -c 'x", "a quote is not closed in: sh -c 'x")]:
             with self.subTest(tool=tool):
-                result = self.scan("--under", tool, PLUGINS / EFFECT, environment={"PATH": "/nowhere"})
+                result = self.scan("--under", tool, scan_test_case.PLUGINS / EFFECT, environment={"PATH": "/nowhere"})
                 self.assertEqual(result.returncode, 2)
                 self.assertIn(sentence, result.stderr)
                 self.assertEqual(result.stdout, "")
@@ -184,7 +181,7 @@ class Command(ExplainTest):
 
     def test_what_failed_in_its_random_part_fails_under_the_command_too(self):
         for _ in range(40):
-            result = self.results("--under", "env", PLUGINS / "crashes_after_two_states.so")
+            result = self.results("--under", "env", scan_test_case.PLUGINS / "crashes_after_two_states.so")
             result = result["crashes_after_two_states.so"]
             if result["verdict"] == "crashed":
                 break
@@ -204,8 +201,8 @@ class Command(ExplainTest):
         # The tool says where it is before it waits.
         wait = self.folder / "wait"
         program = subprocess.Popen(
-            [scan_program_test.SCAN, "--cache", "off", "--sandbox", "off", "--json", "-", "--under",
-             f"sh -c 'touch {wait}; sleep 60' x", PLUGINS / "open_crashes.so"],
+            [scan_test_case.SCAN, "--cache", "off", "--sandbox", "off", "--json", "-", "--under",
+             f"sh -c 'touch {wait}; sleep 60' x", scan_test_case.PLUGINS / "open_crashes.so"],
             env=self.environment(), stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
         end = time.monotonic() + 60
         while not wait.exists() and time.monotonic() < end:
@@ -303,7 +300,7 @@ class Memcheck(ExplainTest):
         self.assertNotIn("--tests", result["diagnosis"]["command"])
 
     def test_people_see_findings_of_what_passed(self):
-        report = self.report("--under", "memcheck", PLUGINS / "uses_fresh_memory.so")
+        report = self.report("--under", "memcheck", scan_test_case.PLUGINS / "uses_fresh_memory.so")
         self.assertIn("uses_fresh_memory.so  with findings of memcheck\n", report)
         self.assertRegex(report, r"  memcheck: Conditional jump or move depends on uninitialised value")
         self.assertIn("  under memcheck: valgrind --tool=memcheck", report)
@@ -314,17 +311,5 @@ class Memcheck(ExplainTest):
         self.assertIn("InvalidWrite", [finding["kind"] for finding in result["diagnosis"]["findings"]])
 
 
-def main():
-    global PLUGINS
-    parser = argparse.ArgumentParser()
-    parser.add_argument("--scan", required=True, type=pathlib.Path)
-    parser.add_argument("--plugins", required=True, type=pathlib.Path)
-    options, rest = parser.parse_known_args()
-    PLUGINS = options.plugins.resolve()
-    scan_program_test.SCAN, scan_program_test.PLUGINS = options.scan.resolve(), PLUGINS
-    program = unittest.main(argv=[sys.argv[0], *rest], exit=False)
-    return 0 if program.result.wasSuccessful() else 1
-
-
 if __name__ == "__main__":
-    sys.exit(main())
+    sys.exit(scan_test_case.main())

@@ -18,11 +18,13 @@ constexpr const char* kMappings =
     "Mapped address spaces:\n"
     "\n"
     "          Start Addr           End Addr       Size     Offset  Perms  objfile\n"
+    "      0x555500000000     0x555500001000     0x1000        0x0  rw-s   /tmp/record\n"
     "      0x555500001000     0x555500009000     0x8000     0x1000  r-xp   "
     "/usr/lib/vsttorture/vsttorture-worker\n"
     "      0x7fff00000000     0x7fff00004000     0x4000        0x0  r--p   /usr/lib/vst/a plug-in.so\n"
     "      0x7fff00004000     0x7fff00009000     0x5000     0x4000  r-xp   /usr/lib/vst/a plug-in.so\n"
-    "      0x7fff10000000     0x7fff10009000     0x9000        0x0  r-xp   /lib/x86_64-linux-gnu/libc.so.6\n";
+    "      0x7fff10000000     0x7fff10009000     0x9000        0x0  r-xp   /lib/x86_64-linux-gnu/libc.so.6\n"
+    "      0x7fff20000000     0x7fff20001000     0x1000        0x0  rw-s   /tmp/record\n";
 
 Judgement ended(Verdict verdict, std::optional<int> signal = std::nullopt) {
   Judgement judgement;
@@ -106,14 +108,18 @@ TEST(ReadGdb, OfSeveralThreadsTheOneThatRunsTheTestsCounts) {
   EXPECT_EQ(diagnosis.findings.at(0).text, "It was stopped at the limit in wait() (a plug-in.so+0x4200)");
 }
 
-TEST(ReadGdb, FramesThatAreNowhereAreLeftOutAtTheEnd) {
+TEST(ReadGdb, FramesBehindTheFirstThatAreNowhereAreLeftOut) {
   const Diagnosis diagnosis =
       read(std::string("#0  0x00007fff00004123 in ?? () from /usr/lib/vst/a plug-in.so\n"
                        "#1  0x00007ffc12345678 in ?? ()\n"
-                       "#2  0x0000000000000000 in ?? ()\n") +
+                       "#2  0x00007fff00004200 in ?? () from /usr/lib/vst/a plug-in.so\n"
+                       "#3  0x0000000000000000 in ?? ()\n") +
                kMappings,
            ended(Verdict::kCrashed, SIGSEGV));
-  EXPECT_THAT(diagnosis.findings.at(0).frames, ElementsAre("a plug-in.so+0x4123"));
+  EXPECT_THAT(diagnosis.findings.at(0).frames, ElementsAre("a plug-in.so+0x4123", "a plug-in.so+0x4200"));
+  EXPECT_THAT(
+      read("#0  0x0000000000001234 in ?? ()\n", ended(Verdict::kCrashed, SIGSEGV)).findings.at(0).frames,
+      ElementsAre("0x1234"));
 }
 
 TEST(ReadGdb, ThrowsAndExitsOfTheWorkerItselfAreNoFindings) {
