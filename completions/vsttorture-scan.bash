@@ -19,7 +19,7 @@ _vsttorture_scan() {
       mapfile -t COMPREPLY < <(compgen -W "memcheck gdb" -- "$current")
       return
       ;;
-    --skip | --expect | --baseline | --cache | --json | --junit)
+    --skip | --expect | --baseline | --cache | --json | --junit | --html)
       compopt -o filenames
       mapfile -t COMPREPLY < <(compgen -f -- "$current")
       return
@@ -35,8 +35,8 @@ _vsttorture_scan() {
   esac
   if [[ $current == -* ]]; then
     mapfile -t COMPREPLY < <(compgen -W "--jobs --step-limit --limit --memory --repeat --under --shrink --skip --expect
-      --baseline --shard --sandbox --describe --display --cache --fresh --json --junit --quiet --no-progress --workers
-      --help --version" -- "$current")
+      --baseline --shard --sandbox --describe --display --cache --fresh --json --junit --html --quiet --no-progress
+      --workers --help --version" -- "$current")
   else
     compopt -o filenames
     mapfile -t COMPREPLY < <(compgen -f -- "$current")

@@ -122,6 +122,9 @@ void addReportOptions(CLI::App& app, ReportFiles& reports, std::string& baseline
   app.add_option("--junit", reports.junit,
                  "Write a JUnit report, for CI systems, at the end; - is standard output")
       ->type_name("FILE");
+  app.add_option("--html", reports.html,
+                 "Write a report as one HTML page, for a browser, at the end; - is standard output")
+      ->type_name("FILE");
   app.add_option("--baseline", baselineFile,
                  "Only what is new compared with this record of --json is a failure")
       ->type_name("FILE");
@@ -145,7 +148,8 @@ bool parseCommandLine(CLI::App& app, int argc, const char* const* argv, int& sta
 }
 
 bool useStandardOutputOnce(const std::string& jsonFile, const ReportFiles& reports) {
-  if (jsonFile != "-" || !reports.useStandardOutput()) return true;
+  const int uses = (jsonFile == "-" ? 1 : 0) + (reports.junit == "-" ? 1 : 0) + (reports.html == "-" ? 1 : 0);
+  if (uses <= 1) return true;
   std::fprintf(stderr, "vsttorture-scan: only one report can go to standard output\n");
   return false;
 }

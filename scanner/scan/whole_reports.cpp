@@ -3,6 +3,7 @@
 
 #include <stdexcept>
 
+#include "scanner/report/html.h"
 #include "scanner/report/junit.h"
 #include "scanner/report/merge.h"
 #include "scanner/scan/whole_file.h"
@@ -18,6 +19,7 @@ struct ReportKind {
 
 constexpr ReportKind kReportKinds[] = {
     {&ReportFiles::junit, junitReport},
+    {&ReportFiles::html, htmlReport},
 };
 
 }  // namespace

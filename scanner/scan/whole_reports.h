@@ -12,9 +12,10 @@ namespace scanner {
 /// Which of them are wanted: each the file to write, "-" for standard output, empty for none.
 struct ReportFiles {
   std::string junit = {};
+  std::string html = {};
 
-  [[nodiscard]] bool areWanted() const { return !junit.empty(); }
-  [[nodiscard]] bool useStandardOutput() const { return junit == "-"; }
+  [[nodiscard]] bool areWanted() const { return !junit.empty() || !html.empty(); }
+  [[nodiscard]] bool useStandardOutput() const { return junit == "-" || html == "-"; }
 };
 
 /// Writes those that are wanted. Returns a sentence for each that could not be.

@@ -1,0 +1,17 @@
+// SPDX-License-Identifier: MIT
+// What the HTML report shows of one plug-in when its row is opened.
+#pragma once
+
+#include <string>
+
+#include "scanner/events/result.h"
+
+namespace scanner {
+
+/// One element with everything that is known of it.
+std::string htmlDetails(const PluginResult& result);
+
+/// Whether it did not always end the same way.
+bool isFlaky(const PluginResult& result);
+
+}  // namespace scanner
