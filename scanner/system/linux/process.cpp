@@ -66,7 +66,6 @@ rlimit& usualDescriptorLimit() {
   if (start.fileSizeInBytes > 0) limit(RLIMIT_FSIZE, start.fileSizeInBytes);
   if (chdir(start.workingDirectory.c_str()) == 0) execve(command[0], command, environment);
   const int error = errno;
-  // NOLINTNEXTLINE(clang-analyzer-unix.Vfork): a system call that changes no memory of the parent's
   [[maybe_unused]] const ssize_t written = write(failure, &error, sizeof error);
   _exit(127);
 }
@@ -76,6 +75,7 @@ __attribute__((noinline)) pid_t beginProgram(const ProcessStart& start, char* co
                                              char* const* environment, int parent, int failure) {
   const pid_t process =
       vfork();  // NOLINT(clang-analyzer-security.insecureAPI.vfork): a fork copies page tables
+  // NOLINTNEXTLINE(clang-analyzer-unix.Vfork): it makes system calls, and changes nothing that this process reads
   if (process == 0) becomeProgram(start, command, environment, parent, failure);
   return process;
 }
