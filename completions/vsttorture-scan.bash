@@ -7,7 +7,7 @@ _vsttorture_scan() {
     return
   fi
   if [[ ${COMP_WORDS[1]} == report && $COMP_CWORD -gt 1 && $current == -* ]]; then
-    mapfile -t COMPREPLY < <(compgen -W "--json --junit --baseline --quiet --help" -- "$current")
+    mapfile -t COMPREPLY < <(compgen -W "--json --junit --html --baseline --quiet --help" -- "$current")
     return
   fi
   case $previous in

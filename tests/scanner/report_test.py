@@ -205,7 +205,8 @@ class WrongUse(ReportTest):
         self.assert_ends("FILE is required")
         self.assert_ends("--lunch", "--lunch", good)
         self.assert_ends("standard input can be read once only", "-", "-")
-        self.assert_ends("only one report can go to standard output", "--json", "-", "--junit", "-", good)
+        for first, second in [("--json", "--junit"), ("--json", "--html"), ("--junit", "--html")]:
+            self.assert_ends("only one report can go to standard output", first, "-", second, "-", good)
 
     def test_every_option_of_the_help_is_completed(self):
         text = self.report("--help").stdout
@@ -228,7 +229,7 @@ class Files(ReportTest):
         file = self.record("results", plugins() / EFFECT)
         for target, reason in [("/nowhere/x", "No such file or directory"), ("/dev/full", "No space left on device"),
                                ("home", "Is a directory")]:
-            for option in ("--junit", "--json"):
+            for option in ("--junit", "--json", "--html"):
                 with self.subTest(option=option, target=target):
                     result = self.report(option, target, file)
                     self.assertEqual(result.returncode, 3)
