@@ -723,10 +723,14 @@ class Looks(BrowserTest):
 
     def test_assistive_technology_finds_a_table_and_a_name_for_each_control(self):
         self.open()
-        nodes = [node for node in self.devtools("Accessibility.getFullAXTree")["nodes"] if not node["ignored"]]
+        # The rows are there when they have been drawn.
+        deadline = time.monotonic() + 10
         by_role = {}
-        for node in nodes:
-            by_role.setdefault(node["role"]["value"], []).append(node.get("name", {}).get("value", ""))
+        while len(by_role.get("row", [])) < 1 + 2 * len(ORDER) and time.monotonic() < deadline:
+            by_role = {}
+            for node in self.devtools("Accessibility.getFullAXTree")["nodes"]:
+                if not node["ignored"]:
+                    by_role.setdefault(node["role"]["value"], []).append(node.get("name", {}).get("value", ""))
         self.assertEqual(by_role["table"], ["Results, failures first"])
         self.assertEqual(by_role["columnheader"], ["Verdict", "Plug-in", "Cause", "Step", "Time", "Change"])
         self.assertEqual(by_role["searchbox"], ["Filter"])
