@@ -61,6 +61,7 @@ std::string endInWords(const RunSeen& seen) {
   if (seen.limitHit == LimitHit::kStep || seen.limitHit == LimitHit::kRun)
     return "took longer than its limit";
   if (seen.limitHit != LimitHit::kNone) return "used more than it may";
+  if (seen.end.kind == End::Kind::kNotEnded) return "did not end";
   if (seen.end.kind == End::Kind::kSignalled) return "was ended by " + nameOfSignal(seen.end.signal);
   return fmt::format("ended with status {}", seen.end.status);
 }
@@ -93,7 +94,7 @@ bool failsInTheSameWay(const Judgement& first, const Judgement& again) {
 struct Explainer::Case {
   PluginResult& result;
   std::vector<std::string> environment;
-  std::function<void()> done;
+  Done done;
   std::vector<int> tests = {};  ///< That the failing run had begun.
   bool isInTest = false;        ///< Whether it failed in one of them, or behind the last one.
   std::optional<ListShrinker> shrinker = {};
@@ -102,11 +103,10 @@ struct Explainer::Case {
 Explainer::Explainer(RunEngine& engine_, const ExplainOptions& options_, const Limits& limits_)
     : engine(engine_), options(options_), limits(limits_) {}
 
-void Explainer::explain(PluginResult& result, std::vector<std::string> environment,
-                        std::function<void()> done) {
+void Explainer::explain(PluginResult& result, std::vector<std::string> environment, Done done) {
   const Verdict verdict = result.judgement.verdict;
   if (!result.seen || !isRun(verdict) || (!options.tool && !options.shrinks)) {
-    done();
+    done(true);
     return;
   }
   const auto open = std::make_shared<Case>(Case{result, std::move(environment), std::move(done)});
@@ -162,7 +162,7 @@ void Explainer::runNextList(const Open& open) {
       [this, open, tests](const RunSeen& seen) {
         if (seen.limitHit == LimitHit::kInterrupted) {
           open->result.shrunk->problem = "interrupted";
-          open->done();
+          open->done(false);
           return;
         }
         const Judgement judgement = judge(seen, limits, tests.size());
@@ -178,7 +178,7 @@ void Explainer::runNextList(const Open& open) {
 void Explainer::diagnose(const Open& open) {
   PluginResult& result = open->result;
   if (!options.tool) {
-    open->done();
+    open->done(true);
     return;
   }
   const ExplainTool& tool = *options.tool;
@@ -186,7 +186,7 @@ void Explainer::diagnose(const Open& open) {
   diagnosis.tool = tool.name;
   if (tool.kind == ExplainTool::Kind::kGdb && !canStopAt(result.judgement, diagnosis.problem)) {
     if (!diagnosis.problem.empty()) result.diagnosis = diagnosis;
-    open->done();
+    open->done(true);
     return;
   }
   // The whole run finds the most. What failed in its random part is not in another one.
@@ -239,13 +239,13 @@ void Explainer::diagnosed(const Open& open, const RunSeen& seen, const std::vect
   const PluginResult& result = open->result;
   Diagnosis& diagnosis = *open->result.diagnosis;
   if (seen.limitHit == LimitHit::kInterrupted) {
-    open->done();
+    open->done(false);
     return;
   }
   diagnosis.problem.clear();
   if (seen.end.kind == End::Kind::kNotStarted) {
     diagnosis.problem = "it could not be started: " + seen.end.reason;
-    open->done();
+    open->done(true);
     return;
   }
   switch (options.tool->kind) {
@@ -271,7 +271,7 @@ void Explainer::diagnosed(const Open& open, const RunSeen& seen, const std::vect
       break;
     }
   }
-  open->done();
+  open->done(true);
 }
 
 Job Explainer::workerJob(const Case& open, const std::vector<int>& tests) const {

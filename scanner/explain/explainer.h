@@ -38,11 +38,14 @@ class Explainer {
   /// `engine` and `options` outlive this. `limits` are those of the usual run.
   Explainer(RunEngine& engine, const ExplainOptions& options, const Limits& limits);
 
+  /// Whether nothing is missing because the engine was interrupted.
+  using Done = std::function<void(bool isWhole)>;
+
   /// Fills in `shrunk` and `diagnosis`, as far as the options ask for them and the verdict allows, and then calls
   /// `done`, at once where there is nothing to do. `environment` is what the run had that gave the verdict. The result
   /// must live until then. When the engine is interrupted, `done` may never be called; what is known by then is in
   /// the result.
-  void explain(PluginResult& result, std::vector<std::string> environment, std::function<void()> done);
+  void explain(PluginResult& result, std::vector<std::string> environment, Done done);
 
  private:
   struct Case;

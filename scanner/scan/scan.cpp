@@ -239,7 +239,10 @@ class Scan {
     if (plugin->isStopped) {
       deliver(plugin);
     } else {
-      explainer->explain(result, plugin->environment, [this, plugin] { explained(plugin); });
+      explainer->explain(result, plugin->environment, [this, plugin](bool isWhole) {
+        plugin->isStopped = !isWhole;
+        explained(plugin);
+      });
     }
   }
 
@@ -249,7 +252,7 @@ class Scan {
     const bool isDescribable =
         isShell || (options.describes && result.judgement.verdict != Verdict::kNotLoadable &&
                     result.judgement.verdict != Verdict::kRefused);
-    if (isDescribable) {
+    if (isDescribable && !plugin->isStopped) {
       describe(plugin, isShell);
     } else {
       deliver(plugin);

@@ -197,12 +197,13 @@ class Command(ExplainTest):
     def test_a_plugin_that_cannot_be_loaded_is_not_run_again(self):
         self.assertIsNone(self.result("undefined_symbol.so", "--under", "env")["diagnosis"])
 
-    def test_a_scan_that_is_interrupted_during_the_further_run_gives_the_verdict(self):
-        # The tool says where it is before it waits.
+    def test_a_scan_that_is_interrupted_during_the_further_run_gives_the_verdict_and_does_not_remember_it(self):
+        # The tool says where it is before it waits; the next time it does not wait.
         wait = self.folder / "wait"
+        tool = f"sh -c 'test -e {wait} && exit 7; touch {wait}; sleep 60' x"
+        plugin, cache = scan_test_case.PLUGINS / "open_crashes.so", self.folder / "results"
         program = subprocess.Popen(
-            [scan_test_case.SCAN, "--cache", "off", "--sandbox", "off", "--json", "-", "--under",
-             f"sh -c 'touch {wait}; sleep 60' x", scan_test_case.PLUGINS / "open_crashes.so"],
+            [scan_test_case.SCAN, "--cache", cache, "--sandbox", "off", "--json", "-", "--under", tool, plugin],
             env=self.environment(), stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
         end = time.monotonic() + 60
         while not wait.exists() and time.monotonic() < end:
@@ -213,6 +214,20 @@ class Command(ExplainTest):
         ended = [json.loads(line) for line in output.splitlines()][2]
         self.assertEqual((ended["event"], ended["verdict"]), ("plugin_ended", "crashed"))
         self.assertEqual(ended["diagnosis"]["problem"], "interrupted")
+        for is_remembered in (False, True):
+            result = self.results("--under", tool, plugin, cache=cache)["open_crashes.so"]
+            self.assertEqual((result["isRemembered"], result["diagnosis"]["problem"]), (is_remembered, None))
+        # Another tool is another question.
+        self.assertFalse(self.results("--under", "env", plugin, cache=cache)["open_crashes.so"]["isRemembered"])
+        self.assertFalse(self.results("--shrink", plugin, cache=cache)["open_crashes.so"]["isRemembered"])
+
+    def test_findings_of_what_passed_are_remembered(self):
+        cache = self.folder / "results"
+        for is_remembered in (False, True):
+            result = self.result(EFFECT, "--under", "false", cache=cache)
+            self.assertEqual((result["isRemembered"], result["isWanted"]), (is_remembered, False))
+            self.assertIn("with findings of false", self.report("--under", "false", scan_test_case.PLUGINS / EFFECT,
+                                                                cache=cache))
 
 
 @needs("gdb")
