@@ -123,7 +123,9 @@ class Torture(Example):
     def test_without_the_program_it_says_what_is_missing(self):
         script = self.folder / "torture.sh"
         shutil.copy(self.SCRIPT, script)
-        done = self.run_program(script, self.plugin, PATH="/usr/bin:/bin")
+        (self.folder / "bin").mkdir()
+        (self.folder / "bin/dirname").symlink_to(shutil.which("dirname"))
+        done = self.run_program(script, self.plugin, PATH=str(self.folder / "bin"))
         self.assertEqual(done.returncode, 3)
         self.assertIn("torture.sh: vsttorture-scan is not installed", done.stdout)
 
