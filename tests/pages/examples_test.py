@@ -48,11 +48,13 @@ class Example(unittest.TestCase):
 
 
 class ReadScan(Example):
-    def setUp(self):
-        super().setUp()
-        self.program = self.folder / "read_scan"
+    @classmethod
+    def setUpClass(cls):
+        folder = tempfile.TemporaryDirectory(prefix="vsttorture-example-")
+        cls.addClassCleanup(folder.cleanup)
+        cls.program = pathlib.Path(folder.name, "read_scan")
         subprocess.run([*shlex.split(os.environ.get("CXX", "c++")), "-std=c++17", "-Wall", "-Wextra", "-Werror", "-o",
-                        self.program, EXAMPLES / "read_scan.cpp"], check=True)
+                        cls.program, EXAMPLES / "read_scan.cpp"], check=True)
 
     def assert_both(self, status, output, *arguments):
         for reader in ([self.program], [sys.executable, EXAMPLES / "read_scan.py"]):
