@@ -99,10 +99,12 @@ class Merging(ReportTest):
         self.assertEqual(sorted(map(json.dumps, merged[1:-1])), sorted(map(json.dumps, results)))
 
     def test_real_parts_have_the_verdicts_of_the_whole(self):
-        parts = [self.record(f"part{part}", "--shard", f"{part}/2", plugins()) for part in (1, 2)]
+        # Those whose end depends on the tests that are drawn would make two scans differ.
+        random = self.write("random", "crashes_after_two_states.so\tits end depends on the order of the tests\n")
+        parts = [self.record(f"part{part}", "--skip", random, "--shard", f"{part}/2", plugins()) for part in (1, 2)]
         merged, errors = self.merged(*parts, status=1)
         self.assertEqual(errors, "")
-        whole = self.events(plugins())
+        whole = self.events("--skip", random, plugins())
         self.assertEqual({(event["plugin"]["bundle"], event["plugin"]["child"]): event["verdict"]
                           for event in merged[1:-1]},
                          {(event["plugin"]["bundle"], event["plugin"]["child"]): event["verdict"]
