@@ -125,7 +125,7 @@ PAGES = {
 
 VARIABLE = [(r"\b\d+(\.\d+)? (s|ms|min)\b", "# s"), (r"\+0x[0-9a-f]+", "+0x#"), (r"\b\d{4}-\d\d-\d\d\b", "DATE"),
             (r"\b\d\d:\d\d(:\d\d)?\b", "TIME"), (r"\b\d+ at a time", "# at a time"),
-            (r"\b0\.\d+\.\d+\b", "VERSION"), (r"sandbox: (bubblewrap|none( \([^)]*\))?)", "sandbox: #")]
+            (r"\b0\.\d+\.\d+\b", "VERSION"), (r"sandbox: (bubblewrap|none \(([^()]|\([^()]*\))*\))", "sandbox: #")]
 
 
 def comparable(text):

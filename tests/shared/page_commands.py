@@ -14,7 +14,8 @@ Command = collections.namedtuple("Command", "heading text shown")  # shown: None
 def blocks(page):
     """Every fenced block of the page, which is a path, in its order. The heading is the one of the second level."""
     heading, found = "", []
-    pattern = re.compile(r"^## (?P<heading>[^\n]+)$|^```(?P<language>\w*)\n(?P<text>.*?)^```$", re.MULTILINE | re.DOTALL)
+    pattern = re.compile(r"^## (?P<heading>[^\n]+)$|^```(?P<language>\w*)\n(?P<text>.*?)^```$",
+                         re.MULTILINE | re.DOTALL)
     for match in pattern.finditer(page.read_text()):
         if match["heading"]:
             heading = match["heading"]

@@ -23,5 +23,6 @@ processors=${SLURM_CPUS_PER_TASK:-1}
 results=$1
 shift
 mkdir -p "$results"
-vsttorture-scan --quiet --no-progress --jobs "$processors" --shard "$part/$parts" --json "$results/part-$part.jsonl" "$@"
+vsttorture-scan --quiet --no-progress --jobs "$processors" --shard "$part/$parts" \
+  --json "$results/part-$part.jsonl" "$@"
 [ $? -le 1 ]
