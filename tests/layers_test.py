@@ -3,7 +3,8 @@
 
 A folder may include itself and those below it; vst2/ may be included by host/ and above, flight_recorder/ by those
 that make requests, report or load. Only platform/ asks
-which operating system it is on, or includes a header that neither C++ nor POSIX has.
+which operating system it is on, or includes a header that neither C++ nor POSIX has. In scanner/ a station may include
+those before it, and nothing of what loads plug-ins but the layout and the reader of the flight record.
 
 Tested on the program's own tree, and on small trees with one fault each.
 """
@@ -17,6 +18,19 @@ PROGRAMS = ["worker", "describer"]  # Nobody builds on a program, the other one 
 USERS_OF_VST2 = ["worker", "describer", "driver", "describe", "host", "vst2"]
 USERS_OF_FLIGHT_RECORDER = ["worker", "describer", "driver", "host", "loader", "vst2", "flight_recorder"]
 FOLDERS = [*LAYERS, "vst2", "flight_recorder"]
+# Each with those that it may include beside itself.
+STATIONS = {
+    "system": [],
+    "find": [],
+    "plan": ["find"],
+    "engine": ["system", "flight_recorder"],
+    "judge": ["engine", "flight_recorder"],
+    "events": ["find", "plan", "engine", "judge"],
+    "store": ["find", "plan", "engine", "judge", "events"],
+    "explain": ["find", "plan", "engine", "judge", "events"],
+    "report": ["find", "plan", "engine", "judge", "events"],
+    "scan": ["system", "find", "plan", "engine", "judge", "events", "store", "explain", "report"],
+}
 SUFFIXES = {".h", ".cpp", ".mm"}
 
 POSIX_HEADERS = set("""
@@ -94,6 +108,27 @@ def line_faults(folder, line):
             yield angled_fault(folder, header)
 
 
+def station_fault(station, header):
+    """What is wrong with #include "header" in a station of scanner/; None if nothing is."""
+    first, _, rest = header.partition("/")
+    other = rest.partition("/")[0] if first == "scanner" else first
+    if first not in ("scanner", "flight_recorder") or other not in [station, *STATIONS[station]]:
+        return f"scanner/{station}/ may not include {header.rpartition('/')[0]}/"
+    if other == "system" != station and rest.count("/") > 1:
+        return f'"{header}" belongs to one operating system'
+    return None
+
+
+def station_faults(root):
+    for station in STATIONS:
+        for path in sources(root / "scanner" / station):
+            for number, line in enumerate(without_comments(path.read_text()).split("\n"), 1):
+                include = INCLUDE.match(line)
+                fault = station_fault(station, include[1]) if include and include[1] is not None else None
+                if fault:
+                    yield f"{path.relative_to(root)}:{number}: {fault}"
+
+
 def sources(folder):
     return sorted(path for path in folder.rglob("*") if path.suffix in SUFFIXES)
 
@@ -106,7 +141,7 @@ def faults(root):
             for number, line in enumerate(without_comments(path.read_text()).split("\n"), 1):
                 found += [f"{path.relative_to(root)}:{number}: {fault}"
                           for fault in line_faults(folder, line) if fault]
-    return found
+    return found + list(station_faults(root))
 
 
 class TheProgram(unittest.TestCase):
@@ -116,8 +151,9 @@ class TheProgram(unittest.TestCase):
         self.assertEqual(faults(self.ROOT), [])
 
     def test_sources_of_every_folder_were_read(self):
-        for folder in FOLDERS:
+        for folder in [*FOLDERS, *(f"scanner/{station}" for station in STATIONS)]:
             self.assertTrue(list(sources(self.ROOT / folder)), folder)
+        self.assertEqual({path.name for path in (self.ROOT / "scanner").iterdir() if path.is_dir()}, set(STATIONS))
 
 
 class Faults(unittest.TestCase):
@@ -155,6 +191,28 @@ class Faults(unittest.TestCase):
                     else:
                         self.assert_fault(f"{folder}/a.h", text,
                                           f"{folder}/a.h:2: {folder}/ may not include {other}/")
+
+    def test_a_station_may_include_those_before_it(self):
+        for station, others in STATIONS.items():
+            for other in STATIONS:
+                with self.subTest(station=station, other=other):
+                    text = f'#include "scanner/{other}/x.h"'
+                    if other in [station, *others]:
+                        self.assert_fine(f"scanner/{station}/a.h", text)
+                    else:
+                        self.assert_fault(f"scanner/{station}/a.h", text,
+                                          f"scanner/{station}/a.h:1: scanner/{station}/ may not include "
+                                          f"scanner/{other}/")
+
+    def test_the_scan_includes_nothing_that_loads_plugins(self):
+        for folder in ["host", "driver", "platform", "vst2"]:
+            self.assert_fault("scanner/scan/a.h", f'#include "{folder}/x.h"',
+                              f"scanner/scan/a.h:1: scanner/scan/ may not include {folder}/")
+        self.assert_fine("scanner/judge/a.h", '#include "flight_recorder/flight_record.h"')
+        self.assert_fault("scanner/engine/a.h", '#include "scanner/system/linux/proc.h"',
+                          'scanner/engine/a.h:1: "scanner/system/linux/proc.h" belongs to one operating system')
+        self.assert_fault("host/a.cpp", '#include "scanner/find/module.h"',
+                          "host/a.cpp:1: host/ may not include scanner/")
 
     def test_a_folder_outside_the_program_is_a_fault(self):
         self.assert_fault("host/a.cpp", '#include "tests/a.h"', "host/a.cpp:1: host/ may not include tests/")
