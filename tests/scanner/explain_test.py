@@ -137,6 +137,12 @@ class Repeat(ExplainTest):
         self.assertIn("flaky: 80 % of the runs failed: 4 of 5 crashed at 6, 1 of 5 passed\n",
                       self.report("--repeat", "5", scan_test_case.PLUGINS / "uses_fresh_memory.so"))
 
+    def test_an_expected_end_does_not_make_it_reliable(self):
+        name = "uses_fresh_memory.so"
+        expect = self.write("expect", f"{name}\tcrashed\n")
+        result = self.result(name, "--repeat", "2", "--expect", expect, status=1)
+        self.assertEqual((result["expected"]["isMet"], result["isWanted"]), (True, False))
+
     def test_its_list_is_shrunk_with_the_same_memory(self):
         shrunk = self.result("uses_fresh_memory.so", "--repeat", "2", "--shrink")["shrunk"]
         self.assertEqual(shrunk["tests"], "4")

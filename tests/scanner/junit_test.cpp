@@ -137,7 +137,8 @@ TEST(JunitReport, APassThatIsNotWhatWasExpectedFails) {
   PluginResult result = resultOf("/lib/a.so", Verdict::kPassed);
   result.expected = Expectation{"crashed", 5, "known", false};
   result.isWanted = false;
-  const pugi::xml_node failure = Junit({result}, 1).test().child("failure");
+  const Junit junit({result}, 1);
+  const pugi::xml_node failure = junit.test().child("failure");
   EXPECT_STREQ(failure.attribute("type").value(), "passed");
   EXPECT_STREQ(failure.attribute("message").value(), "expected: crashed at 5 (known), but passed");
 }

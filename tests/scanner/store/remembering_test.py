@@ -22,6 +22,7 @@ from scan_test_case import EFFECT, ScanTest
 
 NOBODY = 65534
 CRASH = {"FAULT_KIND": "null_store", "FAULT_PLACE": "dispatch:10"}
+MEMORY = str(1 << 29)  # MiB: other than the default, and no limit, since a sanitizer can have none.
 HANG = {"FAULT_KIND": "hang", "FAULT_PLACE": "dispatch:10"}
 
 # Notes each of its starts, and becomes the real program.
@@ -186,13 +187,13 @@ class SecondScan(RememberingTest):
 
     def test_other_options_run_again_and_both_results_stay(self):
         plugin = self.plugin()
-        for options in [["--step-limit", "19"], ["--limit", "60"], ["--memory", "2000"], ["--repeat", "2"],
+        for options in [["--step-limit", "19"], ["--limit", "60"], ["--memory", MEMORY], ["--repeat", "2"],
                         ["--describe"], ["--display"]]:
             with self.subTest(options=options):
                 self.assertFalse(self.is_remembered(*options, plugin))
                 self.assertTrue(self.is_remembered(*options, plugin))
         self.assertFalse(self.is_remembered(plugin))
-        self.assertTrue(self.is_remembered("--memory", "2000", "-j", "7", "--no-progress", plugin))
+        self.assertTrue(self.is_remembered("--memory", MEMORY, "-j", "7", "--no-progress", plugin))
         self.assertEqual(self.result("--repeat", "2", plugin)["repetitions"]["runs"], 2)
         self.assertIn("description", self.result("--describe", plugin))
         self.assertFalse(self.is_remembered(plugin, environment={"LD_LIBRARY_PATH": "/lib"}))
