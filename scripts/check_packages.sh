@@ -124,8 +124,9 @@ listing() {
 check_contents() {
   local depends="vsttorture-workers (= $version)" pages=("${programs[@]}") scan_files=
   if [[ $architecture == amd64 ]]; then
-    depends="libc6 (>= 2.34), libfmt9 (>= any), libgcc-s1 (>= any), libstdc++6 (>= 11), libuv1 (>= any), $depends
+    depends="libsqlite3-0 (>= any), libstdc++6 (>= 11), libuv1 (>= any), $depends
 Recommends: bubblewrap"
+    depends="libc6 (>= 2.34), libfmt9 (>= any), libgcc-s1 (>= any), libpugixml1v5 (>= any), $depends"
     pages+=(vsttorture-scan)
     scan_files="-rwxr-xr-x root/root ./usr/bin/vsttorture-scan
 drwxr-xr-x root/root ./usr/share/bash-completion/
