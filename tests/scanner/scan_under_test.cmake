@@ -16,7 +16,7 @@ if(VSTTORTURE_SANITIZE)
   file(CONFIGURE OUTPUT ${sanitized_scan_folder}/vsttorture-scan.in @ONLY CONTENT [[#!/bin/sh
 export ASAN_OPTIONS=use_sigaltstack=0:exitcode=99:quarantine_size_mb=4:include_if_exists=@sanitized_scan_folder@/options.%b
 export LSAN_OPTIONS=suppressions=@PROJECT_SOURCE_DIR@/tests/lsan_suppressions.txt:print_suppressions=0
-export TSAN_OPTIONS=report_signal_unsafe=0:atexit_sleep_ms=0:exitcode=99
+export TSAN_OPTIONS=report_signal_unsafe=0:atexit_sleep_ms=0:exitcode=99:suppressions=@PROJECT_SOURCE_DIR@/tests/fault_matrix/tsan_suppressions.txt
 case "${1-} $*" in
   history* | report* | *--memory*) ;;
   *) set -- --memory 1073741824 "$@" ;;
