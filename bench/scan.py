@@ -5,6 +5,7 @@
     cmake --preset bench && cmake --build --preset bench
     bench/scan.py [--build build/bench] [--copies 200] [--rounds 7] [--modules [FOLDER...]]
     bench/scan.py --sizes 1000 2500 5000 10000 [--build build/bench] [--jobs 2]
+    bench/scan.py --again [--build build/bench] [--modules [FOLDER...]]
 
 A round is: all plug-ins run one after the other without the scan; scanned with -j 1, without and with sandbox;
 scanned with -j 2 without sandbox. Wall and processor time (user and system, of all processes) are taken of each; the
@@ -15,7 +16,7 @@ this machine. A ratio follows each table.
 
 With --sizes it scans so many copies of the plug-in that answers nothing, once each, and prints wall time, time for each
 plug-in and the scan's own peak memory. They are copies, since hard links are one plug-in to the scan. No scan uses
-remembered results. Needs Python's standard library.
+remembered results, but those of --again, which follow one that has filled the database. Needs Python's standard library.
 """
 import argparse
 import json
@@ -79,6 +80,20 @@ class Bench:
         started = [json.loads(line) for line in events.splitlines() if b'"run_started"' in line]
         return sorted({event["plugin"]["bundle"] for event in started if event["plugin"]["child"] is None})
 
+    def scan_again(self, options, folders, rounds):
+        """Wall seconds of scans that follow one with the same options; each must remember everything."""
+        with tempfile.TemporaryDirectory(prefix="scan-bench-") as folder:
+            command = [self.scan, "--cache", os.path.join(folder, "results"), "--no-progress", *options, *folders]
+            walls = []
+            for number in range(rounds + 1):
+                begin = time.perf_counter()
+                process = subprocess.run(command, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                                         stderr=subprocess.DEVNULL, check=False)
+                if number > 0:
+                    walls.append(time.perf_counter() - begin)
+                    if b'"run_started"' in process.stdout:
+                        sys.exit("a plug-in was run again")
+        return walls
 
     def peak_of_scan(self, options, folder):
         """Wall seconds of a scan, and the peak of its own resident memory in bytes, without that of its children."""
@@ -115,6 +130,15 @@ def compare_sizes(bench, sizes, jobs):
     print(f"time for a plug-in, {sizes[-1]} against {sizes[0]}: {costs[-1] / costs[0]:.2f} (goal: linear, 1)")
 
 
+def compare_again(bench, folders, rounds):
+    print(f"load {os.getloadavg()[0]:.1f}, {rounds} rounds")
+    count = len(bench.modules_in(folders))
+    for name, options in (("for people", []), ("with --json", ["--json", "-"])):
+        walls = bench.scan_again(options, folders, rounds)
+        print(f"second scan of {count} unchanged plug-ins, {name}: {statistics.median(walls) * 1000:.0f} ms "
+              f"({min(walls) * 1000:.0f} to {max(walls) * 1000:.0f}; goal: 50)")
+
+
 def main():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
     parser.add_argument("--build", default="build/bench")
@@ -122,11 +146,15 @@ def main():
     parser.add_argument("--rounds", type=int, default=7)
     parser.add_argument("--modules", nargs="*", metavar="FOLDER")
     parser.add_argument("--sizes", type=int, nargs="+", metavar="COUNT")
+    parser.add_argument("--again", action="store_true", help="how long a scan takes that remembers everything")
     parser.add_argument("--jobs", type=int, default=2, help="with --sizes: runs at a time")
     arguments = parser.parse_args()
     bench = Bench(os.path.abspath(arguments.build))
     if arguments.sizes:
         compare_sizes(bench, arguments.sizes, arguments.jobs)
+        return
+    if arguments.again:
+        compare_again(bench, arguments.modules or [], arguments.rounds)
         return
     with tempfile.TemporaryDirectory(prefix="scan-bench-") as folder:
         if arguments.modules is not None:
