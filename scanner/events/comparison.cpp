@@ -35,10 +35,11 @@ Comparison compare(const PluginResult& now, const PluginResult* earlier, bool is
   Comparison comparison;
   comparison.change = changeBetween(now, earlier, isUnchanged);
   if (earlier != nullptr) {
-    Comparison::Earlier& then = comparison.earlier.emplace();
+    Comparison::Earlier then;
     then.verdict = rowOf(earlier->judgement.verdict).word;
     if (earlier->judgement.step > 0) then.step = earlier->judgement.step;
     then.time = earlier->seen ? earlier->seen->startedAt : 0;
+    comparison.earlier = then;
   }
   return comparison;
 }
