@@ -6,21 +6,12 @@
 #include <array>
 
 #include "tests/shared/program_run.h"
+#include "tests/shared/step_texts.h"
 
 namespace {
 
 using Kind = ProtocolLine::Kind;
 
-constexpr std::array<const char*, 15> kOrderedTexts = {
-    "test gathering info",    "inspect class info",
-    "inspect preset info",    "inspect parameter info",
-    "testing setting states", "inspect latency",
-    "inspect stream format",  "inspect stream format",
-    "inspect latency",        "testing setting states",
-    "inspect parameter info", "inspect preset info",
-    "inspect class info",     "initialize",
-    "test gathering info",
-};
 constexpr std::array<const char*, 5> kDrawnTexts = {"inspect class info", "inspect preset info",
                                                     "inspect parameter info", "testing setting states",
                                                     "inspect latency"};

@@ -9,6 +9,7 @@
 
 #include "scanner/judge/judge.h"
 #include "tests/flight_recorder/record_bytes.h"
+#include "tests/shared/step_texts.h"
 
 namespace scanner {
 namespace {
@@ -18,17 +19,8 @@ constexpr std::uint64_t kMiB = 1 << 20;
 // ---- A run that was seen ----------------------------------------------------------------------------------
 
 std::string textOfStep(int step) {
-  static const char* const texts[] = {
-      "test gathering info",    "inspect class info",
-      "inspect preset info",    "inspect parameter info",
-      "testing setting states", "inspect latency",
-      "inspect stream format",  "inspect stream format",
-      "inspect latency",        "testing setting states",
-      "inspect parameter info", "inspect preset info",
-      "inspect class info",     "initialize",
-      "test gathering info",
-  };
-  return step <= 15 ? texts[step - 1] : "inspect latency";
+  const auto index = static_cast<std::size_t>(step - 1);
+  return index < kOrderedTexts.size() ? kOrderedTexts[index] : "inspect latency";
 }
 
 /// A run and its record, built by verbs. The numbers are those of docs/FLIGHT_RECORD.md.

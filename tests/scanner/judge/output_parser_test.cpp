@@ -7,6 +7,7 @@
 #include <gmock/gmock.h>
 
 #include "scanner/engine/output_parser.h"
+#include "tests/shared/step_texts.h"
 
 namespace scanner {
 namespace {
@@ -63,19 +64,10 @@ Parsed parse(const std::string& output, std::size_t pieceSize = std::string::npo
 
 /// The first `steps` lines of a run, in the order of the fixed ones.
 std::string runOf(int steps) {
-  static const char* const texts[] = {
-      "test gathering info",    "inspect class info",
-      "inspect preset info",    "inspect parameter info",
-      "testing setting states", "inspect latency",
-      "inspect stream format",  "inspect stream format",
-      "inspect latency",        "testing setting states",
-      "inspect parameter info", "inspect preset info",
-      "inspect class info",     "initialize",
-      "test gathering info",
-  };
   std::string lines = "total, 64\n";
-  for (int number = 1; number <= steps; ++number) {
-    lines += std::to_string(number) + ", " + (number <= 15 ? texts[number - 1] : "inspect latency") + "\n";
+  for (std::size_t index = 0; index < static_cast<std::size_t>(steps); ++index) {
+    const char* const text = index < kOrderedTexts.size() ? kOrderedTexts[index] : "inspect latency";
+    lines += std::to_string(index + 1) + ", " + text + "\n";
   }
   return lines;
 }
