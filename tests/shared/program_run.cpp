@@ -100,6 +100,21 @@ std::vector<char*> pointersTo(std::vector<std::string>& texts) {
   return pointers;
 }
 
+/// Without a limit, a plug-in that overflows its stack takes all memory before it crashes.
+void limitTheStack() {
+  constexpr rlim_t kUsual = 8 << 20;
+  rlimit limit = {};
+  if (getrlimit(RLIMIT_STACK, &limit) != 0) return;
+  limit.rlim_cur = std::min(kUsual, limit.rlim_max);
+  setrlimit(RLIMIT_STACK, &limit);
+}
+
+/// What starts the tests may ignore some signals (nohup, and some servers of CI systems), and all that they start would
+/// inherit that.
+void takeDefaultSignals() {
+  for (int number = 1; number < NSIG; ++number) std::signal(number, SIG_DFL);
+}
+
 std::vector<std::string> environmentOf(const ProgramCall& call, const std::string& home) {
   std::map<std::string, std::string> all = {{"HOME", home}, {"LC_ALL", "C"}, {"PATH", "/usr/bin:/bin"}};
 #ifdef __SANITIZE_THREAD__
@@ -205,6 +220,8 @@ class Child {
                            const std::vector<char*>& arguments, const std::vector<char*>& environment,
                            int failure) const {
     const rlimit noCore = {0, 0};
+    limitTheStack();
+    takeDefaultSignals();
     const int nothing = open("/dev/null", O_RDONLY);
     sigset_t none;
     sigemptyset(&none);

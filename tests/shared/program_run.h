@@ -6,8 +6,9 @@
 //   EXPECT_EQ(run.end, "exit status 1");
 //
 // The program has a process group of its own; when it has ended, the rest of the group is killed. Standard
-// input is /dev/null, and no core is dumped. The environment is fixed: LC_ALL=C, PATH=/usr/bin:/bin, HOME a
-// new folder that is removed after the run, and the options of the sanitizers.
+// input is /dev/null, no core is dumped, the stack is limited to 8 MiB, and no signal is ignored. The environment
+// is fixed: LC_ALL=C, PATH=/usr/bin:/bin, HOME a new folder that is removed after the run, and the options of the
+// sanitizers.
 #pragma once
 
 #include <map>
