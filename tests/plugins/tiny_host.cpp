@@ -9,7 +9,7 @@
 // When the plug-in throws, it prints "caught ..." and ends with status 9. Signals have their default action,
 // except with TINY_HOST_ON_CRASH=malloc, stdout or exit: on SIGSEGV and SIGABRT it then prints "crashed",
 // uses the named thing, and ends with status 8, after "not locked" unless it uses exit. With
-// TINY_HOST_SECONDS, SIGALRM ends it after that time.
+// TINY_HOST_SECONDS, SIGALRM ends it when it has printed nothing for that time since its last line.
 #include <array>
 #include <cmath>
 #include <csignal>
@@ -29,6 +29,7 @@ namespace {
 
 VstInt32 wantedChild = 0;
 std::string usedOnCrash;
+unsigned mostSeconds = 0;  // 0: for ever.
 
 double trackSample(AEffect*) { return 1.5; }
 
@@ -59,6 +60,7 @@ VstIntPtr answerPlugin(AEffect*, VstInt32 opcode, VstInt32, VstIntPtr, void* ptr
 void say(const std::string& text) {
   const std::string line = text + '\n';
   if (write(STDOUT_FILENO, line.data(), line.size()) < 0) _exit(7);
+  alarm(mostSeconds);
 }
 
 void handleCrash(int) {
@@ -79,7 +81,7 @@ void handleCrash(int) {
 void setUpSignals() {
   for (const int number : {SIGABRT, SIGSEGV, SIGBUS, SIGFPE, SIGILL}) std::signal(number, SIG_DFL);
   if (const char* seconds = std::getenv("TINY_HOST_SECONDS")) {
-    alarm(static_cast<unsigned>(std::atoi(seconds)));
+    mostSeconds = static_cast<unsigned>(std::atoi(seconds));
   }
   if (const char* used = std::getenv("TINY_HOST_ON_CRASH")) {
     usedOnCrash = used;
