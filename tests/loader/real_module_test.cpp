@@ -5,6 +5,7 @@
 #include "gmock/gmock.h"
 #include "gtest/gtest.h"
 #include "loader/module_loader.h"
+#include "tests/shared/temporary_directory.h"
 #include "tests/shared/thrown.h"
 
 namespace {
@@ -48,9 +49,10 @@ TEST(RealModules, APathThatDoesNotLoadThrowsMinusOneWithTheReasonOnStandardError
     std::string reason;
   };
   emptyTheCache();
+  const TemporaryDirectory folder;
   for (const auto& [path, reason] :
        {Refusal{"/nowhere/at/all.vst", "/nowhere/at/all.vst"}, Refusal{"", "empty"},
-        Refusal{"/\xFF.vst", "UTF-8"}, Refusal{"/tmp", "has no executable"},
+        Refusal{"/\xFF.vst", "UTF-8"}, Refusal{folder.path().string(), "has no executable"},
         Refusal{"/proc/self/maps", "/proc/self/maps"}}) {
     testing::internal::CaptureStderr();
     EXPECT_EQ(thrownInt([p = path] { VSTPluginLoader::demandLoadedPlugin({p, "test"}); }), -1) << path;
