@@ -18,7 +18,7 @@ class ObservedThread {
   /// Waits for the body to return.
   ~ObservedThread();
 
-  /// Waits until the thread sleeps on a futex. False when its body returned or ten seconds passed.
+  /// Waits until the thread sleeps on a futex. False when its body returned or a minute passed.
   bool isSeenAsleep() const;
 
   /// Sends the signal and waits until the kernel has delivered it.
@@ -26,7 +26,7 @@ class ObservedThread {
 
   bool hasFinished() const { return finished; }
 
-  /// Waits for the body to return. Fails the test and ends the process if that takes ten seconds.
+  /// Waits for the body to return. Fails the test and ends the process if that takes a minute.
   void join();
 
  private:
@@ -38,5 +38,5 @@ class ObservedThread {
   std::thread thread;
 };
 
-/// Polls until the condition holds. False after ten seconds.
+/// Polls until the condition holds. False after a minute.
 bool becomesTrue(const std::function<bool()>& condition);
