@@ -21,7 +21,7 @@ import time
 SKIPPED = 77
 PTRACE_SEIZE = 0x4206
 WALL = 0x40000000
-LIMIT_IN_SECONDS = 60
+LIMIT_IN_SECONDS = 120
 
 
 def worker_of(plugin):
@@ -75,7 +75,7 @@ def main():
         shutil.copy(arguments.plugins / "unruly.so", plugin)
         for number in range(1, 7):
             shutil.copy(arguments.plugins / "well_behaved_effect.so", world / "plugins" / f"{number}.so")
-        command = [arguments.scan.resolve(), "-j", "2", "--step-limit", "3", "--cache=off", "--no-progress",
+        command = [arguments.scan.resolve(), "-j", "2", "--step-limit", "5", "--cache=off", "--no-progress",
                    "--json", "-", *arguments.options, world / "plugins"]
         environment = dict(os.environ, TMPDIR=str(world / "tmp"), UNRULY="ignore_termination")
         scan = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
