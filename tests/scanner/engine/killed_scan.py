@@ -1,13 +1,13 @@
 # SPDX-License-Identifier: MIT
-"""Kills vsttorture-scan with SIGKILL at random moments: nothing of it may be left a second later but its results.
+"""Kills vsttorture-scan with SIGKILL at random moments: soon nothing of it may be left but its results.
 
     killed_scan.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--times 15] [--seed N]
 
 Each scan runs plug-ins that pass, that never end, and that leave processes with sessions of their own behind, some of
-them without any environment. A second after the kill there must be no process that has run since with one of their
-names, no scratch folder, and the file of events must end at a whole line. The database must be whole. The next scan
-(after the first 15 kills) must remember each result that was reported, and run the others. Prints the seed first, so
-that the same moments can be had again.
+them without any environment. Within ten seconds of the kill (on an idle machine, milliseconds, and the longest time is
+printed) there must be no process with one of their names and no scratch folder any more. The file of events must end at
+a whole line. The database must be whole. The next scan (after the first 15 kills) must remember each result that was
+reported, and run the others. Prints the seed first, so that the same moments can be had again.
 """
 import argparse
 import json
@@ -21,7 +21,7 @@ import sys
 import tempfile
 import time
 
-SECONDS_TO_CLEAN_UP = 1.0
+SECONDS_TO_CLEAN_UP = 10.0  # As the machine may be busy.
 LEAST_LONGEST_LIFE_IN_SECONDS = 0.4
 LONGEST_LIFE_IN_STARTS = 2  # With a sanitizer, or on a busy machine, a start takes longer.
 PLUGINS = 30
@@ -111,7 +111,8 @@ def problems_of_next_scan(command, environment, events, known):
 
 
 def kill_once(scan, world, token, draw, longest_life, has_next_scan):
-    """Starts a scan, kills it, and returns what is wrong a second later, and how many results there were."""
+    """Starts a scan and kills it. Returns what is wrong then, whether it had begun, how many results there were, and how
+    many seconds it took until nothing was left."""
     events, database = world / "events", world / "cache/results.sqlite"
     events.unlink(missing_ok=True)
     shutil.rmtree(database.parent, ignore_errors=True)
@@ -124,15 +125,17 @@ def kill_once(scan, world, token, draw, longest_life, has_next_scan):
     time.sleep(draw.random() * longest_life)
     process.kill()
     process.wait()
-    end = time.monotonic() + SECONDS_TO_CLEAN_UP
-    while (problems := problems_after_kill(world, token)) and time.monotonic() < end:
+    killed = time.monotonic()
+    while (problems := problems_after_kill(world, token)) and time.monotonic() < killed + SECONDS_TO_CLEAN_UP:
         time.sleep(0.02)
+    seconds = time.monotonic() - killed
     begun = events.exists()
     known, found = results_in(events)
     problems += found + problems_of_database(database)
     if has_next_scan:
         problems += problems_of_next_scan(command, environment, events, known)
-    return [f"{environment['UNRULY']}, sandbox {sandbox}: {problem}" for problem in problems], begun, len(known)
+    problems = [f"{environment['UNRULY']}, sandbox {sandbox}: {problem}" for problem in problems]
+    return problems, begun, len(known), seconds
 
 
 def main():
@@ -145,7 +148,8 @@ def main():
     print(f"seed {arguments.seed}", flush=True)
     draw = random.Random(arguments.seed)
     problems = []
-    begun = in_the_middle = 0
+    begun = in_the_middle = number = 0
+    longest = 0.0
     with tempfile.TemporaryDirectory(prefix="killed-scan-") as folder:
         world = pathlib.Path(folder)
         (world / "tmp").mkdir()
@@ -155,17 +159,22 @@ def main():
             shutil.copy(arguments.plugins / f"{name}.so", world / "plugins" / f"{number:02}_{name}.so")
         scan = os.path.abspath(arguments.scan)
         longest_life = max(LEAST_LONGEST_LIFE_IN_SECONDS, LONGEST_LIFE_IN_STARTS * seconds_of_a_start(scan, world))
-        for number in range(arguments.times):
-            found, has_begun, known = kill_once(scan, world, f"{world.name}-{number}", draw, longest_life,
-                                                number < NEXT_SCANS)
+        # If every kill came before anything ran, nothing was tested. Where the machine has become busy since the start
+        # was measured, the scans live longer.
+        while number < arguments.times or (begun < arguments.times / 4 and number < 5 * arguments.times):
+            if number >= arguments.times:
+                longest_life *= 1.5
+            found, has_begun, known, seconds = kill_once(scan, world, f"{world.name}-{number}-", draw, longest_life,
+                                                         number < NEXT_SCANS)
             begun += has_begun
             in_the_middle += 0 < known < PLUGINS
+            longest = max(longest, seconds)
             problems += [f"kill {number}: {problem}" for problem in found]
+            number += 1
     for problem in problems:
         print(problem)
-    print(f"{arguments.times} kills, {begun} of them after the scan had begun, {in_the_middle} between two "
-          f"results, {len(problems)} problems")
-    # If every kill came before anything ran, nothing was tested.
+    print(f"{number} kills, {begun} of them after the scan had begun, {in_the_middle} between two results; after each "
+          f"nothing was left within {longest:.2f} s; {len(problems)} problems")
     return 1 if problems or begun < arguments.times / 4 else 0
 
 
