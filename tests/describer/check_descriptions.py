@@ -114,7 +114,7 @@ def main():
     except ImportError:
         # Debian's package belongs to Debian's Python, which need not be the first in the path.
         if os.path.exists(DEBIANS_PYTHON) and not os.path.samefile(sys.executable, DEBIANS_PYTHON):
-            os.execv(DEBIANS_PYTHON, [DEBIANS_PYTHON, "-B", *sys.argv])
+            os.execv(DEBIANS_PYTHON, [DEBIANS_PYTHON, "-B", "-X", "utf8", *sys.argv])
         print("there is no package jsonschema for this Python (Debian: python3-jsonschema)")
         return 1 if required else SKIPPED
     with open(arguments.schema, encoding="utf-8") as file:
