@@ -23,7 +23,7 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import explain_plugin  # noqa: E402
 from fault_matrix import (command_of, differences, environment_of, limit_of, number_of_steps, run_program,  # noqa: E402
-                          take_default_signals, try_plugin, without_noise)
+                          take_usual_start, try_plugin, without_noise)
 from rows import ALL_STEPS, KIND_OF, PLACE_OF, all_rows  # noqa: E402
 from sanitizers import kinds_of  # noqa: E402
 
@@ -282,7 +282,7 @@ def main():
     arguments = parser.parse_args()
 
     resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
-    take_default_signals()
+    take_usual_start()
     started = time.monotonic()
     worker, plugins = os.path.abspath(arguments.worker), os.path.abspath(arguments.plugins)
     rows = [row for row in all_rows() if re.search(arguments.only, row.name)]

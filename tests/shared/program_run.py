@@ -3,6 +3,7 @@
 import collections
 import os
 import pathlib
+import resource
 import signal
 import sys
 import tempfile
@@ -11,14 +12,20 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import try_plugin  # noqa: E402
 
+USUAL_STACK_IN_BYTES = 8 << 20
+
 # status: negative for a signal, None for a run that was ended for its length. leftovers: files in its folder.
 Seen = collections.namedtuple("Seen", "output errors status seconds leftovers")
 
 
-def take_default_signals():
-    """A shell starts what it sends to the background with SIGQUIT ignored, and each run would inherit that."""
+def take_usual_start():
+    """What each run would inherit. A shell starts what it sends to the background with SIGQUIT ignored. Without a limit of
+    the stack, one that overflows takes all memory before it crashes."""
     for number in (signal.SIGQUIT, signal.SIGUSR1, signal.SIGALRM, signal.SIGXCPU, signal.SIGVTALRM):
         signal.signal(number, signal.SIG_DFL)
+    _, most = resource.getrlimit(resource.RLIMIT_STACK)
+    size = USUAL_STACK_IN_BYTES if most == resource.RLIM_INFINITY else min(most, USUAL_STACK_IN_BYTES)
+    resource.setrlimit(resource.RLIMIT_STACK, (size, most))
 
 
 def run_program(command, limit, environment=()):

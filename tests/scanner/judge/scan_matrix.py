@@ -28,6 +28,8 @@ import time
 import zlib
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "fault_matrix"))
+sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "shared"))
+from program_run import take_usual_start  # noqa: E402
 from sanitizers import is_reported, reason_to_leave_out  # noqa: E402
 from rows import ALL_STEPS, FIRST_DRAWN, KIND_OF, PLACE_OF, PLACES, THROWN, all_rows  # noqa: E402
 
@@ -311,9 +313,10 @@ def main():
         return 1
 
     resource.setrlimit(resource.RLIMIT_CORE, (0, 0))
+    take_usual_start()
     started = time.monotonic()
     failed = run_rows([row for row in rows if not row.hangs], arguments, options)
-    failed += run_rows([row for row in rows if row.hangs], arguments, [*options, "--step-limit", "2", "--limit", "8"])
+    failed += run_rows([row for row in rows if row.hangs], arguments, [*options, "--step-limit", "4", "--limit", "30"])
     for name, problem in failed:
         print(f"{name}: {problem}")
     print(f"{len(rows)} rows in {time.monotonic() - started:.0f} s, {len(failed)} failed")
