@@ -36,7 +36,7 @@ class ScanTest(unittest.TestCase):
     def setUp(self):
         folder = tempfile.TemporaryDirectory(prefix="vsttorture-scan-test-")
         self.addCleanup(folder.cleanup)
-        self.folder = pathlib.Path(folder.name)
+        self.folder = pathlib.Path(folder.name).resolve()
         (self.folder / "home").mkdir()
 
     def environment(self, **more):
