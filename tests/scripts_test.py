@@ -4,10 +4,12 @@ rest are doubles that write down how they are called. Nothing is built or instal
 """
 import os
 import pathlib
+import select
 import shutil
 import signal
 import subprocess
 import tempfile
+import time
 import unittest
 
 SOURCE = pathlib.Path(__file__).resolve().parent.parent
@@ -251,15 +253,26 @@ class Scan(Script):
         self.assertIn("scan: plug-ins run without a sandbox\n", messages)
 
     def test_two_at_once_build_one_after_the_other(self):
+        go_on = self.folder / "go on"
         self.add_double("cmake", 'case $1 in --version) echo "cmake version 3.25.1" ;; *) echo begin >>"$FAKE_LOG"; '
-                        'sleep 0.2; echo end >>"$FAKE_LOG"; exit 1 ;; esac')
+                        'until [[ -e $FAKE_GO_ON ]]; do sleep 0.01; done; echo end >>"$FAKE_LOG"; exit 1 ;; esac')
         (self.bin / "sleep").symlink_to(shutil.which("sleep"))
-        environment = {"PATH": str(self.bin), "FAKE_LOG": str(self.log)}
+        environment = {"PATH": str(self.bin), "FAKE_LOG": str(self.log), "FAKE_GO_ON": str(go_on)}
         scans = [subprocess.Popen([self.root / "scan"], env=environment, stdin=subprocess.DEVNULL,
                                   stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True) for _ in range(3)]
-        messages = "".join(scan.communicate(timeout=60)[1] for scan in scans)
+        self.addCleanup(go_on.touch)
+        # One builds until the two others have said that they wait.
+        deadline = time.monotonic() + 60
+        waiting = []
+        while len(waiting) < 2 and time.monotonic() < deadline:
+            for scan in select.select([scan.stderr for scan in scans if scan not in waiting], [], [], 1)[0]:
+                self.assertEqual(scan.readline(), "scan: waiting for another build of this checkout\n")
+                waiting += [one for one in scans if one.stderr is scan]
+        go_on.touch()
+        for scan in scans:
+            scan.communicate(timeout=60)
+        self.assertEqual(len(waiting), 2)
         self.assertEqual(self.log.read_text().splitlines(), ["begin", "end"] * 3)
-        self.assertIn("scan: waiting for another build of this checkout\n", messages)
 
     def test_a_build_that_fails_is_status_3(self):
         _, messages, status, _ = self.start("scan", FAKE_BUILD_FAILS="yes")
