@@ -102,7 +102,7 @@ class Torture(Example):
             self.assertEqual(status, 1)
             self.assertIn('new: it was "passed" before', output)
             self.assertIn("SIGSEGV in effSetBypass (44) value 1, in my_plugin.so+0x", output)
-            self.assertRegex(output, r"shortest: \S*/vsttorture-worker --tests 3 \S*/my_plugin.so")
+            self.assertRegex(output, r"shortest: \S.*/vsttorture-worker'? --tests 3 \S*/my_plugin.so")
         self.build_plugin("well_behaved_effect.so")
         self.assertEqual(self.torture()[0], 0)
 

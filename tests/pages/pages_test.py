@@ -17,11 +17,11 @@ import re
 import shutil
 import subprocess
 import sys
-import tempfile
 
 SOURCE = pathlib.Path(__file__).resolve().parents[2]
 sys.path.insert(0, str(SOURCE / "tests" / "shared"))
 import page_commands  # noqa: E402
+from short_folder import short_folder  # noqa: E402
 
 NOTHING_TO_RUN = 77
 LIMIT_IN_SECONDS = 300
@@ -78,6 +78,8 @@ class World:
         return seen
 
     def as_the_reader_sees(self, output):
+        # A path with a blank is quoted in a command.
+        output = re.sub(rf"'({re.escape(str(self.build))}/[^']*)'", r"\1", output)
         for path, name in [(self.build, "/usr/bin"), (self.folder, "")]:
             output = output.replace(str(path), name)
         return output
@@ -169,7 +171,7 @@ def main():
         if missing:
             print(f"left out: {name} needs {' and '.join(missing)}")
             return 1 if os.environ.get("VSTTORTURE_PAGES") == "required" else NOTHING_TO_RUN
-        with tempfile.TemporaryDirectory(prefix="vsttorture-page-") as folder:
+        with short_folder("vsttorture-page-") as folder:
             for problem in problems(name, World(folder, options.build)):
                 print(problem, end="\n\n")
                 failed = True

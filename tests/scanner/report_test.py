@@ -10,6 +10,7 @@ import json
 import os
 import pathlib
 import re
+import shlex
 import shutil
 import stat
 import subprocess
@@ -405,7 +406,7 @@ class Junit(ReportTest):
         failure = cases["exits_in_test.so"].result[0]
         self.assertEqual(failure.message, "expected: passed, but exited at "
                          f"{ended['exits_in_test.so']['step']['number']}; {ended['exits_in_test.so']['cause']}")
-        self.assertIn("again: " + " ".join(ended["exits_in_test.so"]["command"]), failure.text)
+        self.assertIn("again: " + shlex.join(ended["exits_in_test.so"]["command"]), failure.text)
         self.assertRegex(cases[EFFECT].system_out, r"(?m)^ +\d\.\d{6} s  14, initialize$")
         self.assertEqual(suite.hostname, self.read(results)[0]["machine"])
 
