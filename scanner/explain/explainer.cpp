@@ -215,6 +215,8 @@ void Explainer::diagnose(const Open& open) {
           commandLine(open->environment, gdbCommand("gdb", result.judgement), result.run, tests);
       job.tool->command = [gdb = tool.command.front(), judgement = result.judgement](
                               const std::string& folder) { return gdbCommand(gdb, judgement, folder); };
+      // gdb quotes the worker's arguments for the shell that it starts the worker with.
+      job.environment.emplace_back("SHELL=/bin/sh");
       job.tool->files = {kGdbLog};
       job.tool->endSignal = SIGINT;
       job.tool->patienceInSeconds = kPatienceWithGdbInSeconds;

@@ -271,7 +271,6 @@ std::vector<std::string> gdbCommand(const std::string& gdb, const Judgement& jud
     add("set print frame-arguments presence");
     add("set filename-display basename");
   }
-  add("set startup-with-shell off");
   add("set disable-randomization off");
   add("handle all nostop noprint pass");
   if (looksForThrow(judgement)) {
