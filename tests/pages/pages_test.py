@@ -107,7 +107,7 @@ def maker_of_a_plugin(world):
         mkdir -p build && cd build || exit
         sample=well_behaved_effect
         [ ! -e my_plugin.so ] || sample=faulty
-        cp {world.build}/plugins/$sample.so new && mv new my_plugin.so""")
+        cp "{world.build}/plugins/$sample.so" new && mv new my_plugin.so""")
     make.chmod(0o755)
 
 

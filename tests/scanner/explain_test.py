@@ -279,7 +279,7 @@ class Gdb(ExplainTest):
                 for limit in ("2", "20"):  # On a busy machine gdb takes longer to start.
                     finding, _ = self.finding("hang", "--step-limit", limit, sandbox=sandbox)
                     self.assertEqual(finding["kind"], "hang")
-                    if finding["frames"]:
+                    if "hang()" in finding["text"]:
                         break
                 self.assertRegex(finding["text"], r"stopped at the limit in .*hang\(\)")
 

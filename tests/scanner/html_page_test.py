@@ -169,6 +169,8 @@ def start_browser():
     nobody = "localhost,127.0.0.1"
     os.environ.update(HOME=HOME.name, NO_PROXY=nobody, no_proxy=nobody)
     os.environ["TMPDIR"] = short_folder.parent()  # The browser makes a socket there.
+    for name in [name for name in os.environ if name.startswith("XDG_")]:
+        del os.environ[name]  # It makes folders there.
     options = webdriver.ChromeOptions()
     for argument in ["--headless=new", "--no-sandbox", "--disable-gpu", "--disable-quic", "--no-first-run",
                      "--disable-background-networking", "--disable-component-update", "--disable-sync",

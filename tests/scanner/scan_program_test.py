@@ -128,10 +128,10 @@ class Workers(ScanTest):
         worker.chmod(0o755)
         result = self.scan("--workers", folder, PLUGINS / EFFECT)
         self.assertEqual(result.returncode, 0)
-        self.assertIn(f"{worker} is not used", " ".join(result.stdout.split()))
+        self.assert_said(f"{worker} is not used", result.stdout)
         self.assertFalse((self.folder / "was_run").exists())
         shutil.copy("/bin/cat", worker)
-        self.assertIn('but says "cat', " ".join(self.scan("--workers", folder, PLUGINS / EFFECT).stdout.split()))
+        self.assert_said('but says "cat', self.scan("--workers", folder, PLUGINS / EFFECT).stdout)
 
     def test_a_plugin_for_another_processor_is_not_run(self):
         code = bytearray((PLUGINS / EFFECT).read_bytes())

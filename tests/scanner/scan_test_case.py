@@ -77,6 +77,10 @@ class ScanTest(unittest.TestCase):
     def verdicts(self, *arguments, **more):
         return {name: event["verdict"] for name, event in self.results(*arguments, **more).items()}
 
+    def assert_said(self, sentence, report):
+        """A report breaks its long lines, a long path in the middle."""
+        self.assertIn("".join(sentence.split()), "".join(report.split()), report)
+
     def write(self, name, text):
         path = self.folder / name
         path.write_text(text)
