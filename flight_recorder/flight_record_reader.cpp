@@ -18,9 +18,14 @@ struct SignalName {
   const char* name;
 };
 
+/// Those that end a process and have a name on every system.
 constexpr SignalName kSignalNames[] = {
-    {SIGHUP, "SIGHUP"}, {SIGINT, "SIGINT"}, {SIGILL, "SIGILL"},   {SIGTRAP, "SIGTRAP"}, {SIGABRT, "SIGABRT"},
-    {SIGBUS, "SIGBUS"}, {SIGFPE, "SIGFPE"}, {SIGSEGV, "SIGSEGV"}, {SIGTERM, "SIGTERM"}, {SIGSYS, "SIGSYS"},
+    {SIGHUP, "SIGHUP"},   {SIGINT, "SIGINT"},       {SIGQUIT, "SIGQUIT"}, {SIGILL, "SIGILL"},
+    {SIGTRAP, "SIGTRAP"}, {SIGABRT, "SIGABRT"},     {SIGBUS, "SIGBUS"},   {SIGFPE, "SIGFPE"},
+    {SIGKILL, "SIGKILL"}, {SIGUSR1, "SIGUSR1"},     {SIGSEGV, "SIGSEGV"}, {SIGUSR2, "SIGUSR2"},
+    {SIGPIPE, "SIGPIPE"}, {SIGALRM, "SIGALRM"},     {SIGTERM, "SIGTERM"}, {SIGXCPU, "SIGXCPU"},
+    {SIGXFSZ, "SIGXFSZ"}, {SIGVTALRM, "SIGVTALRM"}, {SIGPROF, "SIGPROF"}, {SIGIO, "SIGIO"},
+    {SIGSYS, "SIGSYS"},
 };
 
 /// Fills a report from a record and stops at the first field that makes no sense.

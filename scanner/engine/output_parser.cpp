@@ -17,6 +17,9 @@ constexpr std::size_t kShortestProtocolLine = 8;  ///< "total, 0"
 /// More of them tell nothing new.
 constexpr std::size_t kMostOutOfTurn = 20;
 
+/// Far more than a run has. A plug-in that prints lines of steps without end fills no memory.
+constexpr int kMostSteps = 1000;
+
 constexpr int kTotalOfAPlugin = 64;
 constexpr int kTotalOfAShell = 51;
 
@@ -36,7 +39,6 @@ constexpr std::array<std::string_view, 9> kPhases = {
     "inspect io config",
 };
 constexpr std::string_view kLastWords = "unexpected exit";
-constexpr std::string_view kUsage = "!too few arguments. syntax is command pathtovst childID(optional)";
 
 /// Takes `end` off the end of the text; false where it does not end so.
 bool takeEnd(std::string_view& text, std::string_view end) {
@@ -128,8 +130,7 @@ void OutputParser::finish() {
 void OutputParser::takeLine(std::string_view line) {
   std::string_view front = line;
   if (line.size() < kShortestProtocolLine) {
-    takeText(line);
-    takeText("\n");
+    takeTextLine(line);
     return;
   }
   for (const std::string_view text : kStepTexts) {
@@ -152,14 +153,7 @@ void OutputParser::takeLine(std::string_view line) {
     takeFailure(line, front);
     return;
   }
-  front = line;
-  if (takeEnd(front, kUsage)) {
-    takeText(front);
-    protocol.push_back({ProtocolLine::Kind::kUsage});
-    return;
-  }
-  takeText(line);
-  takeText("\n");
+  takeTextLine(line);
 }
 
 void OutputParser::takeTotal(std::string_view line, int number, std::string_view front) {
@@ -168,8 +162,7 @@ void OutputParser::takeTotal(std::string_view line, int number, std::string_view
     if (isOfARun(number)) {
       takeOutOfTurn(line, front);
     } else {
-      takeText(line);
-      takeText("\n");
+      takeTextLine(line);
     }
     return;
   }
@@ -183,7 +176,7 @@ void OutputParser::takeTotal(std::string_view line, int number, std::string_view
     if (isOfARun(formerNumber)) {
       takeOutOfTurn(formerLine, "");
     } else {
-      takeText(formerLine + "\n");
+      takeTextLine(formerLine);
     }
   }
   hasTotal = true;
@@ -192,7 +185,7 @@ void OutputParser::takeTotal(std::string_view line, int number, std::string_view
 
 void OutputParser::takeStep(std::string_view line, int number, std::string_view text,
                             std::string_view front) {
-  if (!hasTotal || number != lastStep + 1) {
+  if (!hasTotal || number != lastStep + 1 || number > kMostSteps) {
     takeOutOfTurn(line, front);
     return;
   }
@@ -215,6 +208,10 @@ void OutputParser::takeOutOfTurn(std::string_view line, std::string_view front) 
   if (++outOfTurn <= kMostOutOfTurn) {
     protocol.push_back({ProtocolLine::Kind::kOutOfTurn, 0, std::string(line.substr(front.size()))});
   }
+  takeTextLine(line);
+}
+
+void OutputParser::takeTextLine(std::string_view line) {
   takeText(line);
   takeText("\n");
 }

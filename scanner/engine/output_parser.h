@@ -38,6 +38,8 @@ class TextTail {
 /// noted as ProtocolLine::Kind::kOutOfTurn: the worker prints none, so either it or the line that came in its
 /// place is the plug-in's. Whatever else is printed, also in front of a line, is the plug-in's.
 ///
+/// Steps beyond the thousandth are out of turn, too: no run has so many.
+///
 /// Of several totals before the first step the last one counts, since a plug-in may print such a text while
 /// it is created.
 class OutputParser {
@@ -57,6 +59,7 @@ class OutputParser {
   void takeStep(std::string_view line, int number, std::string_view text, std::string_view front);
   void takeFailure(std::string_view line, std::string_view front);
   void takeOutOfTurn(std::string_view line, std::string_view front);
+  void takeTextLine(std::string_view line);
   void takeText(std::string_view bytes);
 
   std::string pending;  ///< The beginning of a line.

@@ -48,7 +48,6 @@ struct ProtocolLine {
     kStep,
     kFailure,
     kLastWords,
-    kUsage,
     kOutOfTurn,  ///< Looks like one of the others and was not due; the first 20.
   };
   Kind kind;
@@ -81,7 +80,6 @@ struct RunSeen {
   std::optional<Activity> activity = {};    ///< With kStep and kRun.
   std::vector<ProtocolLine> lines = {};     ///< In the order in which they came.
   bool hasTextBesidesLines = false;         ///< The plug-in printed to standard output.
-  bool outputClosedEarly = false;           ///< Standard output was closed before the process ended.
   std::vector<PluginText> texts = {};       ///< The last 64 KiB of each output.
   std::uint64_t outputBytes = 0;            ///< Both outputs, all of it.
   std::string record = {};                  ///< The flight record, 4096 bytes; empty when there was none.

@@ -21,26 +21,12 @@ constexpr int kFailureStatus = 3;
 constexpr int kRefusedStatus = 5;
 constexpr int kShellStatus = 1;
 constexpr int kPassedStatus = 0;
-constexpr int kNoPathStatus = 2;
-constexpr int kUsageStatus = 64;
 constexpr int kSignalStatus = 128;  ///< A sandbox reports signal N as this plus N.
 constexpr int kHighestSignal = 64;
 
 /// Signals that a fault of the process itself raises. The others are sent: by another process, or by the
 /// plug-in.
 constexpr int kFaultSignals[] = {SIGSEGV, SIGBUS, SIGILL, SIGFPE, SIGABRT, SIGTRAP, SIGSYS};
-
-struct SignalName {
-  int signal;
-  const char* name;
-};
-
-/// Those that no record names, since the worker does not handle them.
-constexpr SignalName kSentSignals[] = {
-    {SIGQUIT, "SIGQUIT"},     {SIGKILL, "SIGKILL"}, {SIGUSR1, "SIGUSR1"}, {SIGUSR2, "SIGUSR2"},
-    {SIGPIPE, "SIGPIPE"},     {SIGALRM, "SIGALRM"}, {SIGXCPU, "SIGXCPU"}, {SIGXFSZ, "SIGXFSZ"},
-    {SIGVTALRM, "SIGVTALRM"}, {SIGPROF, "SIGPROF"}, {SIGIO, "SIGIO"},
-};
 
 constexpr const char* kTestTexts[] = {
     "inspect class info",     "inspect preset info", "inspect parameter info",
@@ -65,7 +51,6 @@ struct Lines {
   std::string stepText;
   std::string failure;
   bool hasLastWords = false;
-  bool hasUsage = false;
   std::string outOfTurn;  ///< The first line that was not due.
 
   /// Whether they are those of a run from its beginning to its end.
@@ -90,9 +75,6 @@ Lines readLines(const RunSeen& seen) {
         break;
       case ProtocolLine::Kind::kLastWords:
         lines.hasLastWords = true;
-        break;
-      case ProtocolLine::Kind::kUsage:
-        lines.hasUsage = true;
         break;
       case ProtocolLine::Kind::kOutOfTurn:
         if (lines.outOfTurn.empty()) lines.outOfTurn = line.text;
@@ -207,6 +189,10 @@ class Judge {
       return;
     }
     hasBegun = record.phase != kFlightNotStarted || record.verdict == kFlightRefused;
+    if (!hasBegun && lines.total >= 0) {
+      hasBegun = true;
+      contradict("the flight record says that the run has not begun, the lines do not");
+    }
   }
 
   void compareStep() {
@@ -246,7 +232,7 @@ class Judge {
     if (seen.end.kind == End::Kind::kExited) out.status = seen.end.status;
     if (seen.limitHit == LimitHit::kInterrupted) {
       say(Verdict::kNotRun, "interrupted: " + where());
-    } else if (!hasBegun || isUsageMistake()) {
+    } else if (!hasBegun) {
       notBegun();
     } else if (seen.limitHit != LimitHit::kNone) {
       byLimit();
@@ -270,12 +256,6 @@ class Judge {
     const int signal = seen.end.status - kSignalStatus;
     const bool isSignal = seen.wasSandboxed && signal > 0 && signal <= kHighestSignal && !hasExited();
     return isSignal ? signal : 0;
-  }
-
-  /// The worker was given arguments that it cannot follow. A plug-in that has been loaded ends differently.
-  [[nodiscard]] bool isUsageMistake() const {
-    if (hasRecord || lines.total >= 0 || seen.end.kind != End::Kind::kExited) return false;
-    return seen.end.status == kUsageStatus || (lines.hasUsage && seen.end.status == kNoPathStatus);
   }
 
   /// The plug-in was not touched yet: nothing of this is its fault.
@@ -649,11 +629,6 @@ Judgement judge(const RunSeen& seen, const Limits& limits, std::size_t listedTes
 
 std::vector<int> testsBegun(const RunSeen& seen, int lastStep) { return testsBetween(seen, 0, lastStep); }
 
-std::string nameOfSignal(int signal) {
-  for (const SignalName& row : kSentSignals) {
-    if (row.signal == signal) return row.name;
-  }
-  return signalName(signal);
-}
+std::string nameOfSignal(int signal) { return signalName(signal); }
 
 }  // namespace scanner

@@ -38,8 +38,6 @@ std::string described(const ProtocolLine& line) {
       return "failure " + line.text;
     case ProtocolLine::Kind::kLastWords:
       return "last words";
-    case ProtocolLine::Kind::kUsage:
-      return "usage";
     case ProtocolLine::Kind::kOutOfTurn:
       return "out of turn " + line.text;
   }
@@ -222,7 +220,6 @@ const LineCase kLineCases[] = {
      kFirst + "unexpected exit2, inspect class info\n",
      {"total 64", "step 1 test gathering info", "last words", "step 2 inspect class info"},
      {}},
-    {"ALineOfUsage", "!too few arguments. syntax is command pathtovst childID(optional)\n", {"usage"}, {}},
     {"NothingAtAll", "", {}, {}},
 };
 
@@ -246,6 +243,14 @@ TEST(OutputParser, KeepsTheLast64KiBOfTheTextAndItsSteps) {
   ASSERT_EQ(parsed.texts.size(), 2u);
   EXPECT_EQ(parsed.texts[0], "2: " + std::string(25535, 'b') + "\n");
   EXPECT_EQ(parsed.texts[1], "3: " + std::string(40000, 'c'));
+}
+
+TEST(OutputParser, ReadsNoMoreThan1000Steps) {
+  const Parsed parsed = parse(runOf(1100));
+
+  EXPECT_EQ(parsed.step, 1000);
+  EXPECT_EQ(parsed.lines.size(), 1u + 1000u + 20u);
+  EXPECT_EQ(parsed.lines[1001], "out of turn 1001, inspect latency");
 }
 
 TEST(OutputParser, KeepsTheFirst20LinesThatWereNotDue) {
