@@ -286,8 +286,6 @@ void RunEngine::Implementation::ActiveRun::received(const Output& output, std::s
 void RunEngine::Implementation::ActiveRun::outputEnded(Output& output) {
   if (output.endedAt > 0) return;
   output.endedAt = monotonicSeconds();
-  // A process that ends has no descriptors any more when its pipes are seen closed.
-  if (!output.isStandardError && isRunning && system::hasDescriptors(process)) seen.outputClosedEarly = true;
   uv_read_stop(reinterpret_cast<uv_stream_t*>(&output.pipe));
   owner.lookForEnded();  // May have been the last thing that this run was waiting for.
 }

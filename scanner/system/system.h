@@ -106,9 +106,6 @@ struct Sample {
 /// have no part in that.
 Sample sampleRun(int process, bool isSandboxed, bool inDetail);
 
-/// Whether the process has a descriptor open: false for one that is just ending.
-bool hasDescriptors(int process);
-
 // ---- Folders ----------------------------------------------------------------------------------------------
 
 /// Removes a folder with all that is in it, whatever its depth and its permissions, as far as this process may.

@@ -151,6 +151,4 @@ Sample sampleRun(int process, bool isSandboxed, bool inDetail) {
   return sample;
 }
 
-bool hasDescriptors(int process) { return !descriptorsOf(process).empty(); }
-
 }  // namespace scanner::system
