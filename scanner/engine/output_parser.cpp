@@ -225,8 +225,6 @@ void OutputParser::takeText(std::string_view bytes) {
     takeText(bytes.substr(words + kLastWords.size()));
     return;
   }
-  if (bytes.empty()) return;
-  hasText = true;
   plugin.add(lastStep, bytes);
 }
 

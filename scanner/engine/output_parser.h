@@ -51,7 +51,6 @@ class OutputParser {
   [[nodiscard]] int step() const { return lastStep; }
   [[nodiscard]] const std::vector<ProtocolLine>& lines() const { return protocol; }
   [[nodiscard]] const TextTail& texts() const { return plugin; }
-  [[nodiscard]] bool hasTextBesidesLines() const { return hasText; }
 
  private:
   void takeLine(std::string_view line);
@@ -69,7 +68,6 @@ class OutputParser {
   bool hasTotal = false;
   bool hasFailure = false;
   bool hasLastWords = false;
-  bool hasText = false;
   TextTail plugin{false};
 };
 

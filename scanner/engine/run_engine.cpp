@@ -744,7 +744,6 @@ void RunEngine::Implementation::finish(ActiveRun& run) {
   run.readRest(run.standardError);
   run.parser.finish();
   seen.lines = run.parser.lines();
-  seen.hasTextBesidesLines = run.parser.hasTextBesidesLines();
   seen.texts = run.parser.texts().pieces();
   if (!run.queued.job.isWorker) seen.texts.push_back({0, false, std::move(run.wholeOutput)});
   for (PluginText& text : run.errorText.pieces()) seen.texts.push_back(std::move(text));

@@ -79,7 +79,6 @@ struct RunSeen {
   LimitHit limitHit = LimitHit::kNone;
   std::optional<Activity> activity = {};    ///< With kStep and kRun.
   std::vector<ProtocolLine> lines = {};     ///< In the order in which they came.
-  bool hasTextBesidesLines = false;         ///< The plug-in printed to standard output.
   std::vector<PluginText> texts = {};       ///< The last 64 KiB of each output.
   std::uint64_t outputBytes = 0;            ///< Both outputs, all of it.
   std::string record = {};                  ///< The flight record, 4096 bytes; empty when there was none.

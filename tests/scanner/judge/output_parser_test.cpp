@@ -21,10 +21,9 @@ struct Parsed {
   std::vector<std::string> lines;
   std::vector<std::string> texts;
   int step = 0;
-  bool hasText = false;
 
   bool operator==(const Parsed& other) const {
-    return lines == other.lines && texts == other.texts && step == other.step && hasText == other.hasText;
+    return lines == other.lines && texts == other.texts && step == other.step;
   }
 };
 
@@ -56,7 +55,6 @@ Parsed parse(const std::string& output, std::size_t pieceSize = std::string::npo
     parsed.texts.push_back(std::to_string(text.step) + ": " + text.bytes);
   }
   parsed.step = parser.step();
-  parsed.hasText = parser.hasTextBesidesLines();
   return parsed;
 }
 
@@ -79,7 +77,6 @@ TEST(OutputParser, AWholeRunHasItsTotalAndAllItsStepsAndNoText) {
   EXPECT_EQ(parsed.lines[65], "step 65 inspect latency");
   EXPECT_EQ(parsed.step, 65);
   EXPECT_THAT(parsed.texts, IsEmpty());
-  EXPECT_FALSE(parsed.hasText);
 }
 
 TEST(OutputParser, HowTheOutputIsCutMakesNoDifference) {
@@ -107,7 +104,6 @@ TEST(OutputParser, TextBelongsToTheStepInWhichItCame) {
 
   EXPECT_THAT(parsed.texts,
               ElementsAre("0: loading\ncreated\n", "1: one\nstill 1, without a newline ", "2: two"));
-  EXPECT_TRUE(parsed.hasText);
 }
 
 struct LineCase {
