@@ -65,7 +65,7 @@ struct PluginText {
 struct LeftBehind {
   unsigned processes = 0;          ///< That had to be killed after the run. Not known of one in a sandbox.
   unsigned sharedMemory = 0;       ///< Segments of System V shared memory that had to be removed.
-  std::vector<std::string> files;  ///< In the scratch folder, relative to it; the first 100.
+  std::vector<std::string> files;  ///< In the scratch folder, relative to it; 100 of them at most.
   std::uint64_t fileCount = 0;
   std::uint64_t fileBytes = 0;
   /// Processes that SIGKILL did not end in time: as long as the kernel waits for a device or a file system, it ends no

@@ -3,7 +3,6 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <filesystem>
 #include <optional>
 #include <system_error>
 
@@ -14,11 +13,12 @@
 namespace scanner {
 namespace {
 
-namespace fs = std::filesystem;
-
 constexpr std::size_t kMostFilesListed = 100;
+constexpr std::size_t kMostBytesOfAName = 1024;
 constexpr std::uint64_t kMostFilesCounted = 1000000;
 constexpr std::uint64_t kLeastBytes = 4096;
+/// Each level takes a descriptor and makes all paths below it longer. Nothing that is of use is so deep.
+constexpr unsigned kMostLevels = 100;
 
 struct Folder {
   const char* path;
@@ -41,23 +41,6 @@ constexpr Folder kFolders[] = {
 bool isOfOurFolders(const std::string& path) {
   return std::any_of(std::begin(kFolders), std::end(kFolders),
                      [&](const Folder& one) { return path == one.path; });
-}
-
-/// Calls `visit` with each entry until that returns false. Links are entries, and not followed.
-template <class Visit>
-void forEachEntry(const fs::path& folder, Visit visit) {
-  std::error_code error;
-  fs::recursive_directory_iterator entry(folder, fs::directory_options::skip_permission_denied, error);
-  for (const fs::recursive_directory_iterator end; !error && entry != end; entry.increment(error)) {
-    if (!visit(*entry)) return;
-  }
-}
-
-std::uint64_t sizeOf(const fs::directory_entry& entry) {
-  struct stat status = {};
-  if (lstat(entry.path().c_str(), &status) != 0 || !S_ISREG(status.st_mode)) return 0;
-  // What it takes on the disk: a file with a hole takes less than its length.
-  return static_cast<std::uint64_t>(status.st_blocks) * 512;
 }
 
 }  // namespace
@@ -95,13 +78,11 @@ bool ScratchFolder::isAsNew() const {
 }
 
 void ScratchFolder::list(LeftBehind& leftBehind) const {
-  forEachEntry(folder, [&](const fs::directory_entry& entry) {
-    std::error_code ignored;
-    const std::string relative = entry.path().string().substr(folder.size() + 1);
-    const bool isFolder = fs::is_directory(entry.symlink_status(ignored));
-    if (relative == "record" || isFolder) return true;
-    leftBehind.fileBytes += sizeOf(entry);
-    if (leftBehind.files.size() < kMostFilesListed) leftBehind.files.push_back(relative);
+  system::visitTree(folder, kMostLevels, [&](const system::TreeEntry& entry) {
+    if (entry.path == "record" || entry.isFolder) return true;
+    leftBehind.fileBytes += entry.bytesOnDisk;
+    if (leftBehind.files.size() < kMostFilesListed)
+      leftBehind.files.push_back(entry.path.substr(0, kMostBytesOfAName));
     return ++leftBehind.fileCount < kMostFilesCounted;
   });
   std::sort(leftBehind.files.begin(), leftBehind.files.end());
@@ -109,9 +90,8 @@ void ScratchFolder::list(LeftBehind& leftBehind) const {
 
 std::uint64_t ScratchFolder::sizeInBytes(std::uint64_t most) const {
   std::uint64_t total = 0;
-  forEachEntry(folder, [&](const fs::directory_entry& entry) {
-    if (!isOfOurFolders(entry.path().string().substr(folder.size())))
-      total += std::max(sizeOf(entry), kLeastBytes);
+  system::visitTree(folder, kMostLevels, [&](const system::TreeEntry& entry) {
+    if (!isOfOurFolders("/" + entry.path)) total += std::max(entry.bytesOnDisk, kLeastBytes);
     return total <= most;
   });
   return total;

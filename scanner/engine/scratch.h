@@ -33,10 +33,11 @@ class ScratchFolder {
   [[nodiscard]] bool isAsNew() const;
   /// It is not removed: a process still uses it, and the file system that it is on may not answer.
   void leave() { isLeft = true; }
-  /// What a plug-in has put here: files in its home and its temporary folder. The count ends at a million.
+  /// What a plug-in has put here: files in its home and its temporary folder, down to 100 levels. The count ends at a
+  /// million, and a name at 1024 bytes.
   void list(LeftBehind& leftBehind) const;
   /// The size of all that was put here. A file or folder counts as a block of 4096 bytes at least. No more is
-  /// looked at once `most` is exceeded; what cannot be read counts as nothing.
+  /// looked at once `most` is exceeded; what cannot be read, or is more than 100 levels deep, counts as nothing.
   [[nodiscard]] std::uint64_t sizeInBytes(std::uint64_t most) const;
 
  private:

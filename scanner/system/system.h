@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
@@ -54,7 +55,7 @@ int endedChild();
 
 struct ProcessEnd {
   bool isSignalled = false;
-  int value = 0;  ///< The signal, or the exit status.
+  int value = 0;  ///< The signal, or the exit status; -1 where the system does not know it.
   double userSeconds = 0;
   double systemSeconds = 0;
   std::uint64_t peakMemoryInBytes = 0;
@@ -111,6 +112,19 @@ Sample sampleRun(int process, bool isSandboxed, bool inDetail);
 /// Removes a folder with all that is in it, whatever its depth and its permissions, as far as this process may.
 /// False when something is left.
 bool removeTree(const std::string& folder);
+
+/// Something that is somewhere below a folder.
+struct TreeEntry {
+  std::string path;       ///< Relative to the folder.
+  bool isFolder = false;  ///< A link to one is none.
+  std::uint64_t bytesOnDisk =
+      0;  ///< What a file takes, which is less than its length where it has holes. Else 0.
+};
+
+/// Calls `visit` with all that is below a folder, down to `mostLevels` below it, until that returns false. A folder
+/// comes before what is in it. Links are not followed; what cannot be read is left out.
+void visitTree(const std::string& folder, unsigned mostLevels,
+               const std::function<bool(const TreeEntry&)>& visit);
 
 struct FolderLook {
   unsigned entries = 0;      ///< In the folder itself, without "." and "..".

@@ -36,6 +36,30 @@ bool isFolder(int parent, const std::string& name) {
   return fstatat(parent, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && S_ISDIR(status.st_mode);
 }
 
+/// Of a folder, so that what is in it can be read and removed. Never of what a link leads to.
+void makeWritable(int parent, const std::string& name) {
+  [[maybe_unused]] const int ignored = fchmodat(parent, name.c_str(), 0700, AT_SYMLINK_NOFOLLOW);
+}
+
+/// What is in the folder `name`, which is `prefix` for those who look from the top. False when `visit` has had enough.
+bool visitFolder(int parent, const std::string& name, const std::string& prefix, unsigned levelsLeft,
+                 const std::function<bool(const TreeEntry&)>& visit) {
+  bool goesOn = true;
+  forEachName(parent, name.c_str(), [&](int folder, const std::string& inner) {
+    struct stat status = {};
+    if (!goesOn || fstatat(folder, inner.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return;
+    TreeEntry entry;
+    entry.path = prefix + inner;
+    entry.isFolder = S_ISDIR(status.st_mode);
+    // The unit of st_blocks is 512 bytes on every file system.
+    if (S_ISREG(status.st_mode)) entry.bytesOnDisk = static_cast<std::uint64_t>(status.st_blocks) * 512;
+    goesOn = visit(entry);
+    if (goesOn && entry.isFolder && levelsLeft > 1)
+      goesOn = visitFolder(folder, inner, entry.path + "/", levelsLeft - 1, visit);
+  });
+  return goesOn;
+}
+
 }  // namespace
 
 bool removeTree(const std::string& folder) {
@@ -52,12 +76,12 @@ bool removeTree(const std::string& folder) {
         return;
       }
       if (!isFolder(root, name)) return;
-      [[maybe_unused]] const int outer = fchmodat(root, name.c_str(), 0700, 0);
+      makeWritable(root, name);
       forEachName(root, name.c_str(), [&](int parent, const std::string& inner) {
         if (unlinkat(parent, inner.c_str(), 0) == 0) return;
         if (unlinkat(parent, inner.c_str(), AT_REMOVEDIR) == 0) return;
         // To be moved it must be writable.
-        [[maybe_unused]] const int writable = fchmodat(parent, inner.c_str(), 0700, 0);
+        makeWritable(parent, inner);
         while (renameat(parent, inner.c_str(), root, ("moved" + std::to_string(moved++)).c_str()) != 0 &&
                (errno == EEXIST || errno == ENOTEMPTY || errno == ENOTDIR || errno == EISDIR)) {
         }
@@ -67,6 +91,11 @@ bool removeTree(const std::string& folder) {
   }
   close(root);
   return rmdir(folder.c_str()) == 0;
+}
+
+void visitTree(const std::string& folder, unsigned mostLevels,
+               const std::function<bool(const TreeEntry&)>& visit) {
+  visitFolder(AT_FDCWD, folder, "", mostLevels, visit);
 }
 
 std::optional<FolderLook> lookAtFolder(const std::string& folder) {

@@ -91,7 +91,8 @@ Marks newMarks() {
   std::random_device random;
   const Mark number = Mark{random()} << 32 | random();
   const Mark first = highest > 4 * kCount ? highest / 2 + number % (highest / 2 - kCount) : 1;
-  return {first, std::min(first + kCount - 1, highest)};
+  // One that may have no locks at all gets a mark that nothing carries.
+  return {first, std::max(first, std::min(first + kCount - 1, highest))};
 }
 
 int startProcess(const ProcessStart& start, std::string& reason, bool* isShortage) {
@@ -175,9 +176,13 @@ ProcessEnd endFrom(int status, const rusage& used) {
 ProcessEnd reap(int process) {
   int status = 0;
   rusage used = {};
-  while (wait4(process, &status, 0, &used) < 0 && errno == EINTR) {
+  pid_t ended = 0;
+  while ((ended = wait4(process, &status, 0, &used)) < 0 && errno == EINTR) {
   }
-  return endFrom(status, used);
+  if (ended == process) return endFrom(status, used);
+  ProcessEnd unknown;
+  unknown.value = -1;
+  return unknown;
 }
 
 std::optional<ProcessEnd> reapIfEnded(int process) {

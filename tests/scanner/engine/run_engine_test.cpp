@@ -134,7 +134,9 @@ TEST_P(RunEngineTest, AToolMayHaveMoreAddressSpaceThanTheLimit) {
 
 TEST_P(RunEngineTest, FilesThatAreLeftAreListedAndRemoved) {
   const RunSeen seen =
-      run(shellJob("echo 1 > \"$HOME/.config/a\"; mkdir \"$TMPDIR/d\"; echo 2 > \"$TMPDIR/d/b\""));
+      run(shellJob("echo 1 > \"$HOME/.config/a\"; mkdir \"$TMPDIR/d\"; echo 2 > \"$TMPDIR/d/b\"; "
+                   // Nobody looks so deep.
+                   "cd \"$TMPDIR/d\"; for i in $(seq 100); do mkdir d; cd d; done; echo 3 > c"));
   EXPECT_THAT(seen.leftBehind.files, ElementsAre("home/.config/a", "tmp/d/b"));
   EXPECT_EQ(seen.leftBehind.fileCount, 2U);
 }
