@@ -43,6 +43,8 @@ constexpr double kPatienceAfterInterruptInSeconds = 0.5;
 constexpr double kPatienceAfterKillInSeconds = 5;
 /// How long the pipes may stay open when all that could write to them is gone.
 constexpr double kPatienceWithPipesInSeconds = 0.5;
+/// When the engine could not look for longer than this, that time counts against no run.
+constexpr double kLongestPauseInSeconds = 1;
 /// So much of the limit, used by a run that failed, is what it failed of: the allocation that would have exceeded it
 /// was refused.
 constexpr double kNearlyAllMemory = 0.875;
@@ -99,6 +101,12 @@ std::string uniqueName() {
   char name[32];
   std::snprintf(name, sizeof name, "%08x%08x", random(), random());
   return name;
+}
+
+/// As nohup leaves it for SIGHUP, and a shell for SIGINT when it starts a program in the background.
+bool isIgnored(int signal) {
+  struct sigaction current = {};
+  return sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_IGN;
 }
 
 void orThrow(int result, const char* what) {
@@ -161,6 +169,7 @@ struct RunEngine::Implementation {
   unsigned startedRuns = 0;
   bool isShort = false;  ///< The system had no more processes: nothing is started before a run has ended.
   bool isInterrupted = false;
+  double lookedAt = 0;         ///< When poll() last looked at all runs, or work() began.
   std::exception_ptr failure;  ///< Of an OnEnd.
 };
 
@@ -196,6 +205,7 @@ struct RunEngine::Implementation::ActiveRun {
   void hit(LimitHit limit);
   void killNow();
   void giveUp();
+  void excuse(double seconds, double now);
   void watch(double now);
   void watchStep(double now);
   void sample(double now);
@@ -221,6 +231,7 @@ struct RunEngine::Implementation::ActiveRun {
   std::string wholeOutput;  ///< Of a program that is no worker.
   RunSeen seen;
   double startedAt = 0;
+  double excusedSeconds = 0;  ///< Of its age, those that do not count.
   double endedAt = 0;
   double terminatedAt = 0;
   double killedAt = 0;
@@ -266,6 +277,8 @@ void RunEngine::Implementation::ActiveRun::received(const Output& output, std::s
   seen.outputBytes += bytes.size();
   if (seen.outputBytes > limits().outputInBytes) {
     hit(LimitHit::kOutput);
+    // It may have ended before all that it had printed was read.
+    if (seen.limitHit == LimitHit::kNone) seen.limitHit = LimitHit::kOutput;
     // It may take a moment to end, and print all the while.
     for (Output* one : {&standardOutput, &standardError}) {
       if (!one->isOpen || one->endedAt > 0) continue;
@@ -379,6 +392,16 @@ std::string RunEngine::Implementation::ActiveRun::readRecord() const {
   return bytes;
 }
 
+/// The engine has not looked for so long: it was stopped, or waited for a terminal or a disk. The run may have waited
+/// for it all the while, with its pipes full.
+void RunEngine::Implementation::ActiveRun::excuse(double seconds, double now) {
+  const double own = std::min(seconds, now - startedAt);
+  excusedSeconds += own;
+  stepSince += own;
+  if (terminatedAt > 0) terminatedAt = std::min(terminatedAt + own, now);
+  if (killedAt > 0) killedAt = std::min(killedAt + own, now);
+}
+
 void RunEngine::Implementation::ActiveRun::watch(double now) {
   if (!isRunning) return;
   if (killedAt > 0) {
@@ -392,7 +415,7 @@ void RunEngine::Implementation::ActiveRun::watch(double now) {
     if (now - terminatedAt > patience) killNow();
     return;
   }
-  const double age = now - startedAt;
+  const double age = now - startedAt - excusedSeconds;
   const double pause = std::clamp(age * kSampleAtShareOfAge, kSampleEverySeconds, kSampleSeldomInSeconds);
   if (now - sampledAt > pause) sample(now);
   const Limits& limits = this->limits();
@@ -471,6 +494,8 @@ void RunEngine::Implementation::ActiveRun::noteLimitsOfTheSystem() {
 // ---- All runs ---------------------------------------------------------------------------------------------
 
 RunEngine::Implementation::Implementation(const EngineOptions& wanted) : options(wanted) {
+  // Ignored, as whoever started this process may have left it, it would keep from us how processes end.
+  std::signal(SIGCHLD, SIG_DFL);
   const char* temporary = std::getenv("TMPDIR");
   std::string parent = options.scratchParent;
   if (parent.empty()) parent = temporary != nullptr && *temporary != '\0' ? temporary : "/tmp";
@@ -515,6 +540,7 @@ void RunEngine::Implementation::makeLoop() {
       [](uv_signal_t* handle, int) { static_cast<Implementation*>(handle->data)->lookForEnded(); }, SIGCHLD);
   constexpr int kEndSignals[] = {SIGINT, SIGTERM, SIGHUP};
   for (std::size_t i = 0; i < 3; ++i) {
+    if (isIgnored(kEndSignals[i])) continue;
     onSignal(
         endSignals[i],
         [](uv_signal_t* handle, int) { static_cast<Implementation*>(handle->data)->interrupt(); },
@@ -559,6 +585,7 @@ RunEngine::Implementation::~Implementation() {
 }
 
 bool RunEngine::Implementation::work() {
+  lookedAt = monotonicSeconds();
   startMore();
   while (!active.empty() || (!queue.empty() && !isInterrupted)) {
     uv_run(&loop, UV_RUN_ONCE);
@@ -719,7 +746,12 @@ void RunEngine::Implementation::takeEnd(ActiveRun& run) {
 void RunEngine::Implementation::poll() {
   lookForEnded();
   const double now = monotonicSeconds();
-  for (const auto& run : active) run->watch(now);
+  const double pause = now - lookedAt;
+  for (const auto& run : active) {
+    if (pause > kLongestPauseInSeconds) run->excuse(pause, now);
+    run->watch(now);
+  }
+  lookedAt = monotonicSeconds();  // What looking takes counts.
 }
 
 /// Nothing may be thrown through the loop.

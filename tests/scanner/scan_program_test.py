@@ -11,6 +11,7 @@ import os
 import pathlib
 import pty
 import re
+import resource
 import shutil
 import signal
 import subprocess
@@ -37,6 +38,11 @@ class Surroundings(ScanTest):
         few = sorted(os.sched_getaffinity(0))[:1]
         first = self.events(PLUGINS / EFFECT, preexec_fn=lambda: os.sched_setaffinity(0, few))[0]
         self.assertEqual((first["event"], first["jobs"]), ("scan_started", 1))
+
+    def test_a_limit_of_0_for_file_locks_which_runs_are_marked_by(self):
+        locks = 10  # RLIMIT_LOCKS, which Python does not name.
+        verdicts = self.verdicts(PLUGINS / EFFECT, preexec_fn=lambda: resource.setrlimit(locks, (0, 0)))
+        self.assertEqual(verdicts, {EFFECT: "passed"})
 
     def test_two_scans_at_once_are_told_apart(self):
         folder = self.copies(20)
@@ -97,9 +103,14 @@ class WrongUse(ScanTest):
         self.assert_ends(3, "no scratch folder can be made in /proc/nowhere: ", PLUGINS / EFFECT,
                          environment={"TMPDIR": "/proc/nowhere"})
 
-    def test_a_sandbox_that_is_required_and_not_there(self):
+    def test_a_sandbox_that_is_required_and_not_there_or_does_not_work(self):
         self.assert_ends(3, "there is no sandbox: bubblewrap (bwrap) is not installed", PLUGINS / EFFECT,
                          sandbox="required", environment={"PATH": "/nowhere"})
+        self.write("bwrap", "#!/bin/sh\necho no rights\nexit 1\n").chmod(0o755)
+        for disposition in [signal.SIG_DFL, signal.SIG_IGN]:  # Whoever starts the scan may leave either.
+            self.assert_ends(3, "there is no sandbox: no rights\n", PLUGINS / EFFECT, sandbox="required",
+                             environment={"PATH": f"{self.folder}:/usr/bin:/bin"},
+                             preexec_fn=lambda: signal.signal(signal.SIGCHLD, disposition))
 
     def test_a_file_for_results_that_cannot_be_made(self):
         self.assert_ends(3, "/nowhere/results: No such file", "--json", "/nowhere/results", PLUGINS / EFFECT)

@@ -210,6 +210,28 @@ TEST_P(RunEngineTest, AnInterruptEndsWhatRunsAndStartsNothingNew) {
   EXPECT_EQ(engine.queued(), 0U);
 }
 
+TEST_P(RunEngineTest, ASignalThatWasIgnoredBeforeDoesNotInterrupt) {
+  const auto before = std::signal(SIGHUP, SIG_IGN);  // As nohup does.
+  RunEngine engine(options);
+  engine.add(shellJob("sleep 0.5"), [](const RunSeen& seen) { EXPECT_EQ(seen.end.status, 0); });
+  engine.onTick([] { std::raise(SIGHUP); });
+  EXPECT_TRUE(engine.run());
+  std::signal(SIGHUP, before);
+}
+
+TEST_P(RunEngineTest, TimeInWhichTheEngineCouldNotLookCountsAgainstNoRun) {
+  options.jobs = 2;
+  options.limits.runInSeconds = 2;
+  RunEngine engine(options);
+  engine.add(shellJob("true"), [](const RunSeen&) { sleep(3); });
+  RunSeen waiting;
+  // More than a pipe holds, so that it cannot end before the engine looks again.
+  engine.add(shellJob("sleep 0.5; head -c 200000 /dev/zero"), [&](const RunSeen& seen) { waiting = seen; });
+  EXPECT_TRUE(engine.run());
+  EXPECT_EQ(waiting.limitHit, LimitHit::kNone);
+  EXPECT_EQ(waiting.outputBytes, 200000U);
+}
+
 TEST_P(RunEngineTest, WhatOnEndThrowsComesOutOfRunWhenTheOthersHaveEnded) {
   options.jobs = 2;
   RunEngine engine(options);
