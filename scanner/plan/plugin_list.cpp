@@ -24,11 +24,11 @@ std::vector<std::string> fieldsOf(const std::string& line) {
   }
 }
 
-bool isNumber(const std::string& text) {
-  std::int64_t number = 0;
+std::optional<std::int32_t> numberIn(const std::string& text) {
+  std::int32_t number = 0;
   const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
-  return error == std::errc() && end == text.data() + text.size() && number >= INT32_MIN &&
-         number <= INT32_MAX;
+  const bool isNumber = error == std::errc() && end == text.data() + text.size();
+  return isNumber ? std::optional(number) : std::nullopt;
 }
 
 std::string fileNameOf(const std::string& path) { return path.substr(path.rfind('/') + 1); }
@@ -55,11 +55,14 @@ PluginList readList(const std::string& path, Take take) {
     const std::size_t mark = row.pattern.rfind('#');
     if (mark != std::string::npos) {
       const std::string child = row.pattern.substr(mark + 1);
-      if (child == "*" || isNumber(child)) {
-        row.child = child;
+      const std::optional<std::int32_t> identifier = numberIn(child);
+      if (child == "*" || identifier) {
+        row.child = identifier ? std::to_string(*identifier) : child;
         row.pattern.erase(mark);
       }
     }
+    // A shell completes the name of a folder with a slash.
+    while (row.pattern.size() > 1 && row.pattern.back() == '/') row.pattern.pop_back();
     if (row.pattern.empty()) fail(path, number, "no plug-in is named");
     take(fields, row);
     list.add(row);
@@ -130,8 +133,8 @@ PluginList readExpectations(const std::string& path, const std::vector<std::stri
       fail(path, row.line, fmt::format("\"{}\" is no verdict", row.verdict));
     }
     if (fields.size() > 2 && fields[2] != "-" && !fields[2].empty()) {
-      if (!isNumber(fields[2])) fail(path, row.line, fmt::format("\"{}\" is no step", fields[2]));
-      row.step = std::stoi(fields[2]);
+      row.step = numberIn(fields[2]);
+      if (!row.step || *row.step < 0) fail(path, row.line, fmt::format("\"{}\" is no step", fields[2]));
     }
     if (fields.size() > 3) row.reason = fields[3];
   });

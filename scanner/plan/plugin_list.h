@@ -30,7 +30,7 @@ class BrokenList : public std::runtime_error {
 
 struct PluginRow {
   std::string pattern;
-  std::optional<std::string> child = {};  ///< An identifier or "*"; nothing for the bundle itself.
+  std::optional<std::string> child = {};  ///< An identifier in decimal or "*"; nothing for the bundle itself.
   std::string verdict = {};               ///< Expectations only.
   std::optional<int> step = {};           ///< Expectations only; nothing for any step.
   std::string reason = {};

@@ -79,7 +79,8 @@ INSTANTIATE_TEST_SUITE_P(
                "line 4: \"Passed\" is no verdict"},
         Broken{"WithAnUnknownStep", false, "a.so\tcrashed\tfive\n", "line 1: \"five\" is no step"},
         Broken{"WithAStepBeyondNumbers", false, "a.so\tcrashed\t99999999999\n",
-               "line 1: \"99999999999\" is no step"}),
+               "line 1: \"99999999999\" is no step"},
+        Broken{"WithAStepBelow0", false, "a.so\tcrashed\t-1\n", "line 1: \"-1\" is no step"}),
     [](const auto& parameter) { return std::string(parameter.param.name); });
 
 TEST(Lists, CommentsEmptyLinesAndLineEndsOfOtherSystemsDoNotCount) {
@@ -143,8 +144,9 @@ INSTANTIATE_TEST_SUITE_P(
                       Match{"\xFF*", "/lib/\xFF\xFE", {}, true}, Match{"a.so", "/lib/a.so", 1, false},
                       Match{"a.so#1", "/lib/a.so", 1, true}, Match{"a.so#1", "/lib/a.so", {}, false},
                       Match{"a.so#1", "/lib/a.so", 2, false}, Match{"a.so#-7", "/lib/a.so", -7, true},
-                      Match{"a.so#*", "/lib/a.so", 2, true}, Match{"a.so#*", "/lib/a.so", {}, false},
-                      Match{"a#b.so", "/lib/a#b.so", {}, true}));
+                      Match{"a.so#007", "/lib/a.so", 7, true}, Match{"a.vst/", "/lib/a.vst", {}, true},
+                      Match{"/lib/a.vst/#7", "/lib/a.vst", 7, true}, Match{"a.so#*", "/lib/a.so", 2, true},
+                      Match{"a.so#*", "/lib/a.so", {}, false}, Match{"a#b.so", "/lib/a#b.so", {}, true}));
 
 TEST(PluginListMatching, GivesNamesAndPatternsInTheOrderOfTheList) {
   Lists lists;
