@@ -23,6 +23,11 @@ namespace {
 
 constexpr const char* kBackTrace = "bt 40";
 constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
+// The plug-in can write to the log, too: these keep one that was made up from taking time and memory without end.
+constexpr std::size_t kMostFrames = 100;  ///< gdb is asked for 40.
+constexpr std::size_t kMostMappings = 10000;
+constexpr std::size_t kMostRegisters = 1000;
+constexpr std::size_t kLongestLine = 4096;
 
 /// A part of memory that holds a part of a file.
 struct Mapping {
@@ -107,10 +112,10 @@ std::optional<Frame> readFrame(std::string_view line) {
 
 /// Everything of the log that findings are made of.
 struct Log {
-  std::vector<std::vector<Frame>> stacks;  ///< In the order in which they came.
-  std::string signal;                      ///< "SIGSEGV"
-  std::string instruction;                 ///< Where the program counter stands,
-  std::uint64_t programCounter = 0;        ///< and that itself.
+  std::vector<Frame> stack;          ///< The last one: of several threads that which runs the tests.
+  std::string signal;                ///< "SIGSEGV"
+  std::string instruction;           ///< Where the program counter stands,
+  std::uint64_t programCounter = 0;  ///< and that itself.
   std::map<std::string, std::string> registers;
   std::string end;  ///< What the process ended with, when gdb did not stop it.
 };
@@ -141,10 +146,11 @@ Log readLog(std::string_view text) {
   std::istringstream lines{std::string(text)};
   bool isInStack = false;
   for (std::string line; std::getline(lines, line);) {
+    if (line.size() > kLongestLine) line.resize(kLongestLine);
     if (const std::optional<Frame> frame = readFrame(line)) {
-      if (!isInStack) log.stacks.emplace_back();
+      if (!isInStack) log.stack.clear();
       isInStack = true;
-      log.stacks.back().push_back(*frame);
+      if (log.stack.size() < kMostFrames) log.stack.push_back(*frame);
       continue;
     }
     isInStack = false;
@@ -160,17 +166,18 @@ Log readLog(std::string_view text) {
     } else if (line.rfind("[Inferior ", 0) == 0) {
       log.end = line;
     } else {
-      readMapping(line, mappings);
+      if (mappings.size() < kMostMappings) readMapping(line, mappings);
       std::istringstream words(line);
       std::string name;
       std::string value;
-      if (words >> name >> value && value.rfind("0x", 0) == 0) log.registers.emplace(name, value);
+      const bool isRegister = words >> name >> value && value.rfind("0x", 0) == 0;
+      if (isRegister && log.registers.size() < kMostRegisters) log.registers.emplace(name, value);
     }
   }
+  if (log.stack.empty()) return log;
   // Of a frame that stands at the beginning of a line gdb shows no address.
-  if (!log.stacks.empty() && log.stacks.back().front().address == 0)
-    log.stacks.back().front().address = log.programCounter;
-  for (std::vector<Frame>& stack : log.stacks) findModules(stack, mappings);
+  if (log.stack.front().address == 0) log.stack.front().address = log.programCounter;
+  findModules(log.stack, mappings);
   return log;
 }
 
@@ -236,6 +243,12 @@ std::string textOf(const Judgement& judgement, const Log& log, const std::vector
   return text;
 }
 
+/// gdb calls those without a name SIG34 and so on.
+std::string nameForGdb(int signal) {
+  const std::string name = nameOfSignal(signal);
+  return name.rfind("SIG", 0) == 0 ? name : fmt::format("SIG{}", signal);
+}
+
 }  // namespace
 
 bool canStopAt(const Judgement& judgement, std::string& whyNot) {
@@ -284,7 +297,7 @@ std::vector<std::string> gdbCommand(const std::string& gdb, const Judgement& jud
     for (const char* order : {"run", "thread apply all bt 40"}) add(order);
   } else {
     if (judgement.signal) {
-      add(fmt::format("handle {} stop print pass", nameOfSignal(*judgement.signal)));
+      add(fmt::format("handle {} stop print pass", nameForGdb(*judgement.signal)));
     } else {
       add("handle SIGSEGV SIGBUS SIGILL SIGFPE SIGABRT SIGSYS stop print pass");
     }
@@ -301,9 +314,8 @@ std::vector<std::string> gdbCommand(const std::string& gdb, const Judgement& jud
 void readGdb(std::string_view log, const Judgement& judgement, Diagnosis& diagnosis) {
   const Log read = readLog(log);
   diagnosis.report = log.substr(log.size() - std::min(log.size(), kMostBytesOfReport));
-  if (!read.stacks.empty()) {
-    // Of several threads the one that runs the tests comes last.
-    const std::vector<Frame>& frames = read.stacks.back();
+  if (!read.stack.empty()) {
+    const std::vector<Frame>& frames = read.stack;
     const bool isOwn = !hasPlugin(frames);
     if (isOwn && looksForThrow(judgement)) {
       diagnosis.problem = "no exception that ends the run comes from the plug-in";
@@ -321,7 +333,7 @@ void readGdb(std::string_view log, const Judgement& judgement, Diagnosis& diagno
     diagnosis.problem = "gdb could not run it";
     std::istringstream lines{std::string(log)};
     for (std::string line; std::getline(lines, line);) {
-      if (!line.empty()) diagnosis.problem = "gdb could not run it: " + line;
+      if (!line.empty()) diagnosis.problem = "gdb could not run it: " + line.substr(0, kLongestLine);
     }
   }
 }

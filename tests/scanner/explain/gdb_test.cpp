@@ -12,6 +12,7 @@ namespace {
 using testing::Contains;
 using testing::ElementsAre;
 using testing::IsEmpty;
+using testing::SizeIs;
 
 constexpr const char* kMappings =
     "process 77\n"
@@ -122,6 +123,20 @@ TEST(ReadGdb, FramesBehindTheFirstThatAreNowhereAreLeftOut) {
       ElementsAre("0x1234"));
 }
 
+TEST(ReadGdb, ALogThatThePluginHasWrittenToTakesLittleTimeAndMemory) {
+  std::string log;
+  for (int i = 0; i < 40000; ++i) {
+    const std::string number = std::to_string(100000 + i);
+    log += "r" + number + " 0x0\n0x" + number + " 0x" + number + " 0x0 0x0 /" + number + "\n";
+  }
+  for (int i = 0; i < 40000; ++i) log += "#0  0x0000000000001234 in f ()\n";
+  log += "#1  0x0000000000001234 in " + std::string(100000, 'g') + " ()\n";
+  const Diagnosis diagnosis = read(log, ended(Verdict::kCrashed, SIGSEGV));
+  EXPECT_THAT(diagnosis.findings.at(0).frames, SizeIs(100));
+  EXPECT_LE(diagnosis.report.size(), 65536U);
+  EXPECT_LE(read(std::string(100000, 'x'), ended(Verdict::kCrashed, SIGSEGV)).problem.size(), 5000U);
+}
+
 TEST(ReadGdb, ThrowsAndExitsOfTheWorkerItselfAreNoFindings) {
   const std::string log = std::string(
                               "#0  0x00007fff10000020 in __cxa_throw () from /lib/libstdc++.so.6\n"
@@ -157,6 +172,7 @@ TEST(GdbCommand, StopsAtTheSignalThatEndedTheRun) {
   EXPECT_EQ(command.front(), "gdb");
   EXPECT_EQ(command.back(), "--args");
   EXPECT_THAT(command, Contains("handle SIGFPE stop print pass"));
+  EXPECT_THAT(gdbCommand("gdb", ended(Verdict::kKilled, 40)), Contains("handle SIG40 stop print pass"));
 }
 
 }  // namespace
