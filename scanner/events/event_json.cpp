@@ -286,6 +286,9 @@ std::string eventLine(const PluginResult& result) {
     std::optional<Json> description = parseBounded(*result.description, kDeepestEvent - 1, nullptr);
     if (description) event["description"] = std::move(*description);
   }
+  std::string whole = line(event);
+  if (whole.size() <= kLongestEventLine || !event.contains("description")) return whole;
+  event.erase("description");
   return line(event);
 }
 

@@ -2,6 +2,7 @@
 // Events as JSON, one object a line, in the form of docs/schema/scan-events.schema.json.
 #pragma once
 
+#include <cstddef>
 #include <string>
 #include <string_view>
 
@@ -11,6 +12,9 @@ namespace scanner {
 
 /// Of the events; the member "format" of scan_started. Another number for a change that readers notice.
 inline constexpr int kEventFormat = 1;
+
+/// In bytes. A result whose description would make its line longer is written without it.
+inline constexpr std::size_t kLongestEventLine = std::size_t{16} << 20;
 
 /// Each is one line with its newline. Texts that are not valid UTF-8 (names of files, what a plug-in prints) are
 /// made so: a byte that cannot stay becomes U+FFFD.

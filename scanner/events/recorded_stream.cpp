@@ -12,14 +12,12 @@
 #include <fmt/format.h>
 #include <unistd.h>
 
+#include "scanner/events/event_json.h"
 #include "scanner/events/event_reader.h"
 
 namespace scanner {
 namespace {
 
-/// The longest line that a scan writes is the result of a run that printed 64 KiB of control characters on both of its
-/// outputs, with a diagnosis of as many: below 2 MiB.
-constexpr std::size_t kLongestLine = std::size_t{16} << 20;
 constexpr std::size_t kMostProblems = 20;
 
 /// Puts a stream together, line by line.
@@ -47,7 +45,7 @@ class Reading {
   /// The line goes on for longer than any event does.
   void takeTooLong() {
     ++number;
-    complain(fmt::format("it is longer than {} MiB; nothing behind it is read", kLongestLine >> 20));
+    complain(fmt::format("it is longer than {} MiB; nothing behind it is read", kLongestEventLine >> 20));
   }
 
   RecordedStream finish() {
@@ -107,7 +105,7 @@ RecordedStream readStream(const std::string& source,
       piece.remove_prefix(end + 1);
     }
     pending += piece;
-    if (pending.size() > kLongestLine) {
+    if (pending.size() > kLongestEventLine) {
       reading.takeTooLong();
       return reading.finish();
     }

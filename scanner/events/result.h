@@ -3,6 +3,7 @@
 #pragma once
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <map>
 #include <optional>
@@ -55,6 +56,8 @@ struct Comparison {
 
 /// What a tool for finding errors (memcheck, gdb or a command of the user's) said of a further run.
 struct Diagnosis {
+  static constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
+
   struct Finding {
     std::string kind;  ///< The tool's word: "InvalidRead", "SIGSEGV".
     std::string text;  ///< One line for people.
@@ -67,7 +70,7 @@ struct Diagnosis {
   std::vector<std::string> command = {};  ///< What repeats the run under the tool.
   std::vector<Finding> findings = {};
   std::string problem = {};  ///< Why there is no diagnosis, or what is missing in it: a sentence, or empty.
-  std::string report = {};   ///< What the tool said, its last 64 KiB.
+  std::string report = {};   ///< What the tool said, kMostBytesOfReport of it at most.
 
   /// Whether there is a finding that the plug-in has a part in.
   [[nodiscard]] bool hasFindings() const {

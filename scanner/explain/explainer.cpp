@@ -18,7 +18,6 @@ namespace {
 constexpr int kLastFixedStep = 15;
 constexpr std::uint64_t kTimesTheMemory = 4;
 constexpr double kPatienceWithGdbInSeconds = 30;
-constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
 
 std::string listText(const std::vector<int>& tests) { return fmt::format("{}", fmt::join(tests, ",")); }
 
@@ -74,7 +73,7 @@ void addProblem(Diagnosis& diagnosis, const std::string& sentence) {
 std::string printedText(const RunSeen& seen) {
   std::string printed;
   for (const PluginText& text : seen.texts) printed += text.bytes;
-  return printed.substr(printed.size() - std::min(printed.size(), kMostBytesOfReport));
+  return printed.substr(printed.size() - std::min(printed.size(), Diagnosis::kMostBytesOfReport));
 }
 
 }  // namespace
@@ -253,7 +252,6 @@ void Explainer::diagnosed(const Open& open, const RunSeen& seen, const std::vect
   switch (options.tool->kind) {
     case ExplainTool::Kind::kMemcheck: {
       readMemcheck(seen.toolFiles.at(0), seen.toolFiles.at(1), diagnosis);
-      diagnosis.report = diagnosis.report.substr(0, kMostBytesOfReport);
       const Judgement judgement = judge(seen, limitsUnder(result.judgement), tests.size());
       if (judgement.verdict != result.judgement.verdict && judgement.verdict != Verdict::kNotRun) {
         addProblem(diagnosis, fmt::format("the run ended otherwise, {}{}{}", rowOf(judgement.verdict).word,

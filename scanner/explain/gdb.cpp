@@ -22,7 +22,6 @@ namespace scanner {
 namespace {
 
 constexpr const char* kBackTrace = "bt 40";
-constexpr std::size_t kMostBytesOfReport = std::size_t{64} << 10;
 // The plug-in can write to the log, too: these keep one that was made up from taking time and memory without end.
 constexpr std::size_t kMostFrames = 100;  ///< gdb is asked for 40.
 constexpr std::size_t kMostMappings = 10000;
@@ -313,7 +312,7 @@ std::vector<std::string> gdbCommand(const std::string& gdb, const Judgement& jud
 
 void readGdb(std::string_view log, const Judgement& judgement, Diagnosis& diagnosis) {
   const Log read = readLog(log);
-  diagnosis.report = log.substr(log.size() - std::min(log.size(), kMostBytesOfReport));
+  diagnosis.report = log.substr(log.size() - std::min(log.size(), Diagnosis::kMostBytesOfReport));
   if (!read.stack.empty()) {
     const std::vector<Frame>& frames = read.stack;
     const bool isOwn = !hasPlugin(frames);

@@ -16,6 +16,10 @@ namespace scanner {
 namespace {
 
 constexpr std::size_t kMostFindings = 100;
+// The plug-in can write to the files, too: these keep what was made up from taking memory without end.
+constexpr std::size_t kMostBytesOfFindings = std::size_t{512} << 10;
+constexpr std::size_t kMostFrames = 100;  ///< memcheck is asked for 40.
+constexpr std::size_t kLongestText = 1024;
 
 /// By the module's path: what an address in memory is ahead of its offset in the module.
 using LoadAddresses = std::map<std::string, std::uint64_t>;
@@ -43,14 +47,19 @@ LoadAddresses readLog(std::string_view log) {
   return addresses;
 }
 
+std::string textOf(const pugi::xml_node& node, const char* child) {
+  return std::string(node.child_value(child)).substr(0, kLongestText);
+}
+
 std::vector<Frame> readStack(const pugi::xml_node& stack, const LoadAddresses& addresses) {
   std::vector<Frame> frames;
   for (const pugi::xml_node& one : stack.children("frame")) {
+    if (frames.size() == kMostFrames) break;
     Frame frame;
-    frame.function = one.child_value("fn");
-    frame.file = one.child_value("file");
-    frame.line = one.child_value("line");
-    frame.module = one.child_value("obj");
+    frame.function = textOf(one, "fn");
+    frame.file = textOf(one, "file");
+    frame.line = textOf(one, "line");
+    frame.module = textOf(one, "obj");
     frame.address = std::strtoull(one.child_value("ip"), nullptr, 16);
     const auto at = addresses.find(frame.module);
     if (at != addresses.end() && frame.address >= at->second) frame.offset = frame.address - at->second;
@@ -69,11 +78,11 @@ struct Error {
 
 Error readError(const pugi::xml_node& node, const LoadAddresses& addresses) {
   Error error;
-  error.kind = node.child_value("kind");
-  error.what = node.child_value("what");
-  if (error.what.empty()) error.what = node.child("xwhat").child_value("text");
-  error.more = node.child_value("auxwhat");
-  if (error.more.empty()) error.more = node.child("xauxwhat").child_value("text");
+  error.kind = textOf(node, "kind");
+  error.what = textOf(node, "what");
+  if (error.what.empty()) error.what = textOf(node.child("xwhat"), "text");
+  error.more = textOf(node, "auxwhat");
+  if (error.more.empty()) error.more = textOf(node.child("xauxwhat"), "text");
   const pugi::xml_node stack = node.child("stack");
   error.frames = readStack(stack, addresses);
   error.origin = readStack(stack.next_sibling("stack"), addresses);
@@ -106,7 +115,7 @@ std::string textOf(const Error& error) {
 
 std::string lastLine(std::string_view text) {
   while (!text.empty() && (text.back() == '\n' || text.back() == ' ')) text.remove_suffix(1);
-  return std::string(text.substr(text.rfind('\n') + 1));
+  return std::string(text.substr(text.rfind('\n') + 1)).substr(0, kLongestText);
 }
 
 }  // namespace
@@ -138,11 +147,14 @@ void readMemcheck(std::string_view errors, std::string_view log, Diagnosis& diag
   std::map<std::string, std::size_t> findingAt;
   std::vector<unsigned> times;
   std::size_t leftOut = 0;
+  std::size_t bytesOfFindings = 0;
   for (const pugi::xml_node& node : root.children("error")) {
     const Error error = readError(node, addresses);
     if (error.kind.rfind("Leak_", 0) == 0) continue;
-    diagnosis.report += fmt::format("{}: {}\n{}", error.kind, error.what, listOf(error.frames));
-    if (!error.more.empty()) diagnosis.report += fmt::format("  {}\n{}", error.more, listOf(error.origin));
+    if (diagnosis.report.size() < Diagnosis::kMostBytesOfReport) {
+      diagnosis.report += fmt::format("{}: {}\n{}", error.kind, error.what, listOf(error.frames));
+      if (!error.more.empty()) diagnosis.report += fmt::format("  {}\n{}", error.more, listOf(error.origin));
+    }
     const Frame* place = innermostOfPlugin(error.frames);
     const std::vector<std::string> frames = textsOf(error.frames);
     const std::string key = error.kind + '\n' +
@@ -152,15 +164,17 @@ void readMemcheck(std::string_view errors, std::string_view log, Diagnosis& diag
     const auto known = findingAt.find(key);
     if (known != findingAt.end()) {
       ++times[known->second];
-    } else if (diagnosis.findings.size() == kMostFindings) {
+    } else if (diagnosis.findings.size() == kMostFindings || bytesOfFindings > kMostBytesOfFindings) {
       ++leftOut;
     } else {
       findingAt[key] = diagnosis.findings.size();
       const bool isInPlugin = place != nullptr || hasPlugin(error.origin);
       diagnosis.findings.push_back({error.kind, textOf(error), frames, isInPlugin});
       times.push_back(1);
+      for (const std::string& one : frames) bytesOfFindings += one.size();
     }
   }
+  diagnosis.report.resize(std::min(diagnosis.report.size(), Diagnosis::kMostBytesOfReport));
   for (std::size_t i = 0; i < times.size(); ++i) {
     if (times[i] > 1) diagnosis.findings[i].text += fmt::format(" (one of {} there)", times[i]);
   }

@@ -38,6 +38,7 @@ constexpr int kLastFixedStep = 15;
 constexpr int kStepOfDescription = 1;
 /// The second instance is created in this step, and missed in a later one.
 constexpr int kStepOfRecreation = 14;
+constexpr std::size_t kLongestReason = 1000;
 constexpr const char* kLoadFailure = "!create and initialize failed -1";
 
 bool isFaultSignal(int signal) {
@@ -86,7 +87,8 @@ Lines readLines(const RunSeen& seen) {
 
 std::string megabytes(std::uint64_t bytes) { return fmt::format("{} MiB", bytes >> 20); }
 
-/// The last line that the loader or the worker said on standard error, for the reason of a failed load.
+/// The last line that the loader or the worker said on standard error, for the reason of a failed load; its beginning,
+/// if it is very long.
 std::string lastErrorLine(const RunSeen& seen) {
   std::string line;
   for (const PluginText& text : seen.texts) {
@@ -97,7 +99,7 @@ std::string lastErrorLine(const RunSeen& seen) {
     if (!rest.empty()) line = newline == std::string::npos ? rest : rest.substr(newline + 1);
   }
   constexpr std::string_view kPrefix = "vsttorture: ";
-  return line.rfind(kPrefix, 0) == 0 ? line.substr(kPrefix.size()) : line;
+  return line.substr(line.rfind(kPrefix, 0) == 0 ? kPrefix.size() : 0, kLongestReason);
 }
 
 /// Of an opcode: its own, or its number where it has none.

@@ -101,6 +101,15 @@ TEST(ReadStream, ALineWithoutEndIsGivenUp) {
   EXPECT_LT(bytes, 20U << 20);
 }
 
+TEST(ReadStream, ADescriptionThatWouldMakeItsLineTooLongIsNotWritten) {
+  PluginResult result = resultOf("/lib/a.so", Verdict::kPassed);
+  result.description = R"({"name":")" + std::string(17U << 20, 'x') + "\"}";
+  const RecordedStream stream = read(kStarted + eventLine(result) + kResult + kEnded, 1U << 16);
+  EXPECT_THAT(stream.problems, IsEmpty());
+  ASSERT_THAT(stream.scans.at(0).report.results, SizeIs(2));
+  EXPECT_FALSE(stream.scans[0].report.results[0].description);
+}
+
 TEST(ReadStream, AFileThatCannotBeReadHasTheSystemsReason) {
   try {
     readStream("/nowhere/file");

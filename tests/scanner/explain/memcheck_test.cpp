@@ -10,6 +10,7 @@ namespace {
 using testing::ElementsAre;
 using testing::HasSubstr;
 using testing::IsEmpty;
+using testing::SizeIs;
 
 constexpr const char* kWorker = "/usr/lib/vsttorture/vsttorture-worker";
 constexpr const char* kPlugin = "/usr/lib/vst/a&amp;b.so";
@@ -85,6 +86,20 @@ TEST(ReadMemcheck, ErrorsOfOneKindAtOnePlaceOfThePluginAreOneFinding) {
   ASSERT_EQ(diagnosis.findings.size(), 2U);
   EXPECT_EQ(diagnosis.findings[0].text, "Conditional jump (one of 3 there)");
   EXPECT_EQ(diagnosis.findings[1].kind, "InvalidRead");
+}
+
+TEST(ReadMemcheck, AFileThatThePluginHasWrittenToMakesNoEndlessFindings) {
+  std::string stack;
+  for (int i = 0; i < 200; ++i) stack += frame("0x5001fa7", kPlugin, std::string(5000, 'f'));
+  std::string errors;
+  for (int i = 0; i < 20; ++i) errors += error("Kind" + std::to_string(i), std::string(5000, 'w'), stack);
+  const Diagnosis diagnosis = read(document(errors));
+  ASSERT_THAT(diagnosis.findings, SizeIs(6));
+  EXPECT_THAT(diagnosis.findings[0].frames, SizeIs(100));
+  EXPECT_LT(diagnosis.findings[0].frames[0].size(), 1100U);
+  EXPECT_EQ(diagnosis.findings[0].text.size(), 1024U);
+  EXPECT_EQ(diagnosis.problem, "14 more findings are in the report only");
+  EXPECT_EQ(diagnosis.report.size(), 65536U);
 }
 
 TEST(ReadMemcheck, LeaksAreNoFindings) {

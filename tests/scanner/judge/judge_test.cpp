@@ -404,6 +404,8 @@ const Case kWorkers[] = {
      "--x"},
     {"IsGivenNoBundle", SeenRun::loading().phase(0).exits(2), "not_run", 0, "",
      "the worker ended with status 2 before it loaded the plug-in"},
+    {"SaysVeryMuch", SeenRun::notBegun().error(std::string(5000, 'x') + "\n").exits(127), "not_run", 0, "",
+     "the worker ended with status 127 before it loaded the plug-in: " + std::string(1000, 'x')},
     {"CannotBeLinked", SeenRun::notBegun().error("error while loading shared libraries\n").exits(127),
      "not_run", 0, "",
      "the worker ended with status 127 before it loaded the plug-in: error while loading shared libraries"},
