@@ -9,6 +9,7 @@
 #include <fmt/format.h>
 #include <sys/stat.h>
 
+#include "scanner/events/baseline.h"
 #include "scanner/events/comparison.h"
 #include "scanner/events/event_json.h"
 #include "scanner/events/event_reader.h"
@@ -141,7 +142,9 @@ std::optional<PluginResult> Remembering::resultOf(const Known& known) {
     const std::optional<std::string> line = store->eventOf(answer.id);
     std::optional<Event> event = line ? readEvent(*line) : std::nullopt;
     auto* whole = event ? std::get_if<PluginResult>(&*event) : nullptr;
-    if (whole == nullptr || whole->judgement.verdict != answer.verdict) return std::nullopt;
+    // The database may have been set aside meanwhile: the same number is another result's in the new one.
+    const bool isOf = whole != nullptr && keyOf(whole->run) == keyOf(known.run);
+    if (!isOf || whole->judgement.verdict != answer.verdict) return std::nullopt;
     result = std::move(*whole);
   }
   result.run = known.run;

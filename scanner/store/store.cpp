@@ -9,9 +9,12 @@
 #include <map>
 #include <thread>
 
+#include <fcntl.h>
 #include <fmt/format.h>
 #include <nlohmann/json.hpp>
+#include <sys/file.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include "scanner/events/event_json.h"
 #include "scanner/store/database.h"
@@ -93,7 +96,8 @@ std::optional<std::vector<Child>> childrenOf(const std::string& text) {
   std::vector<Child> children;
   for (const nlohmann::json& one : list) {
     const bool isChild = one.is_object() && one.contains("id") && one["id"].is_number_integer() &&
-                         one.contains("name") && one["name"].is_string();
+                         one["id"] >= INT32_MIN && one["id"] <= INT32_MAX && one.contains("name") &&
+                         one["name"].is_string();
     if (!isChild) return std::nullopt;
     children.push_back({one["id"].get<std::int32_t>(), one["name"].get<std::string>()});
   }
@@ -109,6 +113,30 @@ std::string makeFolders(const std::string& file) {
   }
   return {};
 }
+
+/// 0 where there is no such file.
+ino_t inodeOf(const std::string& file) {
+  struct stat status = {};
+  return stat(file.c_str(), &status) == 0 ? status.st_ino : 0;
+}
+
+/// Held by one scan at a time, on all file systems that have such locks.
+class FolderLock {
+ public:
+  explicit FolderLock(const std::string& folder)
+      : descriptor(::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
+    while (descriptor >= 0 && flock(descriptor, LOCK_EX) != 0 && errno == EINTR) {
+    }
+  }
+  ~FolderLock() {
+    if (descriptor >= 0) close(descriptor);
+  }
+  FolderLock(const FolderLock&) = delete;
+  FolderLock& operator=(const FolderLock&) = delete;
+
+ private:
+  int descriptor;
+};
 
 /// A row to write, which outlives the result it was made of.
 struct Row {
@@ -179,7 +207,7 @@ struct Store::Implementation {
   std::unique_ptr<Connection> connection;
   bool canWrite = false;
   bool wasSetAside = false;
-  ino_t inode = 0;  ///< Of the file that is open.
+  ino_t inode = 0;  ///< Of the file that is open, or is being opened; 0 for one that was not there.
   std::optional<ScanStarted> scan;
   std::int64_t scanRow = 0;
   std::deque<Row> waiting;  ///< Until another program gives its lock back.
@@ -214,6 +242,7 @@ void Store::Implementation::open() {
 
 void Store::Implementation::connect() {
   canWrite = false;
+  inode = inodeOf(file);  // Before anything is read: another scan may put a new database in its place.
   try {
     connection = std::make_unique<Connection>(std::make_unique<Database>(file, Database::Access::kWrite));
     Database& database = connection->database;
@@ -243,22 +272,20 @@ void Store::Implementation::connect() {
     connection->database.waitForLocks(kWaitMeanwhileInMilliseconds);
     say("the results of this scan are not remembered: " + file + " cannot be written to");
   }
-  struct stat status = {};
-  inode = stat(file.c_str(), &status) == 0 ? status.st_ino : 0;
+  if (inode == 0) inode = inodeOf(file);
 }
 
 /// Renames the database, with the files that belong to it, and opens a new one. Once a scan: something that
 /// damages each new one is not ours to fight with.
 bool Store::Implementation::setAside(const std::string& reason) {
   connection.reset();
-  struct stat status = {};
-  const bool isReplaced = inode != 0 && stat(file.c_str(), &status) == 0 && status.st_ino != inode;
   if (wasSetAside) {
     say("nothing more is remembered: " + file + " is damaged again (" + reason + ")");
     return false;
   }
   wasSetAside = true;
-  if (!isReplaced) {  // Else another scan was faster.
+  const FolderLock lock(file.substr(0, file.rfind('/') + 1));
+  if (inode == 0 || inodeOf(file) == inode) {  // Else another scan was faster.
     std::string aside;
     for (int number = 1; aside.empty() || isThere(aside, false); ++number)
       aside = file + ".damaged-" + std::to_string(number);
@@ -300,6 +327,7 @@ void Store::Implementation::handle(const DatabaseError& error, bool isWriting) {
 void Store::Implementation::giveUpWriting(const std::string& reason) {
   canWrite = false;
   waiting.clear();
+  bytesWaiting = 0;
   say("results are no longer remembered: " + file + ": " + reason);
 }
 
@@ -413,7 +441,7 @@ bool Store::hasResults() {
 std::vector<Remembered> Store::resultsOf(const std::string& bundle, const std::string& processor,
                                          const std::optional<std::int32_t>& child) {
   std::vector<Remembered> results;
-  implementation->attempt(false, [&](auto& connection) {
+  const bool isRead = implementation->attempt(false, [&](auto& connection) {
     Statement& row = connection.prepared(kResultsOf);
     row.bindBytes(1, bundle).bind(2, processor).bind(3, wide(child)).bind(4, std::int64_t{kEventsKept});
     while (row.step()) {
@@ -442,6 +470,8 @@ std::vector<Remembered> Store::resultsOf(const std::string& bundle, const std::s
     }
     row.reset();
   });
+  // The numbers of those that were read before it broke mean nothing in the database that is open now.
+  if (!isRead) results.clear();
   return results;
 }
 

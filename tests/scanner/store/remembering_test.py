@@ -269,12 +269,13 @@ class SecondScan(RememberingTest):
                          {"plugin.so": "shell", "plugin.so#1001": "passed", "plugin.so#1234": "skipped",
                           "plugin.so#-7": "passed"})
 
-    def test_an_event_that_cannot_be_read_is_had_again(self):
+    def test_an_event_that_cannot_be_read_or_is_of_another_plugin_is_had_again(self):
         plugin = self.plugin()
         self.scan(plugin)
-        self.run_sql("UPDATE results SET event = substr(event, 1, 100)")
-        self.assertFalse(self.is_remembered(plugin, status=0))
-        self.assertTrue(self.is_remembered(plugin, status=0))
+        for event in ("substr(event, 1, 100)", "replace(event, 'plugin.so', 'other.so')"):
+            self.run_sql(f"UPDATE results SET event = {event}")
+            self.assertFalse(self.is_remembered(plugin, status=0))
+            self.assertTrue(self.is_remembered(plugin, status=0))
 
     def test_an_interrupted_run_is_no_answer(self):
         plugin = self.plugin("faulty.so")

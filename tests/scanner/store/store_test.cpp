@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include <filesystem>
 #include <fstream>
+#include <thread>
 
 #include <gmock/gmock.h>
 #include <sys/stat.h>
@@ -217,6 +218,25 @@ TEST_F(StoreTest, WhatIsNoDatabaseIsRenamedAndANewOneBegun) {
   EXPECT_THAT(scan({"/a.so"}).at(0), HasSubstr("results.sqlite.damaged-2"));
   EXPECT_THAT(filesBeside(),
               ElementsAre("results.sqlite", "results.sqlite.damaged-1", "results.sqlite.damaged-2"));
+}
+
+TEST_F(StoreTest, TwoScansThatFindTheSameDamageRenameItOnceAndShareTheNewOne) {
+  for (int round = 0; round < 30; ++round) {
+    fs::remove_all(fs::path(file).parent_path());
+    fs::create_directories(fs::path(file).parent_path());
+    std::ofstream(file) << std::string(5000, 'x');
+    const auto scanOf = [this](const std::string& bundle) {
+      Store store(file, [](const std::string&) {});
+      store.beginScan(aScan());
+      store.save(result(bundle), {}, {});
+      store.endScan({}, {}, 0);
+    };
+    std::thread other(scanOf, "/a.so");
+    scanOf("/b.so");
+    other.join();
+    ASSERT_FALSE(fs::exists(file + ".damaged-2")) << round;
+    ASSERT_THAT(History(file).resultsOf("/"), SizeIs(2)) << round;
+  }
 }
 
 TEST_F(StoreTest, ATruncatedDatabaseIsRenamed) {
