@@ -37,7 +37,6 @@ int main(int argc, const char** argv) {
   }
   if (!limitThisProcess(options, mistake)) return complain(mistake);
 
-  initialiseUnwinder();
   openReport();
   const CPPAutoReleasePool pool(kExitCrashed);
   if (options.firstOperand >= argc) {

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/events/event_json.h"
 
-#include <algorithm>
 #include <utility>
 
 #include <fmt/format.h>
@@ -207,11 +206,8 @@ Json shrunkJson(const std::optional<Shrunk>& shrunk) {
 double Repetitions::flakeRate() const {
   unsigned bad = 0;
   for (const auto& [end, count] : verdicts) {
-    const auto isIts = [word = end.substr(0, end.find(' '))](const VerdictRow& row) {
-      return word == row.word;
-    };
-    const auto row = std::find_if(verdictTable().begin(), verdictTable().end(), isIts);
-    if (row == verdictTable().end() || !row->isGood) bad += count;
+    const std::optional<Verdict> verdict = verdictOf(std::string_view(end).substr(0, end.find(' ')));
+    if (!verdict || !rowOf(*verdict).isGood) bad += count;
   }
   return runs > 0 ? static_cast<double>(bad) / runs : 0;
 }

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/events/event_reader.h"
 
-#include <algorithm>
 #include <cmath>
 #include <cstdint>
 #include <cstdlib>
@@ -116,9 +115,7 @@ class Value {
   }
 
   [[nodiscard]] Verdict verdict() const {
-    for (const VerdictRow& row : verdictTable()) {
-      if (text() == row.word) return row.verdict;
-    }
+    if (const std::optional<Verdict> verdict = verdictOf(text())) return *verdict;
     fail("is " + asText(text()) + ", which is no verdict");
   }
 
@@ -419,10 +416,8 @@ ScanEnded readScanEnded(const Value& event) {
   ended.time = event["time"].measure();
   ended.wallSeconds = event["wallSeconds"].measure();
   ended.counts = event["counts"].counts<std::size_t>();
-  const std::vector<std::string> words = verdictWords();
   for (const auto& [word, count] : ended.counts) {
-    if (std::find(words.begin(), words.end(), word) == words.end())
-      event["counts"].fail("counts " + asText(word) + ", which is no verdict");
+    if (!verdictOf(word)) event["counts"].fail("counts " + asText(word) + ", which is no verdict");
   }
   ended.unwanted = event["unwanted"].whole<std::size_t>();
   ended.isInterrupted = event["isInterrupted"].boolean();

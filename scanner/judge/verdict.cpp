@@ -65,6 +65,13 @@ const VerdictRow& rowOf(Verdict verdict) {
   return verdictTable().back();
 }
 
+std::optional<Verdict> verdictOf(std::string_view word) {
+  for (const VerdictRow& row : verdictTable()) {
+    if (word == row.word) return row.verdict;
+  }
+  return std::nullopt;
+}
+
 std::vector<std::string> verdictWords() {
   std::vector<std::string> words;
   for (const VerdictRow& row : verdictTable()) words.emplace_back(row.word);

@@ -4,9 +4,8 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
-
-#include "scanner/engine/run_seen.h"
 
 namespace scanner {
 
@@ -38,5 +37,7 @@ struct VerdictRow {
 const std::vector<VerdictRow>& verdictTable();
 const VerdictRow& rowOf(Verdict verdict);
 std::vector<std::string> verdictWords();
+/// Nothing for a word that is no verdict's.
+std::optional<Verdict> verdictOf(std::string_view word);
 
 }  // namespace scanner

@@ -73,13 +73,6 @@ constexpr const char* kForgetResults =
     "IS ?3"
     " ORDER BY id DESC LIMIT -1 OFFSET ?4)";
 
-std::optional<Verdict> verdictOf(const std::string& word) {
-  for (const VerdictRow& row : verdictTable()) {
-    if (word == row.word) return row.verdict;
-  }
-  return std::nullopt;
-}
-
 std::optional<std::int64_t> wide(const std::optional<std::int32_t>& number) {
   return number ? std::optional<std::int64_t>(*number) : std::nullopt;
 }
