@@ -60,7 +60,9 @@ rlimit& usualDescriptorLimit() {
   dup2(start.standardError, STDERR_FILENO);
   // Those that this process has inherited are no business of a plug-in either.
   close_range(static_cast<unsigned>(STDERR_FILENO + 1), ~0U, CLOSE_RANGE_CLOEXEC);
-  limit(RLIMIT_CORE, 0);
+  // One byte is too little for a file, and the only limit with which the kernel does not hand the core to a program
+  // (/proc/sys/kernel/core_pattern).
+  limit(RLIMIT_CORE, 1);
   if (usualDescriptorLimit().rlim_max > 0) setrlimit(RLIMIT_NOFILE, &usualDescriptorLimit());
   if (start.addressSpaceInBytes > 0) limit(RLIMIT_AS, start.addressSpaceInBytes);
   if (start.fileSizeInBytes > 0) limit(RLIMIT_FSIZE, start.fileSizeInBytes);
