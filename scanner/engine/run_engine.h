@@ -24,7 +24,7 @@ namespace scanner {
 enum class SandboxUse { kAuto, kRequired, kOff };
 
 struct EngineOptions {
-  unsigned jobs = 1;
+  unsigned jobs = 1;  ///< How many run at a time; 1 at least.
   Limits limits = {};
   SandboxUse sandbox = SandboxUse::kAuto;
   std::string scratchParent = {};  ///< Empty: TMPDIR, else /tmp.

@@ -13,11 +13,12 @@ namespace scanner {
 
 /// The limits under which it ran.
 struct Limits {
+  // Both above 0. Time in which the engine could not look does not count.
   double stepInSeconds = 20;
   double runInSeconds = 120;
   std::uint64_t memoryInBytes = std::uint64_t{4} << 30;   ///< Address space; 0 for none.
-  std::uint64_t outputInBytes = std::uint64_t{64} << 20;  ///< Both outputs together.
-  std::uint64_t filesInBytes = std::uint64_t{1} << 30;    ///< Files in the scratch folder together.
+  std::uint64_t outputInBytes = std::uint64_t{64} << 20;  ///< Both outputs together; above 0.
+  std::uint64_t filesInBytes = std::uint64_t{1} << 30;  ///< Files in the scratch folder together; 0 for none.
 };
 
 /// How the process ended.

@@ -125,11 +125,11 @@ TEST(ReadGdb, FramesBehindTheFirstThatAreNowhereAreLeftOut) {
 
 TEST(ReadGdb, ALogThatThePluginHasWrittenToTakesLittleTimeAndMemory) {
   std::string log;
-  for (int i = 0; i < 40000; ++i) {
+  for (int i = 0; i < 15000; ++i) {
     const std::string number = std::to_string(100000 + i);
     log += "r" + number + " 0x0\n0x" + number + " 0x" + number + " 0x0 0x0 /" + number + "\n";
   }
-  for (int i = 0; i < 40000; ++i) log += "#0  0x0000000000001234 in f ()\n";
+  for (int i = 0; i < 15000; ++i) log += "#0  0x0000000000001234 in f ()\n";
   log += "#1  0x0000000000001234 in " + std::string(100000, 'g') + " ()\n";
   const Diagnosis diagnosis = read(log, ended(Verdict::kCrashed, SIGSEGV));
   EXPECT_THAT(diagnosis.findings.at(0).frames, SizeIs(100));

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: MIT
+#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <thread>
@@ -221,11 +222,14 @@ TEST_F(StoreTest, WhatIsNoDatabaseIsRenamedAndANewOneBegun) {
 }
 
 TEST_F(StoreTest, TwoScansThatFindTheSameDamageRenameItOnceAndShareTheNewOne) {
-  for (int round = 0; round < 30; ++round) {
+  for (int round = 0; round < 10; ++round) {
     fs::remove_all(fs::path(file).parent_path());
     fs::create_directories(fs::path(file).parent_path());
     std::ofstream(file) << std::string(5000, 'x');
-    const auto scanOf = [this](const std::string& bundle) {
+    std::atomic<int> arriving = 2;
+    const auto scanOf = [&](const std::string& bundle) {
+      --arriving;
+      while (arriving > 0) std::this_thread::yield();
       Store store(file, [](const std::string&) {});
       store.beginScan(aScan());
       store.save(result(bundle), {}, {});
