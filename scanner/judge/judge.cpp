@@ -166,10 +166,10 @@ class Judge {
   void readRecord() {
     const bool isUnwritten = seen.record.find_first_not_of('\0') == std::string::npos;
     if (isUnwritten) {
-      // The worker writes its record before it does anything else.
-      if (seen.lines.empty()) {
-        hasBegun = seen.record.size() != kFlightRecordSizeInBytes;
-      } else {
+      // The worker writes its record before it does anything else. Its file is as long as a record from the beginning.
+      if (seen.end.kind == End::Kind::kNotStarted) return;
+      hasBegun = !seen.lines.empty() || seen.record.size() != kFlightRecordSizeInBytes;
+      if (hasBegun) {
         contradict("there is no flight record, although the run has begun: the plug-in has removed it");
       }
       return;
