@@ -58,6 +58,8 @@ struct ProcessEnd {
   int value = 0;  ///< The signal, or the exit status; -1 where the system does not know it.
   double userSeconds = 0;
   double systemSeconds = 0;
+  /// Resident. Never less than what this process used when it started the other one: until that becomes a program of
+  /// its own, the system counts their common memory as its.
   std::uint64_t peakMemoryInBytes = 0;
 };
 
