@@ -276,8 +276,8 @@ class Judge {
   }
 
   void byLimit() {
-    addRequest(true);
-    const std::string request = inRequest(" in ");
+    addRequest();
+    const std::string request = inRequest();
     const auto killedFor = [&](const char* what, std::uint64_t bytes) {
       say(Verdict::kKilled, fmt::format("{}: {} more than {}{}", where(), what, megabytes(bytes), request));
     };
@@ -314,7 +314,7 @@ class Judge {
       if (!activity.systemCall.empty()) doing += " in " + activity.systemCall;
       if (activity.sockets > 0) doing += activity.sockets == 1 ? ", a socket open" : ", sockets open";
     }
-    say(Verdict::kHung, fmt::format("{}: {} {} s, {}{}", where(), what, seconds, doing, inRequest(" in ")));
+    say(Verdict::kHung, fmt::format("{}: {} {} s, {}{}", where(), what, seconds, doing, inRequest()));
   }
 
   void noInstance() {
@@ -355,10 +355,10 @@ class Judge {
       contradict(
           fmt::format("{} was handled, and still the status is {}", nameOfSignal(signal), seen.end.status));
     }
-    addRequest(true);
+    addRequest();
     const bool isSent = record.fault.code <= 0;
     const bool isOwn = record.fault.sender == record.process;
-    const std::string what = fmt::format("{}: {}{}", where(), nameOfSignal(signal), inRequest(" in "));
+    const std::string what = fmt::format("{}: {}{}", where(), nameOfSignal(signal), inRequest());
     if (isSent && !isOwn) {
       say(Verdict::kKilled,
           what + (record.fault.sender == 0 ? ", sent by another process"
@@ -384,15 +384,15 @@ class Judge {
   /// Ended by a signal that no handler of the worker's saw.
   void bySignal(int signal) {
     out.signal = signal;
-    addRequest(true);
+    addRequest();
     if (signal == SIGXFSZ) {
       say(Verdict::kKilled, fmt::format("{}: wrote a file of more than {}{}", where(),
-                                        megabytes(limits.filesInBytes), inRequest(" in ")));
+                                        megabytes(limits.filesInBytes), inRequest()));
       return;
     }
     const bool isFault = isFaultSignal(signal);
     say(isFault ? Verdict::kCrashed : Verdict::kKilled,
-        fmt::format("{}: {}{}{}", where(), nameOfSignal(signal), inRequest(" in "),
+        fmt::format("{}: {}{}{}", where(), nameOfSignal(signal), inRequest(),
                     isFault ? ", which reached no handler of the worker's" : ""));
   }
 
@@ -505,7 +505,7 @@ class Judge {
 
   /// Ended by itself, and not at the end of the run, or not so that it can be believed.
   void exited(int status) {
-    addRequest(true);
+    addRequest();
     if (hasRecord && lines.hasLastWords != record.unexpectedExit) {
       contradict(record.unexpectedExit ? "exit() was called, although the lines do not say so"
                                        : "exit() was not called, although the lines say \"unexpected exit\"");
@@ -535,7 +535,7 @@ class Judge {
       return;
     }
     say(Verdict::kExited,
-        fmt::format("{}: ended the process with status {}{}", where(), status, inRequest(" in ")));
+        fmt::format("{}: ended the process with status {}{}", where(), status, inRequest()));
   }
 
   /// A plug-in that gets no memory throws, crashes or gives up, and does not say why.
@@ -560,12 +560,9 @@ class Judge {
     out.cause = cause;
   }
 
-  void addRequest(bool onlyUnderWay) {
+  void addRequest() {
     if (!hasRecord) return;
-    if (record.request.kind != kFlightNoRequest &&
-        (!onlyUnderWay || record.request.state == kFlightUnderWay)) {
-      out.request = requestFrom(record.request);
-    }
+    if (record.request.state == kFlightUnderWay) out.request = requestFrom(record.request);
     if (record.hostRequest.count > 0) {
       HostRequestSeen host;
       host.opcode = record.hostRequest.opcode;
@@ -578,9 +575,9 @@ class Judge {
   }
 
   /// " in effSetBypass (44) value 1", or nothing.
-  [[nodiscard]] std::string inRequest(const char* word) const {
+  [[nodiscard]] std::string inRequest() const {
     if (!out.request || record.request.state != kFlightUnderWay) return "";
-    return word + textOf(record.request);
+    return " in " + textOf(record.request);
   }
 
   void describePlace() {

@@ -116,9 +116,10 @@ class SeenRun {
     record.set64(64, 335);
     return set(72, 1).set(76, kind).set(80, opcode).set(84, 0);
   }
+  /// With index 5 and value 6.
   SeenRun& hostRequest(std::uint32_t opcode, std::uint64_t count) {
-    record.set64(128, count);
-    return set(136, opcode);
+    record.set64(128, count).set64(144, 6);
+    return set(136, opcode).set(140, 5);
   }
   SeenRun& requestReturned() { return set(72, 2); }
   SeenRun& thrown(std::uint32_t kind, std::uint32_t opcode, std::uint32_t step) {
@@ -705,6 +706,8 @@ TEST(Judge, NamesTheLastRequestOfThePluginToItsHost) {
   EXPECT_EQ(request->name, "audioMasterGetProductString");
   EXPECT_EQ(request->opcode, 33);
   EXPECT_EQ(request->count, 2u);
+  EXPECT_EQ(request->index, 5);
+  EXPECT_EQ(request->value, 6);
   EXPECT_EQ(requestAfter(SeenRun::in(6).hostRequest(777, 1))->name, "opcode 777");
   EXPECT_FALSE(requestAfter(SeenRun::in(6).hostRequest(0, 0)));
 }
