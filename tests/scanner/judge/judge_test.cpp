@@ -267,7 +267,7 @@ const Case kEnds[] = {
     {"ABadAddress", SeenRun::in(6).fault(SIGSEGV, 1, 0, 0x123456).lastWords().exits(7), "crashed", 6,
      "effGetTailSize",
      "step 6, inspect latency: SIGSEGV in effGetTailSize (52), in effect.so+0x4f2a, at address 0x123456"},
-    {"ASignalOfAFaultThatThePlugInRaises", SeenRun::in(6).fault(SIGSEGV, -6, 77).lastWords().exits(7),
+    {"ASignalOfAFaultThatThePlugInRaises", SeenRun::in(6).fault(SIGSEGV, 0, 77).lastWords().exits(7),
      "crashed", 6, "effGetTailSize",
      "step 6, inspect latency: SIGSEGV in effGetTailSize (52), in effect.so+0x4f2a"},
     {"ACrashWhileLoading", SeenRun::loading().crashes(), "crashed", 0, "load",
