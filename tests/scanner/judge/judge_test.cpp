@@ -121,6 +121,10 @@ class SeenRun {
     record.set64(128, count).set64(144, 6);
     return set(136, opcode).set(140, 5);
   }
+  SeenRun& arguments(std::uint32_t index, std::uint64_t value, std::uint32_t bitsOfFloat) {
+    record.set64(88, value);
+    return set(84, index).set(96, bitsOfFloat);
+  }
   SeenRun& requestReturned() { return set(72, 2); }
   SeenRun& thrown(std::uint32_t kind, std::uint32_t opcode, std::uint32_t step) {
     return set(72, 3).set(192, 3).set(196, kind).set(200, opcode).set(220, step);
@@ -272,6 +276,10 @@ const Case kEnds[] = {
      "step 6, inspect latency: SIGSEGV in effGetTailSize (52), in effect.so+0x4f2a"},
     {"ACrashWhileLoading", SeenRun::loading().crashes(), "crashed", 0, "load",
      "while it was loaded: SIGSEGV in loading the module, in effect.so+0x4f2a, through a null pointer"},
+    {"AKillSignalWhileAValueIsRead", SeenRun::in(6).request(4, 0).killedBy(SIGKILL), "killed", 6,
+     "getParameter", "step 6, inspect latency: SIGKILL in getParameter 0"},
+    {"AKillSignalWhileAValueIsSet", SeenRun::in(6).request(5, 0).killedBy(SIGKILL), "killed", 6,
+     "setParameter", "step 6, inspect latency: SIGKILL in setParameter 0 to 0"},
     {"ACrashInTheLastClosing", SeenRun::in(65).phase(4).request(3, 1).crashes(), "crashed", 65, "effClose",
      "in the last closing, after step 65, inspect latency: SIGSEGV in effClose (1), in effect.so+0x4f2a, "
      "through a null "
@@ -696,6 +704,17 @@ TEST(Judge, NamesModuleOffsetAndAddressOfACrash) {
   EXPECT_EQ(judgement.place->address, 0x1234u);
   EXPECT_EQ(judgement.signal, SIGSEGV);
   EXPECT_EQ(judgement.status, std::nullopt);
+}
+
+TEST(Judge, GivesTheRequestWithItsArguments) {
+  const SeenRun run = SeenRun::in(6).arguments(7, std::uint64_t{1} << 40, 0x3F000000).killedBy(SIGKILL);
+  const std::optional<RequestSeen> request = judge(run.result(), Limits()).request;
+
+  ASSERT_TRUE(request);
+  EXPECT_EQ(request->opcode, 52);
+  EXPECT_EQ(request->index, 7);
+  EXPECT_EQ(request->value, std::int64_t{1} << 40);
+  EXPECT_EQ(request->opt, 0.5f);
 }
 
 TEST(Judge, NamesTheLastRequestOfThePluginToItsHost) {
