@@ -79,10 +79,11 @@ bool isEmpty(Database& database) { return database.number("SELECT count(*) FROM 
 std::int64_t schemaVersion() { return static_cast<std::int64_t>(kSteps.size()); }
 
 bool hasCurrentSchema(Database& database) {
+  // In this order, since another scan may make the tables meanwhile: who sees them also sees whose they are.
+  const bool wasEmpty = isEmpty(database);
   const std::int64_t version = versionOf(database);
   const bool isOurs = database.number("PRAGMA application_id") == kApplication;
-  if (!isOurs && (version != 0 || !isEmpty(database)))
-    throw NotOurDatabase("is a database of another program");
+  if (!isOurs && (version != 0 || !wasEmpty)) throw NotOurDatabase("is a database of another program");
   if (version > schemaVersion()) {
     throw NotOurDatabase("was made by a newer vsttorture-scan: its tables have version " +
                          std::to_string(version) + ", and this one knows " + std::to_string(schemaVersion()));
