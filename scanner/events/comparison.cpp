@@ -1,8 +1,14 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/events/comparison.h"
 
+#include <algorithm>
+#include <map>
+#include <string>
+
 namespace scanner {
 namespace {
+
+using Change = Comparison::Change;
 
 bool isGood(const PluginResult& result) { return rowOf(result.judgement.verdict).isGood; }
 
@@ -14,21 +20,62 @@ bool isOfARun(Verdict verdict) {
 
 bool saysNothing(Verdict verdict) { return verdict == Verdict::kSkipped || verdict == Verdict::kNotRun; }
 
-Comparison::Change changeBetween(const PluginResult& now, const PluginResult* earlier, bool isUnchanged) {
+/// How many findings of the plug-in there are of each kind.
+std::map<std::string, std::size_t> findingsByKind(const PluginResult& result) {
+  std::map<std::string, std::size_t> counts;
+  for (const Diagnosis::Finding& finding : result.diagnosis->findings) {
+    if (finding.isInPlugin) ++counts[finding.kind];
+  }
+  return counts;
+}
+
+bool isUnderTheSameTool(const PluginResult& now, const PluginResult& earlier) {
+  return now.diagnosis && earlier.diagnosis && now.diagnosis->tool == earlier.diagnosis->tool;
+}
+
+/// Whether there are no more findings of any kind than before. Their texts and frames say less: they change with every
+/// build.
+bool areFindingsKnown(const PluginResult& now, const PluginResult& earlier) {
+  if (!isUnderTheSameTool(now, earlier)) return false;
+  const std::map<std::string, std::size_t> before = findingsByKind(earlier);
+  const std::map<std::string, std::size_t> found = findingsByKind(now);
+  return std::all_of(found.begin(), found.end(), [&before](const auto& kindAndCount) {
+    const auto then = before.find(kindAndCount.first);
+    return then != before.end() && then->second >= kindAndCount.second;
+  });
+}
+
+/// Of a plug-in whose verdict is good, and was.
+Change changeOfFindings(const PluginResult& now, const PluginResult& earlier, bool isUnchanged) {
+  if (failsByFindings(now)) {
+    if (areFindingsKnown(now, earlier)) return Change::kStillFailing;
+    return isUnchanged && isUnderTheSameTool(now, earlier) ? Change::kFlaky : Change::kNew;
+  }
+  const bool hasLooked = isUnderTheSameTool(now, earlier) && now.diagnosis->problem.empty();
+  if (!hasLooked || now.hasFindings() || !earlier.hasFindings()) return Change::kNone;
+  return isUnchanged ? Change::kFlaky : Change::kMended;
+}
+
+Change changeBetween(const PluginResult& now, const PluginResult* earlier, bool isUnchanged) {
   const Verdict verdict = now.judgement.verdict;
-  if (verdict == Verdict::kSkipped) return Comparison::Change::kNone;
-  if (now.repetitions && now.repetitions->isFlaky()) return Comparison::Change::kFlaky;
-  const bool fails = !isGood(now) && !now.isWanted;
-  if (earlier == nullptr) return fails ? Comparison::Change::kNew : Comparison::Change::kNone;
+  if (saysNothing(verdict)) return Change::kNone;
+  if (now.isFlaky()) return Change::kFlaky;
+  const bool fails = failsByFindings(now) || (!isGood(now) && !now.isWanted);
+  if (earlier == nullptr) return fails ? Change::kNew : Change::kNone;
 
   const Verdict before = earlier->judgement.verdict;
   const bool isSame = verdict == before;
-  if (isUnchanged && !isSame && isOfARun(verdict) && isOfARun(before)) return Comparison::Change::kFlaky;
-  if (fails) return isSame ? Comparison::Change::kStillFailing : Comparison::Change::kNew;
-  return isGood(now) && !isGood(*earlier) ? Comparison::Change::kMended : Comparison::Change::kNone;
+  if (isUnchanged && !isSame && isOfARun(verdict) && isOfARun(before)) return Change::kFlaky;
+  if (isGood(now) && isGood(*earlier)) return changeOfFindings(now, *earlier, isUnchanged);
+  if (fails) return isSame ? Change::kStillFailing : Change::kNew;
+  return isGood(now) ? Change::kMended : Change::kNone;
 }
 
 }  // namespace
+
+bool failsByFindings(const PluginResult& result) {
+  return isGood(result) && result.hasFindings() && !result.isWanted && !result.expected;
+}
 
 Comparison compare(const PluginResult& now, const PluginResult* earlier, bool isUnchanged) {
   if (earlier != nullptr && saysNothing(earlier->judgement.verdict)) earlier = nullptr;

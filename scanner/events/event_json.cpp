@@ -13,9 +13,9 @@ namespace {
 
 using Json = nlohmann::ordered_json;
 
-std::string line(const Json& event) {
-  return event.dump(-1, ' ', false, Json::error_handler_t::replace) + "\n";
-}
+std::string dumped(const Json& value) { return value.dump(-1, ' ', false, Json::error_handler_t::replace); }
+
+std::string line(const Json& event) { return dumped(event) + "\n"; }
 
 /// The text as UTF-8; dump() replaces what is not.
 Json text(const std::string& bytes) { return bytes; }
@@ -201,6 +201,22 @@ Json shrunkJson(const std::optional<Shrunk>& shrunk) {
           {"problem", shrunk->problem.empty() ? Json(nullptr) : text(shrunk->problem)}};
 }
 
+/// A remembered event with what is of this scan.
+std::string recordedLine(const PluginResult& result) {
+  const Json today = {
+      {"otherNames", texts(result.otherNames)},    {"isWanted", result.isWanted},
+      {"expected", expectedJson(result.expected)}, {"command", texts(result.command)},
+      {"isRemembered", result.isRemembered},       {"comparison", comparisonJson(result.comparison)}};
+  std::string line;
+  for (const auto& [name, value] : *result.recorded) {
+    const auto changed = today.find(name);
+    line += line.empty() ? "{\"" : ",\"";
+    line += name + "\":";
+    line += changed == today.end() ? value : dumped(*changed);
+  }
+  return line + "}\n";
+}
+
 }  // namespace
 
 double Repetitions::flakeRate() const {
@@ -248,6 +264,7 @@ std::string eventLine(const Run& runStarted) {
 }
 
 std::string eventLine(const PluginResult& result) {
+  if (result.recorded) return recordedLine(result);
   const Judgement& judgement = result.judgement;
   Json event = {
       {"event", "plugin_ended"},
@@ -298,7 +315,12 @@ std::string eventLine(const ScanEnded& ended) {
                {"status", ended.status}});
 }
 
+std::string pluginText(const Run& run) { return dumped(pluginJson(run)); }
+
 std::string validUtf8(std::string_view bytes) {
+  const bool isAscii =
+      std::all_of(bytes.begin(), bytes.end(), [](char c) { return static_cast<unsigned char>(c) < 0x80; });
+  if (isAscii) return std::string(bytes);
   const std::string quoted =
       nlohmann::json(std::string(bytes)).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
   return nlohmann::json::parse(quoted).get<std::string>();

@@ -23,6 +23,9 @@ std::string eventLine(const Run& runStarted);
 std::string eventLine(const PluginResult& result);
 std::string eventLine(const ScanEnded& ended);
 
+/// The value of the member "plugin" of an event.
+std::string pluginText(const Run& run);
+
 /// `bytes` with U+FFFD for each byte that is not part of valid UTF-8.
 std::string validUtf8(std::string_view bytes);
 

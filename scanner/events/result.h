@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "scanner/engine/run_seen.h"
+#include "scanner/events/event_members.h"
 #include "scanner/judge/judge.h"
 #include "scanner/plan/run_list.h"
 
@@ -38,10 +39,10 @@ struct Expectation {
 /// How a result compares with an earlier one of the same plug-in: the last scan's, or the baseline's.
 struct Comparison {
   enum class Change {
-    kNone,          ///< Good before and now, or not known before and good.
-    kNew,           ///< Fails, and did not before, or in another way (with another verdict).
-    kMended,        ///< Failed before, and is good now.
-    kStillFailing,  ///< Fails with the verdict that it had before.
+    kNone,    ///< Good before and now, or not known before and good.
+    kNew,     ///< Fails, and did not before, or in another way: with another verdict, or with more findings.
+    kMended,  ///< Failed before, and is good now.
+    kStillFailing,  ///< Fails with the verdict that it had before, or with no more findings.
     kFlaky,         ///< Ended differently although nothing that matters has changed, or is flaky in itself.
   };
   /// What the plug-in ended with before.
@@ -102,6 +103,16 @@ struct PluginResult {
   std::optional<Comparison> comparison = {};    ///< Where there is something to compare with.
   std::optional<Diagnosis> diagnosis = {};      ///< With --under.
   std::optional<Shrunk> shrunk = {};            ///< With --shrink, for a run that failed.
+  /// Of a remembered result that is only written again: its event as it was. Then of the members above those are set
+  /// that differ from scan to scan, and the verdict.
+  std::optional<EventMembers> recorded = {};
+
+  /// Whether its repetitions did not all end in the same way.
+  [[nodiscard]] bool isFlaky() const { return repetitions && repetitions->isFlaky(); }
+  /// Whether a tool has found something that the plug-in has a part in.
+  [[nodiscard]] bool hasFindings() const { return diagnosis && diagnosis->hasFindings(); }
+  /// Whether it was expected to end otherwise.
+  [[nodiscard]] bool isUnexpected() const { return expected && !expected->isMet; }
 };
 
 struct ScanStarted {

@@ -12,6 +12,7 @@
 #include "scanner/report/html_details.h"
 #include "scanner/report/html_template.h"
 #include "scanner/report/html_text.h"
+#include "scanner/report/words.h"
 
 namespace scanner {
 namespace {
@@ -27,21 +28,9 @@ using Change = Comparison::Change;
 const char* wordOf(const PluginResult& result) { return rowOf(result.judgement.verdict).word; }
 
 /// "new" and the like for the column; empty for no change worth a word.
-std::string changeInWords(const PluginResult& result) {
-  if (isFlaky(result)) return "flaky";
-  if (!result.comparison) return {};
-  switch (result.comparison->change) {
-    case Change::kNew:
-      return "new";
-    case Change::kMended:
-      return "mended";
-    case Change::kStillFailing:
-      return "still failing";
-    case Change::kNone:
-    case Change::kFlaky:
-      break;
-  }
-  return {};
+std::string changeOf(const PluginResult& result) {
+  if (endsDifferently(result)) return changeWord(Change::kFlaky);
+  return result.comparison ? changeWord(result.comparison->change) : "";
 }
 
 /// How much a result asks to be looked at: the class of its row.
@@ -89,7 +78,7 @@ std::vector<const PluginResult*> sorted(const std::vector<PluginResult>& results
   keys.reserve(results.size());
   for (const PluginResult& one : results) {
     const std::int64_t child = one.run.child ? std::int64_t{*one.run.child} : INT64_MIN;
-    keys.emplace_back(one.isWanted, rankOfChange(changeInWords(one)), rankOfVerdict(one.judgement.verdict),
+    keys.emplace_back(one.isWanted, rankOfChange(changeOf(one)), rankOfVerdict(one.judgement.verdict),
                       one.run.bundle, child, &one);
   }
   std::sort(keys.begin(), keys.end());
@@ -155,16 +144,18 @@ void appendRow(std::string& out, const PluginResult& result, const std::string& 
     name += "</span>";
   }
   const char* word = wordOf(result);
-  const bool isAsExpected =
-      result.expected && result.expected->isMet && !rowOf(result.judgement.verdict).isGood;
-  const std::string change = changeInWords(result);
-  const bool hasStep = !rowOf(result.judgement.verdict).isGood && result.judgement.step > 0;
+  const bool isGood = rowOf(result.judgement.verdict).isGood;
+  const bool isAsExpected = result.expected && result.expected->isMet && !isGood;
+  const std::string change = changeOf(result);
+  const bool hasStep = !isGood && result.judgement.step > 0;
   out += fmt::format("<tbody role=\"rowgroup\" id=\"{}\" class=\"{}{}\">", anchor, toneOf(result),
                      result.isWanted ? "" : " unwanted");
   out += fmt::format("<tr role=\"row\" class=\"row\"><td role=\"cell\"><b class=\"tag\">{}</b>{}</td>", word,
                      isAsExpected ? " <small>as expected</small>" : "");
   out += fmt::format("<td role=\"cell\">{} <small>{}</small></td>", name, cellText(path.folder));
-  out += fmt::format("<td role=\"cell\">{}</td>", cellText(result.judgement.cause));
+  // A good verdict has no cause; that it counts as a failure all the same has a reason.
+  const std::string cause = isGood && !result.isWanted ? whyNotWanted(result) : result.judgement.cause;
+  out += fmt::format("<td role=\"cell\">{}</td>", cellText(cause));
   out += fmt::format("<td role=\"cell\">{}</td>", hasStep ? std::to_string(result.judgement.step) : "");
   if (result.seen) {
     out += fmt::format("<td role=\"cell\" data-seconds=\"{:.6f}\">{}</td>", result.seen->wallSeconds,
@@ -195,7 +186,7 @@ class Page {
   explicit Page(const ScanReport& report_) : report(report_) {
     for (const PluginResult& result : report.results) {
       ++counts[result.judgement.verdict];
-      ++changes[changeInWords(result)];
+      ++changes[changeOf(result)];
       if (result.isWanted) continue;
       ++unwanted;
       unwantedOf.insert(result.judgement.verdict);
@@ -208,7 +199,9 @@ class Page {
     if (total == 0) return "No plug-in was tried";
     if (total == 1)
       return unwanted == 0 ? "The plug-in ended as it should" : "The plug-in did not end as it should";
-    if (unwanted == 0) return fmt::format("All {} plug-ins ended as they should", total);
+    if (unwanted == 0)
+      return fmt::format("{} {} plug-ins ended as they should",
+                         incompleteness(report).empty() ? "All" : "The", total);
     return fmt::format("{} of {} did not end as {} should", unwanted, countInWords(total, "plug-in"),
                        unwanted == 1 ? "it" : "they");
   }
@@ -253,6 +246,8 @@ class Page {
     } else if (report.ended->isInterrupted) {
       add(fmt::format("The scan was interrupted: it was to try {}, and there are results of {}.",
                       countInWords(report.started.plugins, "plug-in"), total));
+    } else if (const std::string missing = incompleteness(report); !missing.empty()) {
+      add(missing);
     }
     for (const std::string& note : report.started.notes) add(note);
     return items.empty() ? "" : "<ul class=\"warnings\">\n" + items + "</ul>\n";

@@ -11,6 +11,7 @@
 #include "scanner/report/html_text.h"
 #include "scanner/report/step_bar.h"
 #include "scanner/report/terminal.h"
+#include "scanner/report/words.h"
 
 namespace scanner {
 namespace {
@@ -222,42 +223,42 @@ class Details {
   }
 
   void addRepetitions(const Repetitions& repetitions) {
-    std::string ends;
-    for (const auto& [end, count] : repetitions.verdicts)
-      ends += fmt::format("{}{} of {} {}", ends.empty() ? "" : ", ", count, repetitions.runs, end);
+    std::string ends = endsInWords(repetitions);
     if (repetitions.isFlaky())
       ends += fmt::format("; {:.0f} % of the runs failed", 100 * repetitions.flakeRate());
     fact("Repetitions", escaped(ends));
   }
 
   void addComparison(const Comparison& comparison) {
-    std::string words;
-    switch (comparison.change) {
-      case Comparison::Change::kNone:
-        words = "nothing has changed";
-        break;
-      case Comparison::Change::kNew:
-        words = "new: it did not fail in this way before";
-        break;
-      case Comparison::Change::kMended:
-        words = "mended: it failed before";
-        break;
-      case Comparison::Change::kStillFailing:
-        words = "still failing, with the verdict that it had before";
-        break;
-      case Comparison::Change::kFlaky:
-        words = "flaky: it does not always end the same way";
-        break;
-    }
+    std::string words = changeSentence(comparison.change);
     if (comparison.earlier) {
       const Comparison::Earlier& earlier = *comparison.earlier;
       words += fmt::format("; earlier: {}", verdictInWords(earlier.verdict, earlier.step));
       const std::string time = timeInWords(earlier.time);
       if (!time.empty()) words += ", " + time;
+    } else if (comparison.change == Comparison::Change::kNone) {
+      words = "seen for the first time";
     } else {
       words += "; seen for the first time";
     }
     fact("Compared", escaped(words));
+  }
+
+  [[nodiscard]] std::string changeSentence(Comparison::Change change) const {
+    switch (change) {
+      case Comparison::Change::kNone:
+        return "nothing has changed";
+      case Comparison::Change::kNew:
+        return "new: it did not fail in this way before";
+      case Comparison::Change::kMended:
+        return "mended: it did not end as it should before";
+      case Comparison::Change::kStillFailing:
+        return row.isGood ? "still failing, with no more findings than before"
+                          : "still failing, with the verdict that it had before";
+      case Comparison::Change::kFlaky:
+        return "flaky: it does not always end the same way";
+    }
+    return {};
   }
 
   void addCircumstances() {
@@ -476,9 +477,8 @@ class Details {
 
 std::string htmlDetails(const PluginResult& result) { return Details(result).html(); }
 
-bool isFlaky(const PluginResult& result) {
-  return (result.repetitions && result.repetitions->isFlaky()) ||
-         (result.comparison && result.comparison->change == Comparison::Change::kFlaky);
+bool endsDifferently(const PluginResult& result) {
+  return result.isFlaky() || (result.comparison && result.comparison->change == Comparison::Change::kFlaky);
 }
 
 }  // namespace scanner

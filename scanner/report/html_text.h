@@ -26,14 +26,8 @@ std::string isolated(std::string_view bytes);
 /// The first `most` characters, followed by an ellipsis where there are more. `text` is UTF-8.
 std::string clipped(std::string_view text, std::size_t most);
 
-/// "640 ns", "38 ms", "1.2 s", "2 min 5 s", "1 h 2 min"; "0 s" for what is not above 0.
-std::string durationInWords(double seconds);
-
 /// "322 bytes", "15.2 MiB".
 std::string sizeInWords(std::uint64_t bytes);
-
-/// "1 file", "2 files".
-std::string countInWords(std::uint64_t count, std::string_view thing);
 
 /// "2026-11-21 22:50:22 UTC", or with a "T" between and "Z" behind for the attribute datetime. Empty for a time
 /// that no calendar has.

@@ -13,7 +13,9 @@
 
 #include "scanner/events/baseline.h"
 #include "scanner/events/event_json.h"
+#include "scanner/report/characters.h"
 #include "scanner/report/terminal.h"
+#include "scanner/report/words.h"
 
 namespace scanner {
 namespace {
@@ -78,36 +80,6 @@ std::string folderOf(const std::string& bundle) {
   return slash == 0 ? "/" : bundle.substr(0, slash);
 }
 
-/// "crashed at 5"
-std::string endInWords(const std::string& verdict, const std::optional<int>& step) {
-  return step ? fmt::format("{} at {}", verdict, *step) : verdict;
-}
-
-std::string flakinessInWords(const Repetitions& repetitions) {
-  std::string ends;
-  for (const auto& [end, count] : repetitions.verdicts)
-    ends += fmt::format("{}{} of {} {}", ends.empty() ? "" : ", ", count, repetitions.runs, end);
-  return "flaky: " + ends;
-}
-
-std::string expectationInWords(const Expectation& expected) {
-  return fmt::format("expected: {}{}", endInWords(expected.verdict, expected.step),
-                     expected.reason.empty() ? "" : " (" + expected.reason + ")");
-}
-
-std::string changeInWords(const Comparison& comparison) {
-  using Change = Comparison::Change;
-  std::string change;
-  if (comparison.change == Change::kNew) change = "new";
-  if (comparison.change == Change::kMended) change = "mended";
-  if (comparison.change == Change::kStillFailing) change = "still failing";
-  if (comparison.change == Change::kFlaky) change = "flaky";
-  if (change.empty()) return "";
-  if (!comparison.earlier) return change + ": seen for the first time";
-  return fmt::format("{}: before it was {}", change,
-                     endInWords(comparison.earlier->verdict, comparison.earlier->step));
-}
-
 std::string requestInWords(const RequestSeen& request) {
   if (request.kind == "load") return "loading the module";
   if (request.kind == "entry") return "the entry point";
@@ -117,33 +89,10 @@ std::string requestInWords(const RequestSeen& request) {
                      request.value, request.opt);
 }
 
-bool isFlaky(const PluginResult& result) { return result.repetitions && result.repetitions->isFlaky(); }
-
-bool isUnmet(const PluginResult& result) { return result.expected && !result.expected->isMet; }
-
-/// "2 findings of memcheck: Invalid read of size 4"
-std::string findingsInWords(const Diagnosis& diagnosis) {
-  const auto isInPlugin = [](const Diagnosis::Finding& finding) { return finding.isInPlugin; };
-  const auto& all = diagnosis.findings;
-  const auto count = std::count_if(all.begin(), all.end(), isInPlugin);
-  return fmt::format("{} {} of {}: {}", count, count == 1 ? "finding" : "findings", diagnosis.tool,
-                     std::find_if(all.begin(), all.end(), isInPlugin)->text);
-}
-
 /// One line: why it failed.
 std::string messageOf(const PluginResult& result) {
-  std::vector<std::string> parts;
-  if (isFlaky(result)) parts.push_back(flakinessInWords(*result.repetitions));
-  if (isUnmet(result))
-    parts.push_back(fmt::format(
-        "{}, but {}", expectationInWords(*result.expected),
-        endInWords(rowOf(result.judgement.verdict).word,
-                   result.judgement.step > 0 ? std::optional(result.judgement.step) : std::nullopt)));
-  if (!result.judgement.cause.empty()) parts.push_back(result.judgement.cause);
-  if (rowOf(result.judgement.verdict).isGood && result.diagnosis && result.diagnosis->hasFindings())
-    parts.push_back(findingsInWords(*result.diagnosis));
-  if (parts.empty()) parts.emplace_back(rowOf(result.judgement.verdict).meaning);
-  return printable(fmt::format("{}", fmt::join(parts, "; ")));
+  const std::string reason = whyNotWanted(result);
+  return printable(reason.empty() ? rowOf(result.judgement.verdict).meaning : reason);
 }
 
 /// Everything that is known of the failure, a line each.
@@ -166,9 +115,9 @@ std::string detailsOf(const PluginResult& result) {
     add("place", fmt::format("{}{:#x}, address {:#x}",
                              judgement.place->module.empty() ? "" : judgement.place->module + "+",
                              judgement.place->offset, judgement.place->address));
-  if (isUnmet(result)) add("expected", endInWords(result.expected->verdict, result.expected->step));
-  if (isFlaky(result)) text += printable(flakinessInWords(*result.repetitions)) + "\n";
-  if (result.comparison) add("compared", changeInWords(*result.comparison));
+  if (result.isUnexpected()) add("expected", endInWords(result.expected->verdict, result.expected->step));
+  if (result.isFlaky()) add("flaky", endsInWords(*result.repetitions));
+  add("compared", changeInWords(result));
   for (const std::string& one : judgement.contradictions) add("note", one);
   if (result.diagnosis) {
     add(result.diagnosis->tool, result.diagnosis->problem);
@@ -215,13 +164,11 @@ std::string systemOut(const PluginResult& result) {
             "\n";
     if (isExpected && !result.expected->reason.empty())
       text += "reason: " + printable(result.expected->reason) + "\n";
-  } else if (result.isWanted && (isUnmet(result) || isFlaky(result))) {
+  } else if (result.isWanted && (result.isUnexpected() || result.isFlaky())) {
     text += printable("not new: " + messageOf(result)) + "\n";
   }
-  if (result.comparison && result.isWanted) {
-    const std::string change = changeInWords(*result.comparison);
-    if (!change.empty()) text += change + "\n";
-  }
+  if (const std::string change = changeInWords(result); result.isWanted && !change.empty())
+    text += printable(change) + "\n";
   if (result.isRemembered) text += "remembered from an earlier scan\n";
   if (!result.seen) return text;
 
@@ -261,15 +208,6 @@ void addResult(pugi::xml_node suite, const PluginResult& result, bool namesProce
   if (const std::string text = systemOut(result); !text.empty()) addText(test, "system-out", text);
 }
 
-/// Why not every result is there; empty where all are, as far as the report says.
-std::string incompleteness(const ScanReport& report) {
-  if (!report.ended) return "the scan was killed, or its results could not be written: results are missing";
-  if (report.ended->isInterrupted) return "the scan was interrupted: results are missing";
-  if (report.ended->status == 1 && report.ended->unwanted == 0)
-    return "the scan is not whole: a plug-in that was expected, or a part of the scan, is missing";
-  return "";
-}
-
 void addProperties(pugi::xml_node suite, const ScanStarted& started) {
   pugi::xml_node properties = suite.append_child("properties");
   const auto add = [&properties](const char* name, const std::string& value) {
@@ -297,19 +235,19 @@ std::string xmlText(std::string_view text) {
   const std::string valid = validUtf8(text);
   std::string out;
   out.reserve(valid.size());
-  for (std::size_t at = 0; at < valid.size(); ++at) {
-    const auto byte = static_cast<unsigned char>(valid[at]);
-    if (byte == '\r') {
-      if (at + 1 == valid.size() || valid[at + 1] != '\n') out += '\n';
-    } else if ((byte < 0x20 && byte != '\n' && byte != '\t') || byte == 0x7F) {
-      out += fmt::format("\\x{:02x}", byte);
-    } else if (byte == 0xC2 && at + 1 < valid.size() && static_cast<unsigned char>(valid[at + 1]) < 0xA0) {
-      out += fmt::format("\\x{:02x}", static_cast<unsigned char>(valid[++at]));  // U+0080 to U+009F
-    } else if (valid.compare(at, 3, "\xEF\xBF\xBE") == 0 || valid.compare(at, 3, "\xEF\xBF\xBF") == 0) {
+  for (std::size_t at = 0; at < valid.size();) {
+    const std::size_t begin = at;
+    const char32_t character = nextCharacter(valid, at);
+    if (character == '\r') {
+      if (at == valid.size() || valid[at] != '\n') out += '\n';
+    } else if (isControl(character) && character != '\n' && character != '\t') {
+      out += fmt::format("\\x{:02x}", static_cast<unsigned>(character));
+    } else if (character == 0xFFFE || character == 0xFFFF) {
       out += "\xEF\xBF\xBD";
-      at += 2;
+    } else if (isInvisible(character)) {
+      out += codeOf(character);
     } else {
-      out += valid[at];
+      out.append(valid, begin, at - begin);
     }
   }
   return out;

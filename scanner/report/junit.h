@@ -24,7 +24,8 @@ namespace scanner {
 std::string junitReport(const ScanReport& report);
 
 /// `text` without what XML 1.0 cannot hold: a byte that is no UTF-8 becomes U+FFFD, as do U+FFFE and U+FFFF; other
-/// control characters than tabs and newlines become the like of "\x1b"; carriage returns become newlines.
+/// control characters than tabs and newlines become the like of "\x1b"; carriage returns become newlines. What cannot be
+/// seen becomes "[U+202E]" and the like, so that no name looks like another.
 std::string xmlText(std::string_view text);
 
 }  // namespace scanner

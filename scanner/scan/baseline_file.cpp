@@ -39,12 +39,14 @@ void BaselineInUse::begin(const std::vector<Module>& modules, ScanStarted& start
   if (!baseline) return;
   places = started.places;
   shard = started.shard;
+  std::vector<Run> runs;
   for (const Module& module : modules) {
-    Run run;
+    Run& run = runs.emplace_back();
     run.bundle = module.bundle;
     run.target = module.target;
     found.push_back(keyOf(run));
   }
+  baseline->locate(runs);
   std::vector<Run> gone = baseline->gone(found, places, shard);
   gone.erase(std::remove_if(gone.begin(), gone.end(), [](const Run& run) { return run.child.has_value(); }),
              gone.end());

@@ -1,17 +1,22 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/scan/history_command.h"
 
+#include <cerrno>
 #include <cstdio>
+#include <cstring>
 #include <ctime>
 #include <filesystem>
 
 #include <CLI/CLI.hpp>
 #include <fmt/format.h>
+#include <unistd.h>
 
 #include "scanner/judge/verdict.h"
 #include "scanner/report/terminal.h"
+#include "scanner/report/words.h"
 #include "scanner/scan/options.h"
 #include "scanner/scan/remembering.h"
+#include "scanner/scan/text_output.h"
 #include "scanner/store/history.h"
 #include "scanner/store/open_database.h"
 #include "scanner/store/schema.h"
@@ -21,8 +26,8 @@ namespace {
 
 constexpr std::size_t kScansShown = 20;
 
-int complain(const std::string& sentence, ScanStatus status) {
-  std::fprintf(stderr, "vsttorture-scan: %s\n", printable(sentence).c_str());
+int endWith(ScanStatus status, const std::string& sentence) {
+  complain(sentence);
   return status;
 }
 
@@ -47,24 +52,29 @@ std::string countsInWords(const std::map<std::string, std::size_t>& counts) {
 
 /// "; 1 new, 2 mended", or nothing.
 std::string changesInWords(const std::map<std::string, std::size_t>& changes) {
+  using Change = Comparison::Change;
   std::string text;
-  for (const auto& [word, name] :
-       {std::pair("new", "new"), std::pair("mended", "mended"), std::pair("still_failing", "still failing"),
-        std::pair("flaky", "flaky")}) {
-    const auto found = changes.find(word);
+  for (const Change change : {Change::kNew, Change::kMended, Change::kStillFailing, Change::kFlaky}) {
+    const auto found = changes.find(nameOfChange(change));
     if (found != changes.end())
-      text += fmt::format("{}{} {}", text.empty() ? "; " : ", ", found->second, name);
+      text += fmt::format("{}{} {}", text.empty() ? "; " : ", ", found->second, changeWord(change));
   }
   return text;
 }
 
-void print(const std::string& line) { std::printf("%s\n", printable(line).c_str()); }
+/// A line, broken where the terminal ends; what follows is indented by `indent`.
+void print(const std::string& line, std::size_t indent) {
+  const std::string text = printable(line);
+  const bool isTerminal = isatty(STDOUT_FILENO) != 0;
+  std::printf("%s\n", isTerminal ? wrapped(text, textColumns(STDOUT_FILENO), indent).c_str() : text.c_str());
+}
 
 void printScans(const std::vector<EarlierScan>& scans) {
   for (const EarlierScan& scan : scans) {
     const char* end = !scan.hasEnded ? "; did not end" : scan.isInterrupted ? "; interrupted" : "";
     print(fmt::format("{}  {}  {}  {}{}{}", timeInWords(scan.time), scan.machine, scan.toolVersion,
-                      countsInWords(scan.counts), changesInWords(scan.changes), end));
+                      countsInWords(scan.counts), changesInWords(scan.changes), end),
+          2);
   }
 }
 
@@ -76,11 +86,12 @@ void printResults(const std::vector<EarlierResult>& results) {
     if (!result.processor.empty()) name += " (" + result.processor + ")";
     const std::string key = fmt::format("{}\n{}\n{}", result.bundle, result.processor,
                                         result.child ? std::to_string(*result.child) : "");
-    if (key != last) print(name);
+    if (key != last) print(name, 2);
     last = key;
-    print(fmt::format("  {}  {:<12} {:>8.1f} s  {}{}{}", timeInWords(result.time), result.verdict,
-                      result.wallSeconds, result.toolVersion, result.isFlaky ? "  flaky" : "",
-                      result.cause.empty() ? "" : "  " + result.cause));
+    print(fmt::format("  {}  {:<12} {:>9}  {}{}{}", timeInWords(result.time), result.verdict,
+                      durationInWords(result.wallSeconds), result.toolVersion,
+                      result.isFlaky ? "  flaky" : "", result.cause.empty() ? "" : "  " + result.cause),
+          4);
   }
 }
 
@@ -97,16 +108,22 @@ int show(const std::string& file, const std::string& plugin) {
   History history(file);
   if (plugin.empty()) {
     const std::vector<EarlierScan> scans = history.lastScans(kScansShown);
-    if (scans.empty()) return complain(file + " holds no scan yet", kScanWrongUse);
+    if (scans.empty()) return endWith(kScanWrongUse, file + " holds no scan yet");
     printScans(scans);
     return kScanAsWanted;
   }
   const std::vector<EarlierResult> results = history.resultsOf(nameToLookFor(plugin));
   if (results.empty())
-    return complain(fmt::format("no result of a plug-in called \"{}\" is remembered in {}", plugin, file),
-                    kScanWrongUse);
+    return endWith(kScanWrongUse,
+                   fmt::format("no result of a plug-in called \"{}\" is remembered in {}", plugin, file));
   printResults(results);
   return kScanAsWanted;
+}
+
+/// The status, unless standard output could not take all of it.
+int afterPrinting(int status) {
+  if (std::fflush(stdout) == 0 && std::ferror(stdout) == 0) return status;
+  return endWith(kScanCannotGoOn, std::string("standard output: ") + std::strerror(errno));
 }
 
 }  // namespace
@@ -121,28 +138,19 @@ int historyCommand(int argc, const char* const* argv) {
   app.add_option("PLUG-IN", plugin, "A path, or a part of one");
   app.add_option("--cache", cache, "The database, instead of the one in the user's cache folder")
       ->type_name("FILE");
-  try {
-    app.parse(argc - 1, argv + 1);
-  } catch (const CLI::ParseError& error) {
-    if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) {
-      app.exit(error);
-      return kScanAsWanted;
-    }
-    complain(error.what(), kScanWrongUse);
-    std::fprintf(stderr, "vsttorture-scan history --help says what there is.\n");
-    return kScanWrongUse;
-  }
+  int status = kScanAsWanted;
+  if (!parseCommandLine(app, argc - 1, argv + 1, status)) return status;
   const std::string file = databaseFile(cache);
   if (file.empty())
-    return complain("there is no database: neither XDG_CACHE_HOME nor HOME is set, or it is off",
-                    kScanWrongUse);
-  if (!isThere(file, false)) return complain("nothing is remembered yet: there is no " + file, kScanWrongUse);
+    return endWith(kScanWrongUse,
+                   "there is no database: neither XDG_CACHE_HOME nor HOME is set, or it is off");
+  if (!isThere(file, false)) return endWith(kScanWrongUse, "nothing is remembered yet: there is no " + file);
   try {
-    return show(file, plugin);
+    return afterPrinting(show(file, plugin));
   } catch (const NotOurDatabase& error) {
-    return complain(file + " " + error.what(), kScanCannotGoOn);
+    return endWith(kScanCannotGoOn, file + " " + error.what());
   } catch (const DatabaseError& error) {
-    return complain(file + " cannot be read: " + reasonInWords(error), kScanCannotGoOn);
+    return endWith(kScanCannotGoOn, file + " cannot be read: " + reasonInWords(error));
   }
 }
 

@@ -12,6 +12,7 @@
 #include "scanner/events/baseline.h"
 #include "scanner/events/comparison.h"
 #include "scanner/events/event_json.h"
+#include "scanner/events/event_members.h"
 #include "scanner/events/event_reader.h"
 #include "scanner/scan/workers.h"
 
@@ -62,11 +63,6 @@ std::string optionsThatMatter(const ScanOptions& options) {
     text += variable("VALGRIND_OPTS");
   }
   return text + variable("LD_LIBRARY_PATH") + variable("LD_PRELOAD");
-}
-
-/// A report that shows more of a good result than its verdict.
-bool needsWholeResults(const ScanOptions& options) {
-  return !options.jsonFile.empty() || options.reports.areWanted() || options.explain.tool.has_value();
 }
 
 }  // namespace
@@ -135,18 +131,34 @@ void Remembering::recall(const Run& run, const PluginList& skipped, Recollection
   recollection.unknown.push_back({run, results.empty() ? 0 : results.front().wallSeconds});
 }
 
+bool Remembering::fillFromEvent(PluginResult& result, const Known& known, bool isRead) {
+  const std::optional<std::string> line = store->eventOf(known.answer.id);
+  if (!line) return false;
+  // The database may have been set aside meanwhile: the same number is another result's in the new one.
+  if (isRead) {
+    std::optional<Event> event = readEvent(*line);
+    auto* whole = event ? std::get_if<PluginResult>(&*event) : nullptr;
+    const bool isOf = whole != nullptr && keyOf(whole->run) == keyOf(known.run);
+    if (!isOf || whole->judgement.verdict != known.answer.verdict) return false;
+    result = std::move(*whole);
+    return true;
+  }
+  result.recorded = eventMembers(*line);
+  const auto has = [&result](const char* name, const std::string& value) {
+    const EventMembers::value_type member(name, value);
+    return std::find(result.recorded->begin(), result.recorded->end(), member) != result.recorded->end();
+  };
+  return result.recorded && has("plugin", pluginText(known.run)) &&
+         has("verdict", fmt::format("\"{}\"", rowOf(known.answer.verdict).word));
+}
+
 std::optional<PluginResult> Remembering::resultOf(const Known& known) {
   const Remembered& answer = known.answer;
   PluginResult result = resultInShort(answer);
-  if (needsWholeResults(options) || !rowOf(answer.verdict).isGood || answer.isFlaky) {
-    const std::optional<std::string> line = store->eventOf(answer.id);
-    std::optional<Event> event = line ? readEvent(*line) : std::nullopt;
-    auto* whole = event ? std::get_if<PluginResult>(&*event) : nullptr;
-    // The database may have been set aside meanwhile: the same number is another result's in the new one.
-    const bool isOf = whole != nullptr && keyOf(whole->run) == keyOf(known.run);
-    if (!isOf || whole->judgement.verdict != answer.verdict) return std::nullopt;
-    result = std::move(*whole);
-  }
+  // On the terminal no more is shown of a good result than its verdict, and its event can be written unread.
+  const bool isRead =
+      options.reports.areWanted() || options.explain.tool || !rowOf(answer.verdict).isGood || answer.isFlaky;
+  if ((isRead || !options.jsonFile.empty()) && !fillFromEvent(result, known, isRead)) return std::nullopt;
   result.run = known.run;
   result.otherNames.clear();
   result.expected.reset();
@@ -166,13 +178,25 @@ void Remembering::compareWithLast(PluginResult& result) {
     if (earlier.empty()) {
       result.comparison = compare(result, nullptr, false);
     } else {
-      const PluginResult last = resultInShort(earlier.front());
+      PluginResult last = resultInShort(earlier.front());
+      if (result.diagnosis) last.diagnosis = lastDiagnosis(earlier, result.diagnosis->tool);
       const bool isUnchanged = whyVoid(earlier.front(), circumstancesOf(result.run)) == Void::kNot;
       result.comparison = compare(result, &last, isUnchanged);
     }
   }
   if (result.comparison && result.comparison->change != Comparison::Change::kNone)
     ++changes[nameOfChange(result.comparison->change)];
+}
+
+std::optional<Diagnosis> Remembering::lastDiagnosis(const std::vector<Remembered>& earlier,
+                                                    const std::string& tool) {
+  for (const Remembered& one : earlier) {
+    const std::optional<std::string> line = store->eventOf(one.id);
+    const std::optional<Event> event = line ? readEvent(*line) : std::nullopt;
+    const auto* whole = event ? std::get_if<PluginResult>(&*event) : nullptr;
+    if (whole != nullptr && whole->diagnosis && whole->diagnosis->tool == tool) return whole->diagnosis;
+  }
+  return std::nullopt;
 }
 
 void Remembering::begin(const ScanStarted& scan) {

@@ -60,6 +60,11 @@ class Remembering {
 
  private:
   [[nodiscard]] Circumstances circumstancesOf(const Run& run);
+  /// Fills in the event of a remembered result, read or, where it is only written again, unread. False where it is no
+  /// longer there or not what the table says.
+  bool fillFromEvent(PluginResult& result, const Known& known, bool isRead);
+  /// What the tool said the last time; scans without it may lie between. `earlier`: the latest first.
+  std::optional<Diagnosis> lastDiagnosis(const std::vector<Remembered>& earlier, const std::string& tool);
   void recall(const Run& run, const PluginList& skipped, Recollection& recollection);
 
   const ScanOptions& options;

@@ -83,7 +83,10 @@ MergedReport readAll(const ReportOptions& options) {
 void compareWithBaseline(MergedReport& merged, const std::string& file) {
   ScanStarted& started = merged.report.started;
   std::vector<std::string> notes;
-  const Baseline baseline = readBaseline(file, notes);
+  Baseline baseline = readBaseline(file, notes);
+  std::vector<Run> runs;
+  for (const PluginResult& result : merged.report.results) runs.push_back(result.run);
+  baseline.locate(runs);
   std::vector<PluginKey> now;
   for (PluginResult& result : merged.report.results) {
     baseline.apply(result);

@@ -10,6 +10,18 @@
 #include <unistd.h>
 
 namespace scanner {
+namespace {
+
+constexpr unsigned kColumnsOfAFile = 100;
+
+}  // namespace
+
+unsigned textColumns(int descriptor) {
+  if (isatty(descriptor) == 0) return kColumnsOfAFile;
+  winsize size = {};
+  return ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col > 0 ? size.ws_col
+                                                                      : TerminalOptions().columns;
+}
 
 TerminalOptions terminalOptions(const ScanOptions& options, int descriptor) {
   TerminalOptions terminal;
@@ -20,11 +32,7 @@ TerminalOptions terminalOptions(const ScanOptions& options, int descriptor) {
   terminal.hasColours = terminal.isTerminal && !isDumb && (noColour == nullptr || *noColour == '\0');
   terminal.showsProgress = terminal.isTerminal && !isDumb && options.showsProgress;
   terminal.isQuiet = options.isQuiet;
-  winsize size = {};
-  if (terminal.isTerminal && ioctl(descriptor, TIOCGWINSZ, &size) == 0 && size.ws_col > 0)
-    terminal.columns = size.ws_col;
-  else if (!terminal.isTerminal)
-    terminal.columns = 100;
+  terminal.columns = textColumns(descriptor);
   return terminal;
 }
 

@@ -69,11 +69,13 @@ INSTANTIATE_TEST_SUITE_P(
                       Case{"IsStillFlaky", flaky(kCrashedAt5), flaky(kCrashedAt9), Change::kFlaky, true},
                       Case{"ExpectationIsNotMetNow", kPassed, unmet(kPassed), Change::kNone, false},
                       Case{"ExpectationIsStillNotMet", unmet(kPassed), unmet(kPassed), Change::kNone, true},
-                      Case{"SomethingIsFoundNow", kPassed, found({"InvalidRead"}), Change::kNone, false},
+                      Case{"SomethingIsFoundNow", kPassed, found({"InvalidRead"}), Change::kNew, false},
                       Case{"TheSameIsFound", found({"InvalidRead", "Leak"}), found({"InvalidRead"}),
-                           Change::kNone, true},
+                           Change::kStillFailing, true},
                       Case{"MoreIsFound", found({"InvalidRead"}), found({"InvalidRead", "InvalidRead"}),
-                           Change::kNone, false}),
+                           Change::kNew, false},
+                      Case{"WhatCrashedHasFindings", kCrashedAt5, found({"InvalidRead"}), Change::kNew,
+                           false}),
     [](const auto& one) { return std::string(one.param.name); });
 
 TEST(Baseline, APluginThatItDoesNotHaveIsNew) {
@@ -99,12 +101,99 @@ TEST(Baseline, ChildrenAreComparedWithTheSameChild) {
   EXPECT_EQ(now.comparison->change, Change::kNew);
 }
 
+// ---- Folders that have moved ------------------------------------------------------------------------------
+
+std::vector<Run> runsOf(const std::vector<std::string>& bundles) {
+  std::vector<Run> runs;
+  for (const std::string& bundle : bundles) runs.emplace_back().bundle = bundle;
+  return runs;
+}
+
+struct MovedCase {
+  const char* name;
+  std::vector<std::string> before;
+  std::vector<std::string> now;
+  /// Of each plug-in of today: the one that it is compared with, as "1" for the first; "-" for none.
+  const char* comparedWith;
+};
+
+class BaselineLocate : public ::testing::TestWithParam<MovedCase> {};
+
+TEST_P(BaselineLocate, FindsAPluginWhoseFolderHasMovedUnlessItMayBeAnother) {
+  const MovedCase& row = GetParam();
+  std::vector<PluginResult> before;
+  for (std::size_t i = 0; i < row.before.size(); ++i)
+    before.push_back(resultOf(row.before[i], Verdict::kCrashed, static_cast<int>(i) + 1));
+  Baseline baseline(before);
+  baseline.locate(runsOf(row.now));
+  std::string comparedWith;
+  for (const std::string& bundle : row.now) {
+    PluginResult result = resultOf(bundle, Verdict::kCrashed, 9);
+    baseline.apply(result);
+    const auto& earlier = result.comparison->earlier;
+    comparedWith += earlier ? std::to_string(*earlier->step) : "-";
+    EXPECT_EQ(result.isWanted, earlier.has_value()) << bundle;
+  }
+  EXPECT_EQ(comparedWith, row.comparedWith);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    , BaselineLocate,
+    ::testing::Values(
+        MovedCase{"TheSamePath", {"/old/a.so"}, {"/old/a.so"}, "1"},
+        MovedCase{"AnotherFolder",
+                  {"/old/build/a.so", "/old/build/b.so"},
+                  {"/new/build/a.so", "/new/build/b.so"},
+                  "12"},
+        MovedCase{"OneOfSeveral", {"/old/a.so", "/old/b.so"}, {"/new/b.so"}, "2"},
+        MovedCase{"AnotherName", {"/old/a.so"}, {"/new/b.so"}, "-"},
+        MovedCase{"AnEndOfAName", {"/old/xa.so"}, {"/new/a.so"}, "-"},
+        MovedCase{"TheFolderTellsThemApart",
+                  {"/old/debug/a.so", "/old/release/a.so"},
+                  {"/new/release/a.so", "/new/debug/a.so"},
+                  "21"},
+        MovedCase{"TwoThatItMayHaveBeen", {"/old/debug/a.so", "/old/release/a.so"}, {"/new/a.so"}, "-"},
+        MovedCase{"TwoThatItMayHaveBecome", {"/old/a.so"}, {"/new/debug/a.so", "/new/release/a.so"}, "--"},
+        MovedCase{"ACopyOfOneThatIsStillThere", {"/old/a.so"}, {"/old/a.so", "/new/a.so"}, "1-"},
+        MovedCase{"OneCameBesideTheOneThatStays",
+                  {"/old/debug/a.so", "/old/release/a.so"},
+                  {"/old/debug/a.so", "/new/release/a.so"},
+                  "12"}),
+    [](const auto& one) { return std::string(one.param.name); });
+
+TEST(Baseline, APluginThatHasMovedIsFoundForItsProcessorAlone) {
+  PluginResult before = kCrashedAt5;
+  before.run.target.processor = "i386";
+  PluginResult now = resultOf("/new/a.so", Verdict::kCrashed, 5);
+  now.run.target.processor = "x86_64";
+  Baseline baseline({before});
+  baseline.locate({now.run});
+  baseline.apply(now);
+  EXPECT_FALSE(now.comparison->earlier);
+}
+
+TEST(Baseline, TheChildrenOfAShellThatHasMovedGoWithIt) {
+  const PluginResult shell = resultOf("/old/a.so", Verdict::kShell);
+  PluginResult child = resultOf("/old/a.so", Verdict::kCrashed, 5);
+  child.run.child = 7;
+  Baseline baseline({shell, child});
+  PluginResult now = child;
+  now.run.bundle = "/new/a.so";
+  baseline.locate({now.run});
+  baseline.apply(now);
+  EXPECT_EQ(now.comparison->change, Change::kStillFailing);
+}
+
 std::vector<std::string> gone(const std::vector<PluginResult>& before, const std::vector<PluginResult>& now,
                               const std::vector<std::string>& places, const Shard& shard = {}) {
   std::vector<PluginKey> keys;
   for (const PluginResult& result : now) keys.push_back(keyOf(result.run));
+  std::vector<Run> runs;
+  for (const PluginResult& result : now) runs.push_back(result.run);
+  Baseline baseline(before);
+  baseline.locate(runs);
   std::vector<std::string> names;
-  for (const Run& run : Baseline(before).gone(keys, places, shard)) names.push_back(nameOf(run, true));
+  for (const Run& run : baseline.gone(keys, places, shard)) names.push_back(nameOf(run, true));
   return names;
 }
 
@@ -124,6 +213,25 @@ TEST(BaselineGone, ChildrenOfAShellThatIsStillThere) {
   PluginResult orphan = resultOf("/lib/b.so", Verdict::kPassed);
   orphan.run.child = 7;
   EXPECT_THAT(gone({kPassed, child, orphan}, {kPassed}, {}), ElementsAre("/lib/a.so #7"));
+}
+
+TEST(BaselineGone, PluginsOfAFolderThatHasMoved) {
+  const std::vector<PluginResult> before = {resultOf("/old/build/a.so", Verdict::kPassed),
+                                            resultOf("/old/build/b.so", Verdict::kPassed),
+                                            resultOf("/old/other/c.so", Verdict::kPassed)};
+  const std::vector<PluginResult> now = {resultOf("/new/build/a.so", Verdict::kPassed)};
+  EXPECT_THAT(gone(before, now, {"/new/build"}), ElementsAre("/old/build/b.so"));
+}
+
+TEST(BaselineGone, ChildrenOfAShellOfAnotherPartAreNotLookedFor) {
+  PluginResult child = resultOf("/lib/a.so", Verdict::kPassed);
+  child.run.child = 7;
+  const Shard first = {1, 2};
+  const Shard second = {2, 2};
+  const Shard& own = isInShard(first, "/lib/a.so") ? first : second;
+  const Shard& other = isInShard(first, "/lib/a.so") ? second : first;
+  EXPECT_THAT(gone({kPassed, child}, {kPassed}, {}, own), ElementsAre("/lib/a.so #7"));
+  EXPECT_THAT(gone({kPassed, child}, {kPassed}, {}, other), IsEmpty());
 }
 
 TEST(BaselineGone, OnlyOfThePartThatIsTried) {

@@ -10,6 +10,7 @@
 #include <gmock/gmock.h>
 
 #include "scanner/events/event_json.h"
+#include "scanner/events/event_members.h"
 #include "scanner/events/event_reader.h"
 #include "tests/shared/program_run.h"
 
@@ -345,6 +346,38 @@ TEST(ReadEvent, NoPieceOfALineIsAnEvent) {
   line.pop_back();
   for (std::size_t size = 0; size < line.size(); ++size)
     EXPECT_FALSE(readEvent(line.substr(0, size))) << size;
+}
+
+// ---- Events that are written again, unread -----------------------------------------------------------------
+
+TEST(EventMembers, TakesALineApartAndKeepsItsTexts) {
+  EXPECT_THAT(eventMembers(R"({"a":1,"b":{"c":[1,{"d":"}"}],"e":","},"f":"\\\",\"g\":","h":null})"),
+              ::testing::Optional(::testing::ElementsAre(
+                  ::testing::Pair("a", "1"), ::testing::Pair("b", R"({"c":[1,{"d":"}"}],"e":","})"),
+                  ::testing::Pair("f", R"("\\\",\"g\":")"), ::testing::Pair("h", "null"))));
+}
+
+TEST(EventMembers, TakesNothingThatNoScanHasWritten) {
+  for (const char* line :
+       {"", "{", "[]", "7", "{}x", R"({"a":})", R"({"a":1,})", R"({ "a":1})", R"({"a" :1})",
+        R"({"a":1, "b":2})", "{\"a\":1}\n", R"({"a":"})", "{\"a\":\"\xFF\"}"})
+    EXPECT_FALSE(eventMembers(line) && !eventMembers(line)->empty()) << line;
+}
+
+TEST(EventLine, OfARecordedResultHasWhatIsOfThisScanAndElseWhatItHad) {
+  std::string line = resultLine(seenMembers(R"([{"number":1,"text":"one","seconds":0.5}])"));
+  line.pop_back();
+  PluginResult result;
+  result.judgement.verdict = Verdict::kPassed;
+  result.isRemembered = true;
+  result.command = {"worker", "/a.so"};
+  result.recorded = eventMembers(line);
+  ASSERT_TRUE(result.recorded);
+  PluginResult expected = readResult(line);
+  expected.isRemembered = true;
+  expected.command = result.command;
+  EXPECT_EQ(readResult(eventLine(result)).seen->lines.size(), 1U);
+  EXPECT_EQ(eventLine(readResult(eventLine(result))), eventLine(expected));
 }
 
 }  // namespace

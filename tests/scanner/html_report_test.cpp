@@ -8,6 +8,7 @@
 #include "scanner/report/html.h"
 #include "scanner/report/html_text.h"
 #include "scanner/report/step_bar.h"
+#include "scanner/report/words.h"
 
 using namespace scanner;
 using ::testing::HasSubstr;
@@ -172,6 +173,7 @@ class HtmlReportHeading : public ::testing::TestWithParam<HeadingCase> {};
 
 TEST_P(HtmlReportHeading, SaysHowManyDidNotEndAsTheyShould) {
   ScanReport report;
+  report.ended = ScanEnded{};
   for (unsigned i = 0; i < GetParam().wanted + GetParam().unwanted; ++i) {
     report.results.push_back(passed("/lib/" + std::to_string(i) + ".so"));
     report.results.back().isWanted = i < GetParam().wanted;
@@ -187,6 +189,18 @@ INSTANTIATE_TEST_SUITE_P(
                       HeadingCase{"OneBad", 0, 1, "The plug-in did not end as it should"},
                       HeadingCase{"SomeBad", 2, 1, "1 of 3 plug-ins did not end as it should"}),
     [](const auto& one) { return one.param.name; });
+
+TEST(HtmlReport, AScanThatLacksAPluginSaysSoAndNotThatAllIsWell) {
+  ScanReport report;
+  report.results = {passed("/lib/a.so"), passed("/lib/b.so")};
+  report.ended = ScanEnded{};
+  report.ended->status = 1;
+  const std::string html = htmlReport(report);
+  EXPECT_THAT(html, HasSubstr("<h1>The 2 plug-ins ended as they should</h1>"));
+  EXPECT_THAT(
+      html,
+      HasSubstr("the scan is not whole: a plug-in that was expected, or a part of the scan, is missing"));
+}
 
 /// The describer ran the plug-in's code, so that its object may hold anything.
 TEST(HtmlReport, ADescriptionOfTheWrongFormDoesNoHarm) {

@@ -332,6 +332,28 @@ class Baselines(ReportTest):
         # Of what is not looked for nothing is gone.
         self.assertEqual(self.events("--baseline", baseline, copies / "000.so", status=0)[0]["notes"], [])
 
+    def test_a_folder_that_has_moved_has_the_same_plugins(self):
+        # A CI system checks out into another folder for each job.
+        build = self.folder / "job1/build"
+        build.mkdir(parents=True)
+        for name in ("faulty.so", "shell.so", EFFECT):
+            shutil.copy(plugins() / name, build)
+        baseline = self.record("baseline", build, environment=CRASH)
+        os.rename(self.folder / "job1", self.folder / "job2")
+        build = self.folder / "job2/build"
+        (build / EFFECT).unlink()
+        shutil.copy(plugins() / "open_crashes.so", build)
+        _, events = self.compared(CRASH, build, baseline=baseline, status=1)
+        changes = {(os.path.basename(event["plugin"]["bundle"]), event["plugin"]["child"]):
+                   (event["comparison"]["change"], event["comparison"]["earlier"] is not None)
+                   for event in events if event["event"] == "plugin_ended"}
+        self.assertEqual(changes, {("faulty.so", None): ("still_failing", True), ("open_crashes.so", None): ("new", False),
+                                   **{("shell.so", child): ("none", True) for child in (None, 1001, 1234, -7)}})
+        self.assertEqual(events[0]["notes"], [f"gone since the baseline: {self.folder}/job1/build/{EFFECT}"])
+        # A file that is named is found, too.
+        changes, _ = self.compared(CRASH, build / "faulty.so", baseline=baseline, status=0)
+        self.assertEqual(changes, {"faulty.so": "still_failing"})
+
     def test_the_children_of_a_shell_that_are_gone_are_named_at_the_end(self):
         events = self.read(self.record("baseline", plugins() / "shell.so"))
         extra = json.loads(json.dumps(events[-2]))

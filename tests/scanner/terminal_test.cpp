@@ -80,7 +80,8 @@ std::string wholeReport(Terminal& terminal) {
   flaky.repetitions = Repetitions{3, {{"passed", 2}, {"exited at 4", 1}}};
   report.ended(flaky);
   report.ended(result(Verdict::kSkipped, "/usr/lib/vst/skipped.so", "slow"));
-  report.ended(result(Verdict::kWrongArchitecture, "/usr/lib/vst/arm.so", "built for Linux on aarch64"));
+  report.ended(
+      result(Verdict::kWrongArchitecture, "/usr/lib/vst/a_folder/arm.so", "built for Linux on aarch64"));
   ScanEnded ended;
   ended.wallSeconds = 75;
   ended.counts = {{"passed", 3}, {"crashed", 1}, {"failed", 1},
@@ -94,14 +95,14 @@ TEST(TerminalReport, TellsEverythingAt80Columns) {
   EXPECT_EQ(wholeReport(terminal),
             R"(not searched: /lib/closed: Permission denied
 5 plug-ins, 2 at a time, sandbox: bubblewrap
-passed         1.2 s  /usr/lib/vst/effect.so
-passed         1.2 s  /lib/shell.so #-7 Third child
-crashed        1.2 s  /usr/lib/vst/with blank/oscilloscope.so
-passed         1.2 s  /usr/lib/vst/mended.so
-failed         1.2 s  /usr/lib/vst/known.so  as expected
-flaky          1.2 s  /usr/lib/vst/flaky.so
-skipped               /usr/lib/vst/skipped.so
-wrong_architecture           /usr/lib/vst/arm.so
+passed          1.2 s  /usr/lib/vst/effect.so
+passed          1.2 s  /lib/shell.so #-7 Third child
+crashed         1.2 s  /usr/lib/vst/with blank/oscilloscope.so
+passed          1.2 s  /usr/lib/vst/mended.so
+failed          1.2 s  /usr/lib/vst/known.so  as expected
+flaky           1.2 s  /usr/lib/vst/flaky.so
+skipped                /usr/lib/vst/skipped.so
+wrong_architecture            /usr/lib/vst/a_folder/arm.so
 
 crashed  /usr/lib/vst/with blank/oscilloscope.so
   step 5, testing setting states: SIGSEGV in effSetBypass (44) value 1, in
@@ -114,11 +115,11 @@ exited  /usr/lib/vst/flaky.so
   ended the process with status 0
   flaky: 33 % of the runs failed: 1 of 3 exited at 4, 2 of 3 passed
   again: /usr/lib/vsttorture-worker /usr/lib/vst/flaky.so
-wrong_architecture  /usr/lib/vst/arm.so
+wrong_architecture  /usr/lib/vst/a_folder/arm.so
   built for Linux on aarch64
 
 8 results: 3 passed, 1 failed, 1 crashed, 1 exited, 1 wrong_architecture, 1
-  skipped, in 75 s
+  skipped, in 1 min 15 s
 )");
 }
 
@@ -135,6 +136,7 @@ TEST(TerminalReport, FitsInto40ColumnsButForCommands) {
   }
   EXPECT_THAT(text, HasSubstr("crashed     oscilloscope.so\n"));
   EXPECT_THAT(text, HasSubstr("wrong_architecture arm.so\n"));
+  EXPECT_THAT(text, HasSubstr("\nwrong_architecture\n  /usr/lib/vst/a_folder/arm.so\n"));
 }
 
 TEST(TerminalReport, ShowsWhatAToolFoundInAPluginThatPassed) {
@@ -153,7 +155,7 @@ TEST(TerminalReport, ShowsWhatAToolFoundInAPluginThatPassed) {
       {"UninitValue", "Use", {}}};
   one.diagnosis->problem = "memcheck was ended before the run was";
   terminal.report().ended(one);
-  EXPECT_EQ(terminal.take(), "passed         1.2 s  /lib/vst/a.so  with findings of memcheck\n");
+  EXPECT_EQ(terminal.take(), "passed          1.2 s  /lib/vst/a.so  with findings of memcheck\n");
   terminal.report().ended(ScanEnded());
   EXPECT_EQ(terminal.take(),
             R"(
@@ -172,7 +174,7 @@ passed  /lib/vst/a.so
   under memcheck: valgrind worker '/lib/vst/a b.so'
   again: /usr/lib/vsttorture-worker /lib/vst/a.so
 
-0 results, in 0.0 s
+0 results, in 0 s
 )");
 }
 
@@ -197,7 +199,7 @@ crashed  /lib/vst/a.so
   shortest list of tests: it did not fail again
   again: /usr/lib/vsttorture-worker /lib/vst/a.so
 
-0 results, in 0.0 s
+0 results, in 0 s
 )");
 }
 
@@ -215,13 +217,13 @@ TEST(TerminalReport, ColoursWordsOnly) {
   Terminal terminal;
   terminal.options.hasColours = true;
   terminal.report().ended(result(Verdict::kPassed, "/a"));
-  EXPECT_EQ(terminal.take(), "\x1b[32mpassed      \x1b[0m   1.2 s  /a\n");
+  EXPECT_EQ(terminal.take(), "\x1b[32mpassed      \x1b[0m    1.2 s  /a\n");
   terminal.report().ended(result(Verdict::kCrashed, "/a"));
-  EXPECT_EQ(terminal.take(), "\x1b[31mcrashed     \x1b[0m   1.2 s  /a\n");
+  EXPECT_EQ(terminal.take(), "\x1b[31mcrashed     \x1b[0m    1.2 s  /a\n");
   PluginResult known = result(Verdict::kCrashed, "/a");
   known.isWanted = true;
   terminal.report().ended(known);
-  EXPECT_EQ(terminal.take(), "\x1b[33mcrashed     \x1b[0m   1.2 s  /a\n");
+  EXPECT_EQ(terminal.take(), "\x1b[33mcrashed     \x1b[0m    1.2 s  /a\n");
 }
 
 TEST(TerminalReport, WritesNoControlCodesWithoutATerminal) {
@@ -235,6 +237,7 @@ TEST(TerminalReport, WritesNoControlCodesWithoutATerminal) {
 
 PluginResult changed(Verdict verdict, Comparison::Change change, const std::string& earlier) {
   PluginResult one = result(verdict, "/lib/a.so", "step 5: SIGSEGV");
+  if (verdict == Verdict::kCrashed) one.judgement.step = 5;
   one.command.clear();
   one.comparison.emplace();
   one.comparison->change = change;
@@ -258,7 +261,7 @@ TEST_P(TerminalReportChanges, AreToldInOneLine) {
   terminal.take();
   terminal.report().ended(ScanEnded());
   EXPECT_EQ(terminal.take(), std::string("\n") + rowOf(row.verdict).word +
-                                 "  /lib/a.so\n  step 5: SIGSEGV\n" + row.line + "\n0 results, in 0.0 s\n");
+                                 "  /lib/a.so\n  step 5: SIGSEGV\n" + row.line + "\n0 results, in 0 s\n");
 }
 
 using C = Comparison::Change;
@@ -270,13 +273,34 @@ INSTANTIATE_TEST_SUITE_P(
                    "  new: it was \"hung at 5\" before\n"},
         ChangeCase{"NewForTheFirstTime", Verdict::kCrashed, C::kNew, "", "  new: it was not there before\n"},
         ChangeCase{"StillFailing", Verdict::kCrashed, C::kStillFailing, "crashed", "  still failing\n"},
+        ChangeCase{"StillFailingAtAnotherStep", Verdict::kHung, C::kStillFailing, "hung",
+                   "  still failing: it was \"hung at 5\" before\n"},
         ChangeCase{"Flaky", Verdict::kCrashed, C::kFlaky, "passed",
                    "  flaky: it was \"passed\" before, and nothing has changed since\n"},
         ChangeCase{"FlakyAndNowGood", Verdict::kPassed, C::kFlaky, "crashed",
                    "  flaky: it was \"crashed at 5\" before, and nothing has changed since\n"},
-        ChangeCase{"NotRunIsNoChangeOfThePlugin", Verdict::kNotRun, C::kNew, "passed", ""},
         ChangeCase{"NoChange", Verdict::kCrashed, C::kNone, "crashed", ""}),
     [](const auto& parameter) { return std::string(parameter.param.name); });
+
+TEST(TerminalReport, SaysWhetherFindingsOfWhatPassedAreNew) {
+  for (const auto& [change, line] :
+       {std::pair(C::kNew, "  new: memcheck did not find all of this before\n"),
+        std::pair(C::kStillFailing, "  still failing\n"),
+        std::pair(C::kFlaky, "  flaky: memcheck does not find the same each time\n")}) {
+    Terminal terminal;
+    PluginResult one = changed(Verdict::kPassed, change, "passed");
+    one.comparison->earlier->step.reset();
+    one.isWanted = false;
+    one.diagnosis.emplace();
+    one.diagnosis->tool = "memcheck";
+    one.diagnosis->findings = {{"InvalidRead", "Invalid read", {}}};
+    terminal.report().ended(one);
+    terminal.take();
+    terminal.report().ended(ScanEnded());
+    EXPECT_THAT(terminal.take(),
+                HasSubstr(std::string("  step 5: SIGSEGV\n") + line + "  memcheck: Invalid read\n"));
+  }
+}
 
 TEST(TerminalReport, NamesTheFirstTenThatAreMended) {
   Terminal terminal(200);
@@ -289,7 +313,7 @@ TEST(TerminalReport, NamesTheFirstTenThatAreMended) {
   terminal.report().ended(ScanEnded());
   EXPECT_EQ(
       terminal.take(),
-      "mended: 0.so, 1.so, 2.so, 3.so, 4.so, 5.so, 6.so, 7.so, 8.so, 9.so and 2 more\n0 results, in 0.0 s\n");
+      "mended: 0.so, 1.so, 2.so, 3.so, 4.so, 5.so, 6.so, 7.so, 8.so, 9.so and 2 more\n0 results, in 0 s\n");
 }
 
 TEST(TerminalReport, MarksWhatIsRememberedAndCountsIt) {
@@ -297,14 +321,14 @@ TEST(TerminalReport, MarksWhatIsRememberedAndCountsIt) {
   PluginResult one = result(Verdict::kPassed, "/lib/a.so");
   one.isRemembered = true;
   terminal.report().ended(one);
-  EXPECT_EQ(terminal.take(), "passed                /lib/a.so  (remembered)\n");
+  EXPECT_EQ(terminal.take(), "passed                 /lib/a.so  (remembered)\n");
   ScanEnded ended;
   ended.counts = {{"passed", 2}};
   terminal.report().ended(ended);
-  EXPECT_EQ(terminal.take(), "2 results: 2 passed, in 0.0 s; 1 remembered\n");
+  EXPECT_EQ(terminal.take(), "2 results: 2 passed, in 0 s; 1 remembered\n");
   ended.counts = {{"passed", 1}};
   terminal.report().ended(ended);
-  EXPECT_EQ(terminal.take(), "1 result: 1 passed, in 0.0 s; all remembered\n");
+  EXPECT_EQ(terminal.take(), "1 result: 1 passed, in 0 s; all remembered\n");
 }
 
 // ---- Progress ---------------------------------------------------------------------------------------------
@@ -312,11 +336,11 @@ TEST(TerminalReport, MarksWhatIsRememberedAndCountsIt) {
 TEST(TerminalReport, ProgressStandsInPlaceAndMakesRoomForALine) {
   Terminal terminal;
   terminal.report().progress(3, 200, 71.5, {"a.so", "shell.so #1 One"});
-  EXPECT_EQ(terminal.take(), "\r\x1b[K3/200, 72 s left  a.so  shell.so #1 One");
+  EXPECT_EQ(terminal.take(), "\r\x1b[K3/200, 1 min 12 s left  a.so  shell.so #1 One");
   terminal.report().ended(result(Verdict::kPassed, "/a"));
-  EXPECT_EQ(terminal.take(), "\r\x1b[Kpassed         1.2 s  /a\n");
+  EXPECT_EQ(terminal.take(), "\r\x1b[Kpassed          1.2 s  /a\n");
   terminal.report().ended(result(Verdict::kPassed, "/b"));
-  EXPECT_EQ(terminal.take(), "passed         1.2 s  /b\n");
+  EXPECT_EQ(terminal.take(), "passed          1.2 s  /b\n");
 }
 
 TEST(TerminalReport, ProgressLeavesTheLastColumnFree) {
@@ -325,12 +349,19 @@ TEST(TerminalReport, ProgressLeavesTheLastColumnFree) {
   EXPECT_EQ(terminal.take().size(), 39 + std::string("\r\x1b[K").size());
 }
 
+TEST(TerminalReport, FollowsTheWidthOfTheWindow) {
+  Terminal terminal(80);
+  terminal.report().setColumns(30);
+  terminal.report().progress(1, 9, 0, {std::string(100, 'a')});
+  EXPECT_EQ(terminal.take().size(), 29 + std::string("\r\x1b[K").size());
+}
+
 TEST(TerminalReport, ShowsNoControlCodesOfOthers) {
   Terminal terminal;
   PluginResult one = child(1, "\x1b[2J\nname\xFF");
   one.run.bundle = "/lib/\x1b]0;title\x07.so";
   terminal.report().ended(one);
-  EXPECT_EQ(terminal.take(), "passed         1.2 s  /lib/?]0;title?.so #1 ?[2J?name\xEF\xBF\xBD\n");
+  EXPECT_EQ(terminal.take(), "passed          1.2 s  /lib/?]0;title?.so #1 ?[2J?name\xEF\xBF\xBD\n");
   terminal.report().progress(0, 1, 0, {"\x1b[31m"});
   EXPECT_EQ(terminal.take(), "\r\x1b[K0/1  ?[31m");
 }
@@ -341,6 +372,11 @@ TEST(Printable, ControlCharactersOfEightBitsAreReplacedAndLettersStay) {
             "a?31m \xC3\xA9\xE2\x82\xAC");
 }
 
+TEST(Printable, CharactersThatReorderOrHideOthersAreShown) {
+  EXPECT_EQ(printable("a\u202Eos.b"), "a[U+202E]os.b");
+  EXPECT_EQ(printable("\u2066\u200B\uFEFF"), "[U+2066][U+200B][U+FEFF]");
+}
+
 TEST(Shortened, KeepsBothEndsAndCountsCharacters) {
   EXPECT_EQ(shortened("abcdefghij", 10), "abcdefghij");
   EXPECT_EQ(shortened("abcdefghijk", 10), "ab...ghijk");
@@ -349,15 +385,31 @@ TEST(Shortened, KeepsBothEndsAndCountsCharacters) {
   EXPECT_EQ(shortened("abcdef", 2), "ab");
 }
 
+TEST(Shortened, CountsTwoColumnsForWideCharactersAndNoneForMarks) {
+  EXPECT_EQ(shortened("音源プラグイン.so", 17), "音源プラグイン.so");
+  EXPECT_EQ(shortened("音源プラグイン.so", 16), "音源...グイン.so");
+  EXPECT_EQ(shortened("音源プラグイン.so", 3), "音");
+  // An accent stays with its letter.
+  EXPECT_EQ(shortened("e\u0301e\u0301e\u0301e\u0301e\u0301", 5), "e\u0301e\u0301e\u0301e\u0301e\u0301");
+  EXPECT_EQ(shortened("abcdefe\u0301e\u0301e\u0301", 6), "a...e\u0301e\u0301");
+}
+
 TEST(Wrapped, BreaksAtBlanksAndLongWordsWhereTheyMust) {
   EXPECT_EQ(wrapped("one two three", 8, 2), "one two\n  three");
   EXPECT_EQ(wrapped("abcdefghijklmnop", 8, 2), "abcdefgh\n  ijklmn\n  op");
   EXPECT_EQ(wrapped("", 8, 2), "");
+  EXPECT_EQ(wrapped("音源プラグイン", 7, 1), "音源プ\n ラグイ\n ン");
+  EXPECT_EQ(wrapped("音源", 1, 0), "音\n源");
 }
 
 TEST(ShellCommand, QuotesWhatAShellWouldTakeApart) {
   EXPECT_EQ(shellCommand({"/bin/worker", "/lib/it's a.so", "", "-7"}),
             "/bin/worker '/lib/it'\\''s a.so' '' -7");
+}
+
+TEST(ShellCommand, ShowsTheBytesOfWhatATerminalMustNotGet) {
+  EXPECT_EQ(shellCommand({"/lib/it's\x1b[2J\n\\.so", "\u202E", "\xFF", "\xC3\xA9"}),
+            "$'/lib/it\\'s\\033[2J\\012\\\\.so' $'\\342\\200\\256' $'\\377' '\xC3\xA9'");
 }
 
 }  // namespace

@@ -126,14 +126,14 @@ class SecondScan(RememberingTest):
         self.scan(plugin, sandbox="auto")
         result = self.scan(plugin, sandbox="auto", environment={"TMPDIR": "/proc/nowhere", "PATH": "/nowhere"})
         self.assertEqual((result.returncode, result.stderr), (0, ""))
-        self.assertRegex(result.stdout, r"\n1 result: 1 passed, in \S+ s; all remembered\n$")
+        self.assertRegex(result.stdout, r"\n1 result: 1 passed, in \S+ m?s; all remembered\n$")
 
     def test_is_told_on_the_terminal(self):
         plugin = self.plugin()
         self.assertNotIn("remembered", self.scan(plugin).stdout)
         self.assertRegex(self.scan(plugin).stdout, r"\npassed +/.*/plugin.so  \(remembered\)\n")
         other = self.plugin(copy="other.so")
-        self.assertRegex(self.scan(plugin, other).stdout, r"2 passed, in \S+ s; 1 remembered\n")
+        self.assertRegex(self.scan(plugin, other).stdout, r"2 passed, in \S+ m?s; 1 remembered\n")
 
     def test_notices_another_file_but_not_another_folder(self):
         def replace(plugin):
@@ -272,10 +272,12 @@ class SecondScan(RememberingTest):
     def test_an_event_that_cannot_be_read_or_is_of_another_plugin_is_had_again(self):
         plugin = self.plugin()
         self.scan(plugin)
-        for event in ("substr(event, 1, 100)", "replace(event, 'plugin.so', 'other.so')"):
-            self.run_sql(f"UPDATE results SET event = {event}")
-            self.assertFalse(self.is_remembered(plugin, status=0))
-            self.assertTrue(self.is_remembered(plugin, status=0))
+        for damage in ["substr(event, 1, 100)", "replace(event, '/plugin.so', '/other.so')",
+                       "replace(event, '\"passed\"', '\"failed\"')", "replace(event, ',', char(10) || ',')"]:
+            with self.subTest(damage=damage):
+                self.run_sql(f"UPDATE results SET event = {damage}")
+                self.assertFalse(self.is_remembered(plugin, status=0))
+                self.assertTrue(self.is_remembered(plugin, status=0))
 
     def test_an_interrupted_run_is_no_answer(self):
         plugin = self.plugin("faulty.so")
@@ -317,6 +319,19 @@ class Comparisons(RememberingTest):
         self.scan(plugin)
         self.assertEqual(self.change("--fresh", plugin, environment=CRASH, status=1), "flaky")
         self.assertEqual(self.change("--fresh", plugin, status=0), "flaky")
+
+    def test_findings_of_a_tool_are_new_until_they_have_been_seen(self):
+        # The tool finds something while the file is there.
+        found = self.folder / "found"
+        under = ["--under", f"sh -c 'test -e {found} && exit 99; exec \"$@\"' x"]
+        self.result(*under, self.plugin(), status=0)
+        found.touch()
+        for change in ("new", "still_failing"):
+            self.result(self.plugin(), status=0)  # A scan without the tool says nothing about its findings.
+            self.assertEqual(self.change(*under, self.plugin(), status=1), change)
+        self.assertEqual(self.change(*under, self.folder / "plugin.so", status=1), "still_failing")
+        found.unlink()
+        self.assertEqual(self.change(*under, self.plugin(), status=0), "mended")
 
     def test_are_told_on_the_terminal(self):
         self.scan(self.plugin("faulty.so"))
@@ -475,8 +490,8 @@ class History(RememberingTest):
         self.scan(plugin, self.plugin())
         self.scan(self.plugin("faulty.so"), environment=CRASH)
         when = r"  \d{4}-\d\d-\d\d \d\d:\d\d  "
-        expected = (rf"^{re.escape(str(plugin))} \(x86_64\)\n{when}crashed +\d+\.\d s  \d+\.\d+\.\d+  .*SIGSEGV.*\n"
-                    rf"{when}passed +\d+\.\d s  \d+\.\d+\.\d+\n$")
+        expected = (rf"^{re.escape(str(plugin))} \(x86_64\)\n{when}crashed +[\d.]+ m?s  \d+\.\d+\.\d+  .*SIGSEGV.*\n"
+                    rf"{when}passed +[\d.]+ m?s  \d+\.\d+\.\d+\n$")
         for name in (plugin, "plugin.so", "./plugin.so", "plugin"):
             with self.subTest(name=name):
                 self.assertRegex(self.history(name), expected)
@@ -510,6 +525,14 @@ class History(RememberingTest):
         self.scan(self.plugin(), cache="mine.sqlite")
         self.assertIn("1 passed", self.history("--cache", "mine.sqlite"))
         self.assertEqual(sorted(path.name for path in self.folder.glob("mine*")), ["mine.sqlite"])
+
+    def test_that_cannot_be_written(self):
+        self.scan(self.plugin())
+        with open("/dev/full", "w", encoding="utf-8") as full:
+            result = subprocess.run([scan_test_case.SCAN, "history"], env=self.environment(), stdout=full,
+                                    stderr=subprocess.PIPE, text=True, timeout=60, check=False)
+        self.assertEqual((result.returncode, result.stderr),
+                         (3, "vsttorture-scan: standard output: No space left on device\n"))
 
     def test_shows_no_control_codes_of_others(self):
         name = self.folder / "\x1b[31mred.so"
