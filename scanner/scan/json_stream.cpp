@@ -35,6 +35,7 @@ void JsonStream::write(const std::string& line) {
     if (count < 0 && errno == EINTR) continue;
     if (count < 0) {
       trouble = name + ": " + std::strerror(errno);
+      isReaderGone = errno == EPIPE;
       // A full disk may have taken the beginning of the line: away with it.
       struct stat status = {};
       if (isOwned && written > 0 && fstat(descriptor, &status) == 0) {

@@ -27,11 +27,15 @@ class JsonStream {
   /// Why no more is written; empty while all is well.
   [[nodiscard]] const std::string& problem() const { return trouble; }
 
+  /// Whether that is because whoever read a pipe has closed it.
+  [[nodiscard]] bool hasLostReader() const { return isReaderGone; }
+
  private:
   std::string name;
   int descriptor = -1;
   bool isOwned = false;
   std::string trouble;
+  bool isReaderGone = false;
 };
 
 }  // namespace scanner

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: MIT
 #include "scanner/scan/options.h"
 
+#include <charconv>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
@@ -15,18 +16,27 @@ namespace {
 constexpr const char* kDescription =
     "Tortures VST 2.x plug-ins, each in a process of its own, and says which of them fail, where and why.\n"
     "Without a path: the folders in VST_PATH, else those in which hosts look for plug-ins.\n"
+    "vsttorture-scan history --help: results of earlier scans.\n"
     "vsttorture-scan report --help: reports of recorded scans.";
 
 constexpr const char* kFooter =
     "Status: 0 every plug-in as wanted, 1 not, 2 wrong use, 3 the scan could not go on, 130 interrupted.\n"
     "vsttorture-scan(1) says what the lists look like; VERDICTS.md says what each verdict means.";
 
+/// "K/N": digits, a slash, digits.
+std::optional<Shard> readShard(const std::string& text) {
+  Shard shard;
+  const char* const end = text.data() + text.size();
+  const auto [slash, partError] = std::from_chars(text.data(), end, shard.part);
+  if (partError != std::errc() || slash == end || *slash != '/') return std::nullopt;
+  const auto [rest, partsError] = std::from_chars(slash + 1, end, shard.parts);
+  if (partsError != std::errc() || rest != end || shard.part < 1 || shard.part > shard.parts)
+    return std::nullopt;
+  return shard;
+}
+
 std::string checkShard(const std::string& text) {
-  unsigned part = 0;
-  unsigned parts = 0;
-  char rest = 0;
-  const bool isShard = std::sscanf(text.c_str(), "%u/%u%c", &part, &parts, &rest) == 2;
-  return isShard && part >= 1 && part <= parts ? "" : "is K/N, with K from 1 to N";
+  return readShard(text) ? "" : "\"" + text + "\" is not K/N, with K from 1 to N";
 }
 
 std::string checkSeconds(const std::string& text) {
@@ -110,7 +120,7 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
     return std::nullopt;
   }
   limits.memoryInBytes = memoryInMiB << 20;
-  if (!shard.empty()) std::sscanf(shard.c_str(), "%u/%u", &options.shard.part, &options.shard.parts);
+  if (!shard.empty()) options.shard = *readShard(shard);
   options.engine.sandbox = sandbox == "off"        ? SandboxUse::kOff
                            : sandbox == "required" ? SandboxUse::kRequired
                                                    : SandboxUse::kAuto;

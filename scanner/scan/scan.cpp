@@ -337,10 +337,7 @@ class Scan {
 
   /// `plugin`: of a run of this scan, which is remembered.
   void deliver(PluginResult& result, const UnderWay* plugin = nullptr) {
-    const bool isGood = rowOf(result.judgement.verdict).isGood;
-    const bool isFlaky = result.repetitions && result.repetitions->isFlaky();
-    const bool hasFindings = result.diagnosis && result.diagnosis->hasFindings();
-    result.isWanted = isGood && !isFlaky && !hasFindings;
+    result.isWanted = rowOf(result.judgement.verdict).isGood && !result.isFlaky() && !result.hasFindings();
     const auto rows = expected.matching(result.run.bundle, result.run.child);
     for (const PluginRow* one : rows) rowsMet.insert(one->line);
     const PluginRow* row = rows.empty() ? nullptr : rows.front();
@@ -349,7 +346,7 @@ class Scan {
       const bool isMet = row->verdict == rowOf(result.judgement.verdict).word &&
                          (!row->step || *row->step == result.judgement.step);
       result.expected = Expectation{row->verdict, row->step, row->reason, isMet};
-      result.isWanted = isMet && !isFlaky;
+      result.isWanted = isMet && !result.isFlaky();
     }
     if (plugin != nullptr || result.isRemembered) remembering.compareWithLast(result);
     if (plugin != nullptr && !plugin->isStopped) remembering.save(result, plugin->children);
@@ -361,15 +358,21 @@ class Scan {
     if (json.isOpen()) json.write(eventLine(result));
     terminal.ended(result);
     wholeReports.add(result);
-    // With nobody left to read what comes out, there is nothing to run for.
-    const bool isJsonLost =
-        (options.jsonFile.empty() || !json.problem().empty()) && !wholeReports.areWanted();
-    if (output.hasFailed && isJsonLost && engine) engine->stop();
+    if (isNobodyLeft() && engine) engine->stop();
+  }
+
+  /// With nobody left to read what comes out, there is nothing to run for. A program that has read the events is all
+  /// that they were for; a full disk leaves the report for people.
+  [[nodiscard]] bool isNobodyLeft() const {
+    if (wholeReports.areWanted()) return false;
+    const bool hasEvents = !options.jsonFile.empty() && json.problem().empty();
+    return json.hasLostReader() || (output.hasFailed && !hasEvents);
   }
 
   void showProgress() {
     std::vector<std::string> names;
     for (const Plugin& plugin : underWay) names.push_back(nameOf(plugin->result.run, false));
+    terminal.setColumns(textColumns(output.descriptor));  // The window may have been resized.
     terminal.progress(done, total, timeLeft.seconds(options.engine.jobs), names);
   }
 
@@ -415,8 +418,10 @@ class Scan {
     for (const PluginRow& row : expected.rows) {
       if (rowsMet.count(row.line) > 0 || row.pattern.find_first_of("*?[") != std::string::npos) continue;
       if (row.child && *row.child == "*") continue;
-      complain(fmt::format("{}, line {}: there was no such plug-in: {}{}", expected.file, row.line,
-                           row.pattern, row.child ? "#" + *row.child : ""));
+      const std::string note = fmt::format("{}, line {}: there was no such plug-in: {}{}", expected.file,
+                                           row.line, row.pattern, row.child ? "#" + *row.child : "");
+      complain(note);
+      wholeReports.addNote(note);
       isComplete = false;
     }
     return isComplete;

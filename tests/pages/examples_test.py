@@ -116,13 +116,18 @@ class Torture(Example):
         self.assertEqual(status, 1)
         self.assertIn('new: it was "crashed at 5" before', output)
 
-    def test_reports_are_made_anew(self):
+    def test_reports_are_made_anew_and_other_files_stay(self):
         self.build_plugin("faulty.so")
         reports = self.folder / "torture-reports"
         reports.mkdir()
-        (reports / "old").touch()
+        for name in ("mine", "scan.html"):
+            (reports / name).write_text("old")
         self.torture()
-        self.assertEqual(sorted(path.name for path in reports.iterdir()), ["junit.xml", "scan.html", "scan.jsonl"])
+        self.assertEqual(sorted(path.name for path in reports.iterdir()), ["junit.xml", "mine", "scan.html", "scan.jsonl"])
+        self.assertNotEqual((reports / "scan.html").read_text(), "old")
+        self.plugin.unlink()
+        self.torture()
+        self.assertEqual([path.name for path in reports.iterdir()], ["mine"])
 
     def test_without_the_program_it_says_what_is_missing(self):
         script = self.folder / "torture.sh"

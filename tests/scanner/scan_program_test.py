@@ -82,8 +82,8 @@ class WrongUse(ScanTest):
         for arguments in [["-j", "0"], ["-j", "-1"], ["--step-limit", "0"], ["--step-limit", "-3"],
                           ["--step-limit", "nan"], ["--limit", "0"], ["--limit", "inf"], ["--limit", "soon"],
                           ["--memory", "0"], ["--memory", "-5"], ["--repeat", "0"], ["--shard", "0/2"],
-                          ["--shard", "3/2"], ["--shard", "1"], ["--shard", "1/2x"], ["--sandbox", "perhaps"],
-                          ["--unknown"]]:
+                          ["--shard", "3/2"], ["--shard", "1"], ["--shard", "1/2x"], ["--shard", "1/-1"],
+                          ["--sandbox", "perhaps"], ["--unknown"]]:
             with self.subTest(arguments=arguments):
                 self.assert_ends(2, arguments[0].lstrip("-"), *arguments, PLUGINS / EFFECT, sandbox=None)
 
@@ -234,7 +234,7 @@ class Outputs(ScanTest):
     def test_a_full_disk_for_the_results_keeps_the_verdicts_on_the_terminal(self):
         result = self.scan("--json", "/dev/full", PLUGINS / EFFECT)
         self.assertEqual(result.returncode, 3)
-        self.assertRegex(result.stdout, r"passed +\d+\.\d s  .*well_behaved_effect.so\n")
+        self.assertRegex(result.stdout, r"passed +[\d.]+ m?s  .*well_behaved_effect.so\n")
         self.assertIn("the results could not be written: /dev/full: No space left on device", result.stderr)
 
     def test_a_disk_that_becomes_full_ends_the_results_at_a_whole_line(self):
@@ -271,6 +271,15 @@ class Outputs(ScanTest):
         os.close(writing)
         self.assertEqual(result.returncode, 3)
         self.assertIn("the report could not be written: Broken pipe", result.stderr)
+
+    def test_a_scan_whose_events_nobody_reads_ends_soon(self):
+        reading, writing = os.pipe()
+        os.close(reading)
+        result = self.scan("-j", "1", "--json", "-", self.copies(100), stdout=writing)
+        os.close(writing)
+        self.assertEqual(result.returncode, 3)
+        self.assertIn("the results could not be written: standard output: Broken pipe", result.stderr)
+        self.assertLess(result.stderr.count(".so\n"), 50)
 
     def test_quiet_shows_what_is_not_as_wanted(self):
         self.assertRegex(self.scan("--quiet", PLUGINS / EFFECT).stdout, r"^1 result: 1 passed, in .*\n$")

@@ -37,8 +37,9 @@ if [ ! -x "$scan" ]; then
   exit 3
 fi
 
-rm -rf "$reports"
 mkdir -p "$reports" "$state" || exit 3
+# Those of an earlier job are not to be taken for this one's. Nothing else is removed: the folder may hold more.
+rm -f "$reports/scan.html" "$reports/junit.xml" "$reports/scan.jsonl" || exit 3
 [ ! -e "$state/baseline.jsonl" ] || set -- --baseline "$state/baseline.jsonl" "$@"
 
 status=0
