@@ -30,10 +30,6 @@ std::string plain(const char* text) { return escaped(text); }
 
 std::string code(std::string_view text) { return "<code>" + escaped(text) + "</code>"; }
 
-std::string verdictInWords(const std::string& verdict, const std::optional<int>& step) {
-  return step ? fmt::format("{} at step {}", verdict, *step) : verdict;
-}
-
 std::string requestInWords(const RequestSeen& request) {
   if (request.kind == "load") return "the system loads the module";
   if (request.kind == "entry") return "the module's entry point";
@@ -216,7 +212,7 @@ class Details {
   }
 
   void addExpected(const Expectation& expected) {
-    std::string html = escaped(verdictInWords(expected.verdict, expected.step)) +
+    std::string html = escaped(endInWords(expected.verdict, expected.step, " at step ")) +
                        (expected.isMet ? ", and so it ended" : ", <strong>but it ended otherwise</strong>");
     if (!expected.reason.empty()) html += "; reason in the list: " + escaped(expected.reason);
     fact("Expected", html);
@@ -233,7 +229,7 @@ class Details {
     std::string words = changeSentence(comparison.change);
     if (comparison.earlier) {
       const Comparison::Earlier& earlier = *comparison.earlier;
-      words += fmt::format("; earlier: {}", verdictInWords(earlier.verdict, earlier.step));
+      words += fmt::format("; earlier: {}", endInWords(earlier.verdict, earlier.step, " at step "));
       const std::string time = timeInWords(earlier.time);
       if (!time.empty()) words += ", " + time;
     } else if (comparison.change == Comparison::Change::kNone) {

@@ -95,6 +95,14 @@ std::string messageOf(const PluginResult& result) {
   return printable(reason.empty() ? rowOf(result.judgement.verdict).meaning : reason);
 }
 
+/// The type of a failure: the verdict's word, or, of a good verdict, why it is a failure all the same.
+const char* typeOf(const PluginResult& result) {
+  const VerdictRow& row = rowOf(result.judgement.verdict);
+  if (!row.isGood) return row.word;
+  if (result.isFlaky()) return "flaky";
+  return result.isUnexpected() ? "unexpected" : "findings";
+}
+
 /// Everything that is known of the failure, a line each.
 std::string detailsOf(const PluginResult& result) {
   const Judgement& judgement = result.judgement;
@@ -201,7 +209,7 @@ void addResult(pugi::xml_node suite, const PluginResult& result, bool namesProce
     setAttribute(test.append_child("skipped"), "message", printable(result.judgement.cause));
   } else if (outcome != Outcome::kPassed) {
     pugi::xml_node trouble = test.append_child(outcome == Outcome::kError ? "error" : "failure");
-    setAttribute(trouble, "type", rowOf(result.judgement.verdict).word);
+    setAttribute(trouble, "type", typeOf(result));
     setAttribute(trouble, "message", messageOf(result));
     trouble.text() = xmlText(detailsOf(result)).c_str();
   }

@@ -12,7 +12,8 @@ namespace scanner {
 /// One test suite: the scan. One test case for each plug-in and child, in the order of the results: `classname` is the
 /// bundle's folder, `name` the file's name and the child, `time` the seconds of the run.
 ///
-/// - A result that is not wanted is a failure of the verdict's type, one that could not be run an error.
+/// - A result that is not wanted is a failure, one that could not be run an error. Its type is the verdict's word; of a
+///   good verdict "flaky", "unexpected" or "findings".
 /// - A skipped plug-in is skipped, with its reason.
 /// - Whatever is wanted passes; system-out says so where the verdict is no good one (--expect, --baseline).
 /// - system-out has the steps with their times and, at the step in which it came, what the plug-in printed.

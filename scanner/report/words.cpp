@@ -12,12 +12,10 @@
 namespace scanner {
 namespace {
 
-/// How it ended before: "passed", "crashed at 5".
-std::string endBefore(const Comparison::Earlier& earlier) {
-  for (const VerdictRow& row : verdictTable()) {
-    if (row.isGood && earlier.verdict == row.word) return earlier.verdict;
-  }
-  return endInWords(earlier.verdict, earlier.step);
+bool isGoodWord(const std::string& verdict) {
+  const std::vector<VerdictRow>& rows = verdictTable();
+  return std::any_of(rows.begin(), rows.end(),
+                     [&verdict](const VerdictRow& row) { return row.isGood && verdict == row.word; });
 }
 
 /// "expected: hung (known), but crashed at 5"
@@ -45,8 +43,8 @@ std::string fileName(const std::string& path) {
   return plain.substr(plain.rfind('/') + 1);
 }
 
-std::string endInWords(const std::string& verdict, const std::optional<int>& step) {
-  return step ? fmt::format("{} at {}", verdict, *step) : verdict;
+std::string endInWords(const std::string& verdict, const std::optional<int>& step, const char* at) {
+  return step && !isGoodWord(verdict) ? fmt::format("{}{}{}", verdict, at, *step) : verdict;
 }
 
 std::string endsInWords(const Repetitions& repetitions) {
@@ -78,7 +76,8 @@ std::string changeInWords(const PluginResult& result) {
   const std::string word = changeWord(comparison.change);
   if (!comparison.earlier)
     return comparison.change == Comparison::Change::kNew ? word + ": it was not there before" : word;
-  const std::string before = fmt::format("{}: it was \"{}\" before", word, endBefore(*comparison.earlier));
+  const std::string before = fmt::format("{}: it was \"{}\" before", word,
+                                         endInWords(comparison.earlier->verdict, comparison.earlier->step));
   const bool isSame = comparison.earlier->verdict == rowOf(result.judgement.verdict).word;
   switch (comparison.change) {
     case Comparison::Change::kNew:

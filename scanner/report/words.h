@@ -13,8 +13,8 @@ namespace scanner {
 /// The last part of a path.
 std::string fileName(const std::string& path);
 
-/// "crashed at 5"; the verdict alone where there was no step.
-std::string endInWords(const std::string& verdict, const std::optional<int>& step);
+/// "crashed at 5"; the verdict alone where there was no step, and where it is a good one: that came after the last step.
+std::string endInWords(const std::string& verdict, const std::optional<int>& step, const char* at = " at ");
 
 /// "2 of 3 passed, 1 of 3 exited at 4"
 std::string endsInWords(const Repetitions& repetitions);

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <ctime>
 #include <filesystem>
+#include <limits>
 
 #include <CLI/CLI.hpp>
 #include <fmt/format.h>
@@ -25,6 +26,8 @@ namespace scanner {
 namespace {
 
 constexpr std::size_t kScansShown = 20;
+/// Below so many columns the verdicts do not stand below each other.
+constexpr std::size_t kNarrow = 60;
 
 int endWith(ScanStatus status, const std::string& sentence) {
   complain(sentence);
@@ -62,11 +65,14 @@ std::string changesInWords(const std::map<std::string, std::size_t>& changes) {
   return text;
 }
 
+/// How many columns a line may have: any number in a file or a pipe.
+std::size_t columns() {
+  return isatty(STDOUT_FILENO) != 0 ? textColumns(STDOUT_FILENO) : std::numeric_limits<std::size_t>::max();
+}
+
 /// A line, broken where the terminal ends; what follows is indented by `indent`.
 void print(const std::string& line, std::size_t indent) {
-  const std::string text = printable(line);
-  const bool isTerminal = isatty(STDOUT_FILENO) != 0;
-  std::printf("%s\n", isTerminal ? wrapped(text, textColumns(STDOUT_FILENO), indent).c_str() : text.c_str());
+  std::printf("%s\n", wrapped(printable(line), columns(), indent).c_str());
 }
 
 void printScans(const std::vector<EarlierScan>& scans) {
@@ -88,9 +94,11 @@ void printResults(const std::vector<EarlierResult>& results) {
                                         result.child ? std::to_string(*result.child) : "");
     if (key != last) print(name, 2);
     last = key;
-    print(fmt::format("  {}  {:<12} {:>9}  {}{}{}", timeInWords(result.time), result.verdict,
-                      durationInWords(result.wallSeconds), result.toolVersion,
-                      result.isFlaky ? "  flaky" : "", result.cause.empty() ? "" : "  " + result.cause),
+    const bool isNarrow = columns() < kNarrow;
+    print(fmt::format("  {}  {:<{}} {:>{}}  {}{}{}", timeInWords(result.time), result.verdict,
+                      isNarrow ? 0 : 12, durationInWords(result.wallSeconds), isNarrow ? 0 : 9,
+                      result.toolVersion, result.isFlaky ? "  flaky" : "",
+                      result.cause.empty() ? "" : "  " + result.cause),
           4);
   }
 }
@@ -135,7 +143,7 @@ int historyCommand(int argc, const char* const* argv) {
   app.footer(
       "Status: 0 something was shown, 2 wrong use or nothing to show, 3 the database cannot be read.\n"
       "A plug-in named \"history\" is scanned as ./history.");
-  app.add_option("PLUG-IN", plugin, "A path, or a part of one");
+  app.add_option("PLUG-IN", plugin, "A path, or a part of one")->type_name("");
   app.add_option("--cache", cache, "The database, instead of the one in the user's cache folder")
       ->type_name("FILE");
   int status = kScanAsWanted;

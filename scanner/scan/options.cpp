@@ -46,6 +46,9 @@ std::string checkSeconds(const std::string& text) {
   return isNumber && seconds > 0 ? "" : "\"" + text + "\" is no number of seconds above 0";
 }
 
+/// A whole number, of which the help does not say the range.
+CLI::Validator fromTo(int least, int most) { return CLI::Range(least, most).description(""); }
+
 }  // namespace
 
 std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& status) {
@@ -61,9 +64,10 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
   CLI::App app(kDescription, "vsttorture-scan");
   app.footer(kFooter);
   app.set_version_flag("--version", "vsttorture-scan " VSTTORTURE_VERSION, "Print the version and end");
-  app.add_option("PATH", options.paths, "Plug-ins, and folders that are searched for plug-ins");
+  app.add_option("PATH", options.paths, "Plug-ins, and folders that are searched for plug-ins")
+      ->type_name("");
   app.add_option("-j,--jobs", options.engine.jobs, "How many run at a time")
-      ->check(CLI::Range(1, 1024))
+      ->check(fromTo(1, 1024))
       ->type_name("N")
       ->capture_default_str();
   app.add_option("--step-limit", limits.stepInSeconds, "Seconds that one step may take")
@@ -75,12 +79,12 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
       ->type_name("SECONDS")
       ->capture_default_str();
   app.add_option("--memory", memoryInMiB, "MiB of memory that a run may use")
-      ->check(CLI::Range(1, 1 << 30))
+      ->check(fromTo(1, 1 << 30))
       ->type_name("MIB")
       ->capture_default_str();
   app.add_option("--repeat", options.repeat,
                  "Run each plug-in N times, from the second time on with other contents of fresh memory")
-      ->check(CLI::Range(1, 10000))
+      ->check(fromTo(1, 10000))
       ->type_name("N");
   app.add_option("--under", under, "Run each plug-in once more under memcheck, gdb or a COMMAND")
       ->type_name("TOOL");
@@ -88,8 +92,9 @@ std::optional<ScanOptions> readOptions(int argc, const char* const* argv, int& s
   app.add_option("--skip", options.skipFile, "Do not run the plug-ins in this list")->type_name("FILE");
   app.add_option("--expect", options.expectFile, "How each plug-in is expected to end")->type_name("FILE");
   app.add_option("--shard", shard, "Only part K of N of the plug-ins")->check(checkShard)->type_name("K/N");
-  app.add_option("--sandbox", sandbox, "auto, required or off")
-      ->check(CLI::IsMember({"auto", "required", "off"}))
+  app.add_option("--sandbox", sandbox,
+                 "Confine plug-ins in bubblewrap: auto (where that works), required or off")
+      ->check(CLI::IsMember({"auto", "required", "off"}).description(""))
       ->type_name("WHEN")
       ->capture_default_str();
   app.add_flag("--describe", options.describes, "Add each plug-in's description to its result");

@@ -45,7 +45,7 @@ std::optional<ReportOptions> readReportOptions(int argc, const char* const* argv
   ReportOptions options;
   CLI::App app(kDescription, "vsttorture-scan report");
   app.footer(kFooter);
-  app.add_option("FILE", options.files, "Recorded event streams")->required();
+  app.add_option("FILE", options.files, "Recorded event streams")->required()->type_name("");
   app.add_option("--json", options.jsonFile, "Write the merged events; - is standard output")
       ->type_name("FILE");
   addReportOptions(app, options.reports, options.baselineFile);

@@ -441,7 +441,7 @@ class Sorting(BrowserTest):
             0: ["known.so", "new.so", "still.so", "hangs.so", "old.so", "flaky.so", "mended.so", "Shell.so #7 Seventh",
                 "a10.so", "a9.so", "Shell.so"],
             1: by_name,
-            2: ["old.so", "hangs.so", "new.so", "known.so", "still.so"],
+            2: ["old.so", "flaky.so", "hangs.so", "new.so", "known.so", "still.so"],
             3: ["hangs.so", "new.so", "known.so", "still.so"],
             4: ["Shell.so", "still.so", "a10.so", "a9.so", "Shell.so #7 Seventh", "old.so", "mended.so", "known.so",
                 "new.so", "flaky.so", "hangs.so"],

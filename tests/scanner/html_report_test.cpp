@@ -215,6 +215,20 @@ TEST(HtmlReport, ADescriptionOfTheWrongFormDoesNoHarm) {
   }
 }
 
+TEST(HtmlReport, APassThatIsAFailureHasItsReasonInTheRowAndNoStepBefore) {
+  ScanReport report;
+  report.results = {passed("/lib/a.so")};
+  PluginResult& result = report.results[0];
+  result.isWanted = false;
+  result.diagnosis.emplace();
+  result.diagnosis->tool = "memcheck";
+  result.diagnosis->findings = {{"InvalidRead", "Invalid read of size 4", {}}};
+  result.comparison = Comparison{Comparison::Change::kNew, Comparison::Earlier{"passed", 65, 1795302622}};
+  const std::string html = htmlReport(report);
+  EXPECT_THAT(html, HasSubstr("<td role=\"cell\">1 finding of memcheck: Invalid read of size 4</td>"));
+  EXPECT_THAT(html, HasSubstr("new: it did not fail in this way before; earlier: passed, 2026-11-21"));
+}
+
 TEST(HtmlReport, OfAPassItShowsTheBeginningOfWhatWasPrinted) {
   ScanReport report;
   report.results = {passed("/lib/a.so")};

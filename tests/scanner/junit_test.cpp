@@ -134,12 +134,12 @@ TEST(JunitReport, WhatWasSkippedHasItsReasonAndWhatWasNotRunIsAnError) {
 }
 
 TEST(JunitReport, APassThatIsNotWhatWasExpectedFails) {
-  PluginResult result = resultOf("/lib/a.so", Verdict::kPassed);
+  PluginResult result = resultOf("/lib/a.so", Verdict::kPassed, 65);
   result.expected = Expectation{"crashed", 5, "known", false};
   result.isWanted = false;
   const Junit junit({result}, 1);
   const pugi::xml_node failure = junit.test().child("failure");
-  EXPECT_STREQ(failure.attribute("type").value(), "passed");
+  EXPECT_STREQ(failure.attribute("type").value(), "unexpected");
   EXPECT_STREQ(failure.attribute("message").value(), "expected: crashed at 5 (known), but passed");
 }
 
@@ -198,6 +198,7 @@ TEST(JunitReport, APassInWhichAToolFoundSomethingFailsWithWhatItFound) {
   result.diagnosis->findings = {{"UninitValue", "Use", {}, false},
                                 {"InvalidRead", "Invalid read of size 4", {}}};
   const Junit junit({result}, 1);
+  EXPECT_STREQ(junit.test().child("failure").attribute("type").value(), "findings");
   EXPECT_STREQ(junit.test().child("failure").attribute("message").value(),
                "1 finding of memcheck: Invalid read of size 4");
   EXPECT_THAT(
