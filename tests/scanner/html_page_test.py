@@ -735,6 +735,16 @@ class Looks(BrowserTest):
             self.assertEqual(beyond, [])
             self.open_all()
 
+    def test_a_long_folder_is_to_be_seen_to_its_end(self):
+        folder = "/builds" + "/a-folder-with-a-long-name" * 6
+        for width in (WIDE, NARROW):
+            with self.subTest(width=width):
+                self.open([plugin_ended(f"{folder}/release/a.so"), plugin_ended("/lib/a.so")], width=width)
+                cut = self.run_script("return [...document.querySelectorAll('.row > td')].filter((cell) => "
+                                      "cell.scrollWidth > cell.clientWidth || cell.scrollHeight > cell.clientHeight + 1)"
+                                      ".map((cell) => cell.textContent)")
+                self.assertEqual(cut, [])
+
     def test_assistive_technology_finds_a_table_and_a_name_for_each_control(self):
         self.open()
         # The rows are there when they have been drawn.
