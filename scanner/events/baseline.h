@@ -30,9 +30,9 @@ class Baseline {
   /// Finds those plug-ins of a scan that had another path then. `runs` are all that the scan has found; their children
   /// do not matter, since they go with their shell. Call it before the other functions.
   ///
-  /// A plug-in whose path the baseline does not have is compared with one whose path this scan does not have, and
-  /// which ends with the same file name: with the one whose path agrees the furthest from its end. Where that is not
-  /// one alone, on either side, it is compared with none.
+  /// A plug-in whose path the baseline does not have is compared with one of the same file name there whose path this
+  /// scan does not have. Of several it is the one whose path has the most last parts in common with it; where two have
+  /// as many, on either side, it is compared with none.
   void locate(const std::vector<Run>& runs);
 
   /// Fills PluginResult::comparison. A result that is not wanted becomes wanted where it is known from the baseline:

@@ -139,7 +139,7 @@ class Scan {
     started.shard = options.shard;
     started.jobs = options.engine.jobs;
     started.limits = options.engine.limits;
-    started.sandbox = !engine                 ? "none (nothing has to be run)"
+    started.sandbox = !engine                 ? "none (not needed: nothing has to be run)"
                       : engine->isSandboxed() ? "bubblewrap"
                                               : "none (" + engine->whyNotSandboxed() + ")";
     started.plugins = total;
