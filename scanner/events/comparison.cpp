@@ -33,8 +33,8 @@ bool isUnderTheSameTool(const PluginResult& now, const PluginResult& earlier) {
   return now.diagnosis && earlier.diagnosis && now.diagnosis->tool == earlier.diagnosis->tool;
 }
 
-/// Whether there are no more findings of any kind than before. Their texts and frames say less: they change with every
-/// build.
+/// Whether there are no more findings of any kind than before. Their texts and frames say less: they change
+/// with every build.
 bool areFindingsKnown(const PluginResult& now, const PluginResult& earlier) {
   if (!isUnderTheSameTool(now, earlier)) return false;
   const std::map<std::string, std::size_t> before = findingsByKind(earlier);

@@ -13,8 +13,8 @@ namespace scanner {
 /// The names of an event's members with their values as JSON, in their order.
 using EventMembers = std::vector<std::pair<std::string, std::string>>;
 
-/// Takes a line apart that eventLine() has written, without its newline. Nothing for any other text: what is no JSON
-/// object, or has blanks between its parts.
+/// Takes a line apart that eventLine() has written, without its newline. Nothing for any other text: what is
+/// no JSON object, or has blanks between its parts.
 std::optional<EventMembers> eventMembers(std::string_view line);
 
 }  // namespace scanner

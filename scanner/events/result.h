@@ -103,8 +103,8 @@ struct PluginResult {
   std::optional<Comparison> comparison = {};    ///< Where there is something to compare with.
   std::optional<Diagnosis> diagnosis = {};      ///< With --under.
   std::optional<Shrunk> shrunk = {};            ///< With --shrink, for a run that failed.
-  /// Of a remembered result that is only written again: its event as it was. Then of the members above those are set
-  /// that differ from scan to scan, and the verdict.
+  /// Of a remembered result that is only written again: its event as it was. Then of the members above those
+  /// are set that differ from scan to scan, and the verdict.
   std::optional<EventMembers> recorded = {};
 
   /// Whether its repetitions did not all end in the same way.

@@ -11,7 +11,8 @@ namespace scanner {
 /// One element with everything that is known of it.
 std::string htmlDetails(const PluginResult& result);
 
-/// Whether it does not always end the same way: in the repetitions of this scan, or compared with an earlier one.
+/// Whether it does not always end the same way: in the repetitions of this scan, or compared with an earlier
+/// one.
 bool endsDifferently(const PluginResult& result);
 
 }  // namespace scanner

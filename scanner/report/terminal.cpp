@@ -35,7 +35,8 @@ std::size_t columnsOf(const std::string& text) {
   return columns;
 }
 
-/// The byte behind the characters that fit into so many columns, with the marks that are put on the last of them.
+/// The byte behind the characters that fit into so many columns, with the marks that are put on the last of
+/// them.
 std::size_t byteOf(const std::string& text, std::size_t columns) {
   std::size_t used = 0;
   for (std::size_t at = 0; at < text.size();) {

@@ -68,20 +68,21 @@ class TerminalReport {
 /// printable().
 std::string nameOf(const Run& run, bool withFolder);
 
-/// `text` on one line: control characters become "?", invisible ones "[U+202E]" and the like, and bytes that are no
-/// UTF-8 U+FFFD.
+/// `text` on one line: control characters become "?", invisible ones "[U+202E]" and the like, and bytes that
+/// are no UTF-8 U+FFFD.
 std::string printable(const std::string& text);
 
-/// `text`, which is printable(), with at most `columns` columns: its middle becomes "...". Ideographs and the like take
-/// two columns.
+/// `text`, which is printable(), with at most `columns` columns: its middle becomes "...". Ideographs and the
+/// like take two columns.
 std::string shortened(const std::string& text, std::size_t columns);
 
 /// `text` in lines of at most `columns` columns, broken at blanks where possible; each line but the first
 /// begins with `indent` blanks.
 std::string wrapped(const std::string& text, std::size_t columns, std::size_t indent);
 
-/// The command as a shell takes it, each argument quoted where that is needed: one that printable() would change by the
-/// numbers of its bytes ($'\033'), so that the command can be shown and still names the same file.
+/// The command as a shell takes it, each argument quoted where that is needed: one that printable() would
+/// change by the numbers of its bytes ($'\033'), so that the command can be shown and still names the same
+/// file.
 std::string shellCommand(const std::vector<std::string>& command);
 
 }  // namespace scanner

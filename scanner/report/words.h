@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// What several reports say of a result in the same words. Texts in them are not yet made fit for the report's form.
+// What several reports say of a result in the same words. Texts in them are not yet made fit for the form of
+// the report.
 #pragma once
 
 #include <cstdint>
@@ -13,7 +14,8 @@ namespace scanner {
 /// The last part of a path.
 std::string fileName(const std::string& path);
 
-/// "crashed at 5"; the verdict alone where there was no step, and where it is a good one: that came after the last step.
+/// "crashed at 5"; the verdict alone where there was no step, and where it is a good one: that came after the
+/// last step.
 std::string endInWords(const std::string& verdict, const std::optional<int>& step, const char* at = " at ");
 
 /// "2 of 3 passed, 1 of 3 exited at 4"
@@ -25,8 +27,8 @@ std::string changeWord(Comparison::Change change);
 /// What has changed, in a sentence that begins with changeWord(); empty for nothing.
 std::string changeInWords(const PluginResult& result);
 
-/// In one line what makes it a failure, all there is: its repetitions, what was expected, its cause, what a tool has
-/// found. Empty where nothing is known but its verdict.
+/// In one line what makes it a failure, all there is: its repetitions, what was expected, its cause, what a
+/// tool has found. Empty where nothing is known but its verdict.
 std::string whyNotWanted(const PluginResult& result);
 
 /// "640 ns", "38 ms", "1.2 s", "2 min 5 s", "1 h 2 min"; "0 s" for what is not above 0.

@@ -60,8 +60,8 @@ class Remembering {
 
  private:
   [[nodiscard]] Circumstances circumstancesOf(const Run& run);
-  /// Fills in the event of a remembered result, read or, where it is only written again, unread. False where it is no
-  /// longer there or not what the table says.
+  /// Fills in the event of a remembered result, read or, where it is only written again, unread. False where
+  /// it is no longer there or not what the table says.
   bool fillFromEvent(PluginResult& result, const Known& known, bool isRead);
   /// What the tool said the last time; scans without it may lie between. `earlier`: the latest first.
   std::optional<Diagnosis> lastDiagnosis(const std::vector<Remembered>& earlier, const std::string& tool);

@@ -361,8 +361,8 @@ class Scan {
     if (isNobodyLeft() && engine) engine->stop();
   }
 
-  /// With nobody left to read what comes out, there is nothing to run for. A program that has read the events is all
-  /// that they were for; a full disk leaves the report for people.
+  /// With nobody left to read what comes out, there is nothing to run for. A program that has read the events
+  /// is all that they were for; a full disk leaves the report for people.
   [[nodiscard]] bool isNobodyLeft() const {
     if (wholeReports.areWanted()) return false;
     const bool hasEvents = !options.jsonFile.empty() && json.problem().empty();

@@ -12,7 +12,8 @@ namespace scanner {
 /// What the report for people may do on this descriptor: whether it is a terminal, how wide, with which colours.
 TerminalOptions terminalOptions(const ScanOptions& options, int descriptor);
 
-/// How many columns a line may have there: those of the terminal as wide as it is now, 100 where there is none.
+/// How many columns a line may have there: those of the terminal as wide as it is now, 100 where there is
+/// none.
 unsigned textColumns(int descriptor);
 
 /// Writes texts whole, until that fails once.

@@ -123,7 +123,8 @@ class Torture(Example):
         for name in ("mine", "scan.html"):
             (reports / name).write_text("old")
         self.torture()
-        self.assertEqual(sorted(path.name for path in reports.iterdir()), ["junit.xml", "mine", "scan.html", "scan.jsonl"])
+        self.assertEqual(sorted(path.name for path in reports.iterdir()),
+                         ["junit.xml", "mine", "scan.html", "scan.jsonl"])
         self.assertNotEqual((reports / "scan.html").read_text(), "old")
         self.plugin.unlink()
         self.torture()

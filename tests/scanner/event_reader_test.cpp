@@ -348,7 +348,7 @@ TEST(ReadEvent, NoPieceOfALineIsAnEvent) {
     EXPECT_FALSE(readEvent(line.substr(0, size))) << size;
 }
 
-// ---- Events that are written again, unread -----------------------------------------------------------------
+// ---- Events that are written again, unread ----------------------------------------------------------------
 
 TEST(EventMembers, TakesALineApartAndKeepsItsTexts) {
   EXPECT_THAT(eventMembers(R"({"a":1,"b":{"c":[1,{"d":"}"}],"e":","},"f":"\\\",\"g\":","h":null})"),

@@ -741,8 +741,8 @@ class Looks(BrowserTest):
             with self.subTest(width=width):
                 self.open([plugin_ended(f"{folder}/release/a.so"), plugin_ended("/lib/a.so")], width=width)
                 cut = self.run_script("return [...document.querySelectorAll('.row > td')].filter((cell) => "
-                                      "cell.scrollWidth > cell.clientWidth || cell.scrollHeight > cell.clientHeight + 1)"
-                                      ".map((cell) => cell.textContent)")
+                                      "cell.scrollWidth > cell.clientWidth || "
+                                      "cell.scrollHeight > cell.clientHeight + 1).map((cell) => cell.textContent)")
                 self.assertEqual(cut, [])
 
     def test_assistive_technology_finds_a_table_and_a_name_for_each_control(self):

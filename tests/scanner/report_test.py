@@ -347,7 +347,8 @@ class Baselines(ReportTest):
         changes = {(os.path.basename(event["plugin"]["bundle"]), event["plugin"]["child"]):
                    (event["comparison"]["change"], event["comparison"]["earlier"] is not None)
                    for event in events if event["event"] == "plugin_ended"}
-        self.assertEqual(changes, {("faulty.so", None): ("still_failing", True), ("open_crashes.so", None): ("new", False),
+        self.assertEqual(changes, {("faulty.so", None): ("still_failing", True),
+                                   ("open_crashes.so", None): ("new", False),
                                    **{("shell.so", child): ("none", True) for child in (None, 1001, 1234, -7)}})
         self.assertEqual(events[0]["notes"], [f"gone since the baseline: {self.folder}/job1/build/{EFFECT}"])
         # A file that is named is found, too.
