@@ -12,7 +12,6 @@ namespace {
 
 using doubles::RecordingCoreFoundation;
 using testing::ElementsAre;
-using testing::IsEmpty;
 
 CFStringRef makeString(const char* text) { return CFStringCreateWithCString(nullptr, text, 0x08000100); }
 
@@ -102,19 +101,5 @@ INSTANTIATE_TEST_SUITE_P(
                     Misuse{"AnotherOwner", [] { CFRelease(CFLocaleGetIdentifier(CFLocaleCopyCurrent())); },
                            "CFRelease of another owner's string \"en_US\""}),
     [](const auto& test) { return test.param.name; });
-
-TEST(RecordingCoreFoundation, RecordsInTheLatestOneThatExists) {
-  const RecordingCoreFoundation outer;
-  {
-    const RecordingCoreFoundation inner;
-    CFLocaleCopyCurrent();
-    EXPECT_THAT(inner.calls(), ElementsAre("CFLocaleCopyCurrent() -> locale"));
-  }
-  EXPECT_THAT(outer.calls(), IsEmpty());
-}
-
-TEST(RecordingCoreFoundationDeathTest, EndsTheProcessWhenThereIsNone) {
-  EXPECT_DEATH(CFLocaleCopyCurrent(), "while no RecordingCoreFoundation exists");
-}
 
 }  // namespace

@@ -4,39 +4,18 @@
 #include <cstdlib>
 #include <cstring>
 #include <ostream>
-#include <sstream>
 #include <string>
 
+#include "flight_recorder/opcode_names.h"
 #include "tests/shared/request.h"
 
 namespace doubles {
 namespace {
 
-/// The names of opcodes 0 to 79, in this order.
-constexpr const char* kOpcodeNames =
-    "effOpen effClose effSetProgram effGetProgram effSetProgramName effGetProgramName effGetParamLabel "
-    "effGetParamDisplay effGetParamName effGetVu effSetSampleRate effSetBlockSize effMainsChanged "
-    "effEditGetRect effEditOpen effEditClose effEditDraw effEditMouse effEditKey effEditIdle effEditTop "
-    "effEditSleep effIdentify effGetChunk effSetChunk effProcessEvents effCanBeAutomated "
-    "effString2Parameter effGetNumProgramCategories effGetProgramNameIndexed effCopyProgram "
-    "effConnectInput effConnectOutput effGetInputProperties effGetOutputProperties effGetPlugCategory "
-    "effGetCurrentPosition effGetDestinationBuffer effOfflineNotify effOfflinePrepare effOfflineRun "
-    "effProcessVarIo effSetSpeakerArrangement effSetBlockSizeAndSampleRate effSetBypass effGetEffectName "
-    "effGetErrorText effGetVendorString effGetProductString effGetVendorVersion effVendorSpecific "
-    "effCanDo effGetTailSize effIdle effGetIcon effSetViewPosition effGetParameterProperties "
-    "effKeysRequired effGetVstVersion effEditKeyDown effEditKeyUp effSetEditKnobMode "
-    "effGetMidiProgramName effGetCurrentMidiProgram effGetMidiProgramCategory effHasMidiProgramsChanged "
-    "effGetMidiKeyName effBeginSetProgram effEndSetProgram effGetSpeakerArrangement effShellGetNextPlugin "
-    "effStartProcess effStopProcess effSetTotalSampleToProcess effSetPanLaw effBeginLoadBank "
-    "effBeginLoadProgram effSetProcessPrecision effGetNumMidiInputChannels effGetNumMidiOutputChannels ";
-
 /// "opcode N" for a number without a name.
 std::string opcodeName(VstInt32 opcode) {
-  std::istringstream names(kOpcodeNames);
-  std::string name;
-  for (VstInt32 i = 0; i <= opcode && names >> name; ++i) {
-  }
-  return opcode >= 0 && names ? name : "opcode " + std::to_string(opcode);
+  const char* const name = effectOpcodeName(opcode);
+  return name != nullptr ? name : "opcode " + std::to_string(opcode);
 }
 
 bool sameBits(float a, float b) { return std::memcmp(&a, &b, sizeof a) == 0; }
