@@ -28,8 +28,8 @@ class LoadedPlugin {
   }
 
   /// Calls the entry point, which must exist. Null when the plug-in returns no instance.
-  AEffect* callEntry() const {
-    const auto entry = reinterpret_cast<PluginEntryProc>(dlsym(module, "VSTPluginMain"));
+  AEffect* callEntry(const char* name = "VSTPluginMain") const {
+    const auto entry = reinterpret_cast<PluginEntryProc>(dlsym(module, name));
     if (entry == nullptr) throw std::logic_error(dlerror());
     return entry(answerPlugin);
   }
