@@ -55,15 +55,6 @@ INSTANTIATE_TEST_SUITE_P(Paths, IsBlackListedTest,
                          }),
                          [](const auto& tested) { return tested.param.name; });
 
-TEST(BundleFileName, IsTheTextBehindTheLastSlash) {
-  EXPECT_EQ(bundleFileName("/x/y.vst"), "y.vst");
-  EXPECT_EQ(bundleFileName("/y"), "y");
-  EXPECT_EQ(bundleFileName("y.vst"), "");
-  EXPECT_EQ(bundleFileName("/x/"), "");
-  EXPECT_EQ(bundleFileName("/"), "");
-  EXPECT_EQ(bundleFileName("y"), "");
-}
-
 struct ComparisonCase {
   const char* name;
   const char* a;

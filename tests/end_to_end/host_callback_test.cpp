@@ -62,11 +62,7 @@ TEST_P(HostCallback, AnswersTheSameInEveryPlaceExceptForTheLanguage) {
 INSTANTIATE_TEST_SUITE_P(
     Locales, HostCallback,
     testing::Values(Locale{"Japanese", {{"LC_ALL", "ja_JP.UTF-8"}}, "6"},
-                    Locale{"German", {{"LC_ALL", "de"}}, "2"},
-                    Locale{"Brazilian", {{"LC_ALL", "pt_BR"}}, "1"}, Locale{"C", {{"LC_ALL", "C"}}, "1"},
-                    Locale{"FrenchMessages", {{"LC_ALL", ""}, {"LC_MESSAGES", "fr_CA"}}, "3"},
-                    Locale{"Italian", {{"LC_ALL", ""}, {"LANG", "it_IT@euro"}}, "4"},
-                    Locale{"Spanish", {{"LC_ALL", "es_MX"}, {"LANG", "de_DE"}}, "5"}),
+                    Locale{"FrenchMessages", {{"LC_ALL", ""}, {"LC_MESSAGES", "fr_CA"}}, "3"}),
     [](const auto& instance) { return instance.param.name; });
 
 }  // namespace

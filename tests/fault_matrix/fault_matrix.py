@@ -20,7 +20,8 @@ import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "shared"))
 from program_run import as_printed, run_program, take_usual_start, try_plugin  # noqa: E402
-from rows import ALL_STEPS, FLOOD, FIRST_DRAWN, LAST_DRAWN, PHASE_OF_DRAWN, TEXT_WITHOUT_END, all_rows  # noqa: E402
+from rows import (ALL_STEPS, FLOOD, FIRST_DRAWN, LAST_DRAWN, LAST_WORDS, PHASE_OF_DRAWN, TEXT_WITHOUT_END,  # noqa: E402
+                  all_rows)
 from sanitizers import kinds_of, options_for, proofs, reason_to_leave_out, unwanted_report  # noqa: E402
 
 LIMIT_IN_SECONDS = 20  # As the machine may be busy.
@@ -59,7 +60,8 @@ def without_noise(row, output):
     if "flood_stdout" in kinds and output.count(FLOOD) < 65536:
         return None
     if {"print", "print_when_unloaded", "wcout"}.intersection(kinds):
-        if output.count(TEXT_WITHOUT_END) != 1:
+        is_too_late = "print" in kinds and LAST_WORDS + TEXT_WITHOUT_END in output
+        if output.count(TEXT_WITHOUT_END) != 1 or is_too_late:
             return None
         output = output.replace(TEXT_WITHOUT_END, "")
     if "daemon_flooding_stdout" in kinds:

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
 // CFBundle on real shared objects: which file is loaded, what is found in it, and the line that each refusal
 // leaves.
-#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
@@ -11,9 +10,7 @@
 #include <dlfcn.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/socket.h>
 #include <sys/stat.h>
-#include <sys/un.h>
 #include <unistd.h>
 
 #include "platform/core_foundation.h"
@@ -22,7 +19,6 @@
 
 namespace {
 
-using testing::AllOf;
 using testing::HasSubstr;
 using testing::StartsWith;
 
@@ -189,46 +185,8 @@ TEST_F(CFBundleLoads, WithExceptionsOfStaticConstructorsReachingTheCaller) {
   EXPECT_EXIT(load(), testing::ExitedWithCode(42), "^$");
 }
 
+// All other reasons not to load a file are in tests/end_to_end/bad_input_test.cpp.
 using CFBundleRefuses = CFBundle;
-
-TEST_F(CFBundleRefuses, PathsWhereNothingIs) {
-  files.write("file", "");
-  std::filesystem::create_symlink("missing", files.path("link.so"));
-  const std::string tooLong = std::string(4999, 'a');
-  const CurrentDirectory here(files.path(""));
-  for (const auto& [path, reason] :
-       std::vector<std::pair<std::string, std::string>>{{"missing.so", "No such file or directory"},
-                                                        {"link.so", "No such file or directory"},
-                                                        {"libm.so.6", "No such file or directory"},
-                                                        {"file/a.so", "Not a directory"},
-                                                        {tooLong, "File name too long"}})
-    EXPECT_EQ(refusalOf(path), files.path(path) + ": " + reason);
-}
-
-TEST_F(CFBundleRefuses, WhatIsNeitherFileNorFolderWithoutWaitingForIt) {
-  ASSERT_EQ(mkfifo(files.path("fifo").c_str(), 0600), 0);
-  sockaddr_un address{};
-  address.sun_family = AF_UNIX;
-  std::strcpy(address.sun_path, "socket");  // There is no room for the whole path of every folder.
-  const int listener = socket(AF_UNIX, SOCK_STREAM, 0);
-  {
-    const CurrentDirectory here(files.path(""));
-    ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
-  }
-  for (const std::string& path : {files.path("fifo"), files.path("socket"), std::string("/dev/zero")})
-    EXPECT_EQ(refusalOf(path), path + " is neither a file nor a directory");
-  close(listener);
-}
-
-TEST_F(CFBundleRefuses, FilesThatTheDynamicLoaderRefusesForItsReason) {
-  const std::string empty = files.write("empty.so", "");
-  EXPECT_EQ(refusalOf(empty), empty + ": file too short");
-  const std::string text = files.write("text.so", std::string(2000, 'x'));
-  EXPECT_THAT(refusalOf(text), AllOf(HasSubstr(text), HasSubstr("ELF header")));
-  EXPECT_THAT(refusalOf("/proc/self/exe"), HasSubstr("executable"));
-  const std::string undefined = files.copy(UNDEFINED_SYMBOL, "undefined.so");
-  EXPECT_EQ(refusalOf(undefined), undefined + ": undefined symbol: thisFunctionExistsNowhere");
-}
 
 TEST_F(CFBundleRefuses, AModuleOfTheOtherWordSizeNamingBothArchitectures) {
   std::ostringstream content;
@@ -240,11 +198,6 @@ TEST_F(CFBundleRefuses, AModuleOfTheOtherWordSizeNamingBothArchitectures) {
   EXPECT_EQ(refusalOf(files.path("ProM.vst")), executable + " is for " +
                                                    (sizeof(void*) == 8 ? "i386" : "x86_64") +
                                                    ", this program is for " + kThisProgram);
-}
-
-TEST_F(CFBundleRefuses, ANameWithControlCharactersInOneLine) {
-  EXPECT_THAT(refusalOf(files.write("two\nlines\x7F.so", "no plug-in")),
-              AllOf(HasSubstr("/two lines .so"), HasSubstr("too short")));
 }
 
 TEST_F(CFBundleRefuses, ABrokenFileAtEveryLoadAndFindsNothingInIt) {
