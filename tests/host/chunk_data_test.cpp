@@ -133,24 +133,11 @@ TEST_F(ChunkData, OfAPresetIsPassedOnWithIndex1WhateverTheAnswer) {
   EXPECT_THAT(requests(), ElementsAre(setChunk(1, std::string("p\0q", 3)), setChunk(1, "x")));
 }
 
-TEST_F(ChunkData, OfABankIsFollowedByAWalkThroughTheProgramsIfTheyHaveNoNamesByIndex) {
+TEST_F(ChunkData, OfABankIsPassedOnWithIndex0AndThenTheNamesOfTheProgramsAreCollected) {
   effect.setPrograms({{"A", {0.5f}}, {"B", {0.5f}}, {"C", {0.5f}}});
   openWithChunks();
-  effect.currentProgram = 1;
   give("bank", kWholeBank);
-  EXPECT_EQ(requests(), inOrder({{setChunk(0, "bank"), doubles::programNameIndexed(0)},
-                                 asksProgram(),
-                                 asksName(),
-                                 readsParameters(1),  // the present state
-                                 selects(0),
-                                 asksName(),
-                                 selects(1),
-                                 asksName(),
-                                 selects(2),
-                                 asksName(),
-                                 selects(1),
-                                 keepsName(),
-                                 readsParameters(1)}));
+  EXPECT_EQ(requests().at(0), setChunk(0, "bank"));
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("A", "B", "C"));
 }
 

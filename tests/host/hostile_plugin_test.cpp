@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: MIT
-// Plug-ins whose counts, current program, names and bank data are wrong, or change while the host works. The
-// program reads and writes none of its own memory out of bounds, which the address sanitizer watches.
+// Plug-ins whose counts, current program and bank data are wrong, or change while the host works. The program
+// reads and writes none of its own memory out of bounds, which the address sanitizer watches.
 #include <climits>
 #include <cstdint>
 #include <cstring>
@@ -307,30 +307,6 @@ TEST_F(HostilePlugin, APluginThatNeverSelectsAnythingIsSavedWithTheSameProgramIn
   effect.ignore(effSetProgram);
   EXPECT_EQ(inHex(save(kBank)),
             inHex(bank({program("A", {kHalf}), program("A", {kHalf}), program("A", {kHalf})})));
-}
-
-// ---- Names
-
-// 256 bytes fill the whole buffer, without a zero byte.
-TEST_F(HostilePlugin, NamesThatFillTheBufferAreSavedWithTheirFirst27Characters) {
-  effect.setPrograms({{"A", {0.5f}}});
-  open();
-  effect.setUnterminatedText(effGetProgramName, 256, 'x');
-  EXPECT_EQ(inHex(save(kBank)), inHex(bank({program(std::string(27, 'x'), {kHalf})})));
-  effect.aeffect.flags = 32;
-  EXPECT_EQ(inHex(save(kProgram)), inHex(preset_bytes::programChunk(std::string(27, 'x'), "")));
-}
-
-// The store has room for 63 characters: a longer name never compares equal and is sent again.
-TEST_F(HostilePlugin, ANameLongerThanTheStoreHoldsIsSentAgainAfterTheWalk) {
-  effect.setPrograms({{std::string(63, 'x'), {}}});
-  open();
-  save(kBank);
-  EXPECT_TRUE(effect.requestsOf(effSetProgramName).empty());
-  effect.setPrograms({{std::string(64, 'x'), {}}});
-  save(kBank);
-  EXPECT_THAT(effect.requestsOf(effSetProgramName),
-              testing::ElementsAre(doubles::setProgramName(std::string(24, 'x'))));
 }
 
 // ---- Strides

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: MIT
 // VSTWrapper::loadFromFXBData and restoreProgramSettings: programs and banks with parameter values.
 #include <cstdint>
-#include <cstring>
 #include <string>
 #include <vector>
 
@@ -99,39 +98,6 @@ TEST_F(LoadProgram, RestoresNoBlockWithOtherMagics) {
   for (const char* formMagic : {"kCxF", "FxBk", "FPCh"}) EXPECT_FALSE(restore(with(good, 8, formMagic)));
   EXPECT_THAT(requests(), IsEmpty());
 }
-
-// ---- Values
-
-struct LoadedValue {
-  std::string name;
-  std::uint32_t bits;
-};
-
-class LoadedValueTest : public PresetTest, public testing::WithParamInterface<LoadedValue> {};
-
-TEST_P(LoadedValueTest, ReachesThePluginWithItsBits) {
-  effect.setPrograms({{"Init", {0.75f}}});
-  open();
-  EXPECT_TRUE(load(program("Init", {GetParam().bits})));
-  ASSERT_THAT(effect.parameterWrites(), testing::SizeIs(1));
-  std::uint32_t bits = 0;
-  std::memcpy(&bits, &effect.parameterWrites()[0].opt, sizeof bits);
-  EXPECT_EQ(bits, GetParam().bits);
-}
-
-INSTANTIATE_TEST_SUITE_P(Bits, LoadedValueTest,
-                         testing::Values(LoadedValue{"NegativeZero", 0x80000000},
-                                         LoadedValue{"SmallestDenormal", 0x00000001},
-                                         LoadedValue{"Infinity", 0x7F800000},
-                                         LoadedValue{"QuietNaN", 0x7FC00001},
-                                         LoadedValue{"SignallingNaNBeforeItIsReversed", 0x0100A07F}),
-                         host_tests::nameOfCase<LoadedValue>);
-
-// An x87 register, through which floats pass on 32-bit x86, makes a signalling NaN quiet.
-#if !defined(__i386__)
-INSTANTIATE_TEST_SUITE_P(SignallingNaN, LoadedValueTest, testing::Values(LoadedValue{"Negative", 0xFF800001}),
-                         host_tests::nameOfCase<LoadedValue>);
-#endif
 
 // ---- Banks
 

@@ -272,25 +272,6 @@ TEST_F(VSTWrapperLock, CanBeTakenAgainFromInsideThePlugin) {
   EXPECT_EQ(lockState(), kFree);
 }
 
-TEST_F(VSTWrapperLock, MakesASecondThreadsReadingAndSettingWaitUntilTheFirstIsDone) {
-  const std::function<void()> actions[] = {[this] { wrapper->getParameter(1); },
-                                           [this] { wrapper->setParameter(1, 0.8f); }};
-  for (const auto& action : actions) {
-    effect.forget();
-    std::unique_ptr<ObservedThread> second;
-    effect.onRequest = [&](const Request& request) {
-      if (second != nullptr || request.index != 0) return;
-      second = std::make_unique<ObservedThread>(action);
-      EXPECT_TRUE(second->isSeenAsleep());
-      EXPECT_THAT(effect.requests(), ElementsAre(getParameterOf(0)));
-    };
-    wrapper->getParameter(0);
-    ASSERT_NE(second, nullptr);
-    second->join();
-    EXPECT_EQ(effect.requests().at(1), getParameterOf(1));
-  }
-}
-
 // ---- Name, unit and value as text
 
 struct TextCase {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: MIT
-// The fields of preset and bank data, and what can be told from the data alone.
+// Byte order and names of preset and bank data, and what can be told from the data alone.
 #include <cstdint>
 #include <cstring>
 #include <string>
@@ -13,7 +13,6 @@ namespace {
 
 using preset_bytes::header;
 using preset_bytes::hex;
-using preset_bytes::inHex;
 
 TEST(VstSwap, ReversesTheFourBytes) {
   EXPECT_EQ(vst_swap(0x01020304), 0x04030201);
@@ -26,22 +25,6 @@ TEST(VstSwapFloat, ReversesTheFourBytesAlsoToASignallingNaN) {
   const std::uint32_t bits = 0x0100A07F;
   std::memcpy(&number, &bits, sizeof number);
   EXPECT_EQ(vst_swapFloat(number), 0x7FA00001);
-}
-
-TEST(PresetFields, AreBigEndianAndNeedNoAlignment) {
-  std::string bytes = hex("AA FFFFFFFE C0000000 AA");
-  EXPECT_EQ(readWord(&bytes[1]), -2);
-  EXPECT_EQ(readFloat(&bytes[5]), -2.0f);
-  writeWord(&bytes[1], 0x43636E4B);
-  writeFloat(&bytes[5], 0.5f);
-  EXPECT_EQ(inHex(bytes), "AA43636E 4B3F0000 00AA");
-}
-
-TEST(ReadProgramName, EndsAtTheFirstZeroByteOrTheEndOfItsField) {
-  const std::string before(28, '#');
-  EXPECT_EQ(readProgramName((before + "Init" + std::string(24, '\0')).data()), "Init");
-  EXPECT_EQ(readProgramName((before + std::string(28, '\0')).data()), "");
-  EXPECT_EQ(readProgramName((before + std::string(28, 'n') + "more").data()), std::string(28, 'n'));
 }
 
 TEST(WriteProgramName, Writes28BytesWithAtMost27CharactersAndNoMore) {

@@ -122,37 +122,45 @@ TEST_F(SaveToFXBData, TheFlagsDecideBetweenTheForms) {
   EXPECT_EQ(save(kBank).substr(8, 4), "FBCh");
 }
 
-struct SavedValue {
+// ---- Values
+
+struct ValueBits {
   std::string name;
   std::uint32_t bits;
 };
 
-class SaveToFXBDataValue : public PresetTest, public testing::WithParamInterface<SavedValue> {};
+class PresetValue : public PresetTest, public testing::WithParamInterface<ValueBits> {};
 
-TEST_P(SaveToFXBDataValue, HasTheBitsThatThePluginHolds) {
+TEST_P(PresetValue, IsSavedAndLoadedWithItsBits) {
+  std::uint32_t bits = GetParam().bits;
   float value = 0.0f;
-  std::memcpy(&value, &GetParam().bits, sizeof value);
+  std::memcpy(&value, &bits, sizeof value);
   effect.setPrograms({{"Init", {value}}});
   open();
-  EXPECT_EQ(inHex(save(kProgram).substr(56)), inHex(preset_bytes::word(GetParam().bits)));
+  const std::string saved = save(kProgram);
+  EXPECT_EQ(inHex(saved.substr(56)), inHex(preset_bytes::word(bits)));
+  effect.setPrograms({{"Init", {0.75f}}});
+  EXPECT_TRUE(load(saved));
+  ASSERT_THAT(effect.parameterWrites(), testing::SizeIs(1));
+  bits = 0;
+  std::memcpy(&bits, &effect.parameterWrites()[0].opt, sizeof bits);
+  EXPECT_EQ(bits, GetParam().bits);
 }
 
-INSTANTIATE_TEST_SUITE_P(Bits, SaveToFXBDataValue,
-                         testing::Values(SavedValue{"NegativeZero", 0x80000000},
-                                         SavedValue{"SmallestDenormal", 0x00000001},
-                                         SavedValue{"NegativeInfinity", 0xFF800000},
-                                         SavedValue{"QuietNaN", 0x7FC00001},
+INSTANTIATE_TEST_SUITE_P(Bits, PresetValue,
+                         testing::Values(ValueBits{"NegativeZero", 0x80000000},
+                                         ValueBits{"SmallestDenormal", 0x00000001},
+                                         ValueBits{"NegativeInfinity", 0xFF800000},
+                                         ValueBits{"QuietNaN", 0x7FC00001},
                                          // Reversed, these bytes are a signalling NaN: a float of them must
                                          // not be made on the way.
-                                         SavedValue{"SignallingNaNWhenReversed", 0x0100A07F}),
-                         host_tests::nameOfCase<SavedValue>);
+                                         ValueBits{"SignallingNaNWhenReversed", 0x0100A07F}),
+                         host_tests::nameOfCase<ValueBits>);
 
-// Where floats are returned in an x87 register, as on 32-bit x86, the plug-in's own function makes a
-// signalling NaN quiet.
+// Where floats pass through an x87 register, as on 32-bit x86, it makes a signalling NaN quiet.
 #if !defined(__i386__)
-INSTANTIATE_TEST_SUITE_P(SignallingNaN, SaveToFXBDataValue,
-                         testing::Values(SavedValue{"Negative", 0xFF800001}),
-                         host_tests::nameOfCase<SavedValue>);
+INSTANTIATE_TEST_SUITE_P(SignallingNaN, PresetValue, testing::Values(ValueBits{"Negative", 0xFF800001}),
+                         host_tests::nameOfCase<ValueBits>);
 #endif
 
 // ---- Requests
