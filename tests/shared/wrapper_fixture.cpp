@@ -37,11 +37,12 @@ std::unique_ptr<VSTWrapper> WrapperTest::create(const VST_ChildSpec& child, KelV
   return std::unique_ptr<VSTWrapper>(VSTWrapper::New(module, child, support));
 }
 
-void WrapperTest::open(const VST_ChildSpec& child) {
+VSTWrapper* WrapperTest::open(const VST_ChildSpec& child) {
   plugin.willCreate(effect);
   wrapper = create(child);
-  ASSERT_NE(wrapper, nullptr);
+  EXPECT_NE(wrapper, nullptr);
   effect.forget();
+  return wrapper.get();
 }
 
 void WrapperTest::close() { delete wrapper.release(); }

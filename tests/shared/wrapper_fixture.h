@@ -46,7 +46,7 @@ class WrapperTest : public testing::Test {
                                      KelVSTSupportEffect* support = nullptr);
 
   /// Creates the wrapper around `effect` and forgets the requests made meanwhile.
-  void open(const VST_ChildSpec& child = VST_ChildSpec());
+  VSTWrapper* open(const VST_ChildSpec& child = VST_ChildSpec());
 
   /// Deletes the wrapper, and not through the smart pointer, which lets no exception pass.
   void close();
