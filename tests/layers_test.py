@@ -170,39 +170,18 @@ class Faults(unittest.TestCase):
     def assert_fault(self, path, text, fault):
         self.assertEqual(self.faults_of(path, text), [fault])
 
-    def test_each_folder_may_include_itself_and_those_below(self):
-        below = {
-            "worker": "worker driver describe host loader support platform vst2 flight_recorder",
-            "driver": "driver describe host loader support platform vst2 flight_recorder",
-            "describe": "describe host loader support platform vst2",
-            "host": "host loader support platform vst2 flight_recorder",
-            "loader": "loader support platform flight_recorder",
-            "support": "support platform",
-            "platform": "platform",
-            "vst2": "vst2 flight_recorder",
-            "flight_recorder": "flight_recorder",
-        }
-        for folder in below:
-            for other in below:
-                with self.subTest(folder=folder, other=other):
-                    text = f'#pragma once\n#include "{other}/x.h"\n'
-                    if other in below[folder].split():
-                        self.assert_fine(f"{folder}/a.h", text)
-                    else:
-                        self.assert_fault(f"{folder}/a.h", text,
-                                          f"{folder}/a.h:2: {folder}/ may not include {other}/")
+    def test_a_folder_may_include_those_below_and_no_other(self):
+        self.assert_fine("host/a.h", '#include "loader/x.h"\n#include "vst2/x.h"\n#include "flight_recorder/x.h"\n')
+        for folder, other in [("host", "describe"), ("worker", "describer"), ("support", "vst2"),
+                              ("platform", "flight_recorder"), ("vst2", "host")]:
+            with self.subTest(folder=folder, other=other):
+                self.assert_fault(f"{folder}/a.h", f'#pragma once\n#include "{other}/x.h"\n',
+                                  f"{folder}/a.h:2: {folder}/ may not include {other}/")
 
-    def test_a_station_may_include_those_before_it(self):
-        for station, others in STATIONS.items():
-            for other in STATIONS:
-                with self.subTest(station=station, other=other):
-                    text = f'#include "scanner/{other}/x.h"'
-                    if other in [station, *others]:
-                        self.assert_fine(f"scanner/{station}/a.h", text)
-                    else:
-                        self.assert_fault(f"scanner/{station}/a.h", text,
-                                          f"scanner/{station}/a.h:1: scanner/{station}/ may not include "
-                                          f"scanner/{other}/")
+    def test_a_station_may_include_those_before_it_and_no_other(self):
+        self.assert_fine("scanner/judge/a.h", '#include "scanner/engine/x.h"')
+        self.assert_fault("scanner/engine/a.h", '#include "scanner/judge/x.h"',
+                          "scanner/engine/a.h:1: scanner/engine/ may not include scanner/judge/")
 
     def test_the_scan_includes_nothing_that_loads_plugins(self):
         for folder in ["host", "driver", "platform", "vst2"]:
@@ -227,10 +206,6 @@ class Faults(unittest.TestCase):
             with self.subTest(text=text):
                 self.assertEqual(self.faults_of("host/sub/a.mm", text), fault)
 
-    def test_comments_and_literals_include_nothing(self):
-        self.assert_fine("host/a.cpp", '// #include "driver/a.h"\n/*\n#include "driver/b.h"\n*/\n')
-        self.assert_fine("host/a.cpp", 'auto s = "#include \\"driver/a.h\\"";\n')
-
     def test_a_comment_opener_in_a_literal_hides_nothing(self):
         self.assert_fault("host/a.cpp", 'auto s = "/*";\n#include "driver/a.h" /* */',
                           "host/a.cpp:2: host/ may not include driver/")
@@ -254,9 +229,6 @@ class Faults(unittest.TestCase):
                 self.assert_fine("platform/a.h", line)
                 self.assert_fault("support/a.h", line, f"support/a.h:1: {macro} asks for an operating system")
 
-    def test_other_conditions_are_fine(self):
-        self.assert_fine("support/a.h", "#ifdef __cplusplus\n#if defined(__clang__) // not __linux__\n")
-
     def test_lines_are_counted_past_continued_ones(self):
         self.assert_fault("support/a.h", "#define A \\\n  1 \\\n  2\n#ifdef __linux__",
                           "support/a.h:4: __linux__ asks for an operating system")
@@ -272,11 +244,6 @@ class Faults(unittest.TestCase):
     def test_asking_whether_such_a_header_exists_is_a_fault(self):
         self.assert_fault("driver/a.cpp", "#if __has_include(<mach/mach.h>)",
                           "driver/a.cpp:1: <mach/mach.h> is a header of an operating system")
-
-    def test_headers_of_cpp_c_and_posix_are_fine(self):
-        for header in ["string_view", "cstdint", "stdio.h", "dlfcn.h", "pthread.h", "sys/stat.h", "unistd.h"]:
-            with self.subTest(header=header):
-                self.assert_fine("driver/a.cpp", f"#include <{header}>")
 
 
 if __name__ == "__main__":
