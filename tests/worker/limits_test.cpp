@@ -13,65 +13,38 @@
 
 namespace {
 
-/// Takes the limits in a child of this process and tells one of them: the same as soft and as hard limit, or
-/// 0.
-rlim_t limitInAChild(const WorkerOptions& options, int resource) {
+/// Takes the limits in a child of this process, whose limit of the resource is `before`, and tells the one that it
+/// has then: the same as soft and as hard limit, or 1.
+rlim_t limitInAChild(const WorkerOptions& options, int resource, rlim_t before = RLIM_INFINITY) {
   int ends[2];
-  if (pipe(ends) != 0) return 0;
+  if (pipe(ends) != 0) return 1;
   const pid_t child = fork();
   if (child == 0) {
     std::string whyNot;
-    struct rlimit limit = {};
+    struct rlimit limit = {before, before};
+    if (before != RLIM_INFINITY) setrlimit(resource, &limit);
     if (!limitThisProcess(options, whyNot) || getrlimit(resource, &limit) != 0) _exit(1);
-    if (limit.rlim_cur != limit.rlim_max) limit.rlim_cur = 0;
+    if (limit.rlim_cur != limit.rlim_max) limit.rlim_cur = 1;
     const bool isTold = write(ends[1], &limit.rlim_cur, sizeof limit.rlim_cur) == sizeof limit.rlim_cur;
     _exit(isTold ? 0 : 1);
   }
   close(ends[1]);
-  rlim_t told = 0;
+  rlim_t told = 1;
   const bool isRead = read(ends[0], &told, sizeof told) == sizeof told;
   close(ends[0]);
   waitpid(child, nullptr, 0);
-  return isRead ? told : 0;
+  return isRead ? told : 1;
 }
 
-TEST(LimitThisProcess, LowersBothLimitsOfEachResource) {
+TEST(LimitThisProcess, LowersBothLimitsOfEachResourceAndRaisesNone) {
   WorkerOptions options;
   options.fileSizeLimit = 1000000;
   EXPECT_EQ(limitInAChild(options, RLIMIT_FSIZE), 1000000u);
+  EXPECT_EQ(limitInAChild(options, RLIMIT_FSIZE, 500000), 500000u);
   options.memoryLimit = std::uint64_t{1} << 31;
   EXPECT_EQ(limitInAChild(options, RLIMIT_AS), std::uint64_t{1} << 31);
-}
-
-TEST(LimitThisProcess, LeavesALowerLimitAsItIs) {
-  const pid_t child = fork();
-  if (child == 0) {
-    struct rlimit limit = {500000, 500000};
-    setrlimit(RLIMIT_FSIZE, &limit);
-    WorkerOptions options;
-    options.fileSizeLimit = 1000000;
-    std::string whyNot;
-    const bool isFine = limitThisProcess(options, whyNot) && getrlimit(RLIMIT_FSIZE, &limit) == 0;
-    _exit(isFine && limit.rlim_cur == 500000 && limit.rlim_max == 500000 ? 0 : 1);
-  }
-  int status = 0;
-  ASSERT_EQ(waitpid(child, &status, 0), child);
-  EXPECT_EQ(status, 0);
-}
-
-TEST(LimitThisProcess, LeavesNoCore) {
-  const pid_t child = fork();
-  if (child == 0) {
-    WorkerOptions options;
-    options.withoutCore = true;
-    std::string whyNot;
-    struct rlimit limit = {1, 1};
-    const bool isFine = limitThisProcess(options, whyNot) && getrlimit(RLIMIT_CORE, &limit) == 0;
-    _exit(isFine && limit.rlim_cur == 0 && limit.rlim_max == 0 ? 0 : 1);
-  }
-  int status = 0;
-  ASSERT_EQ(waitpid(child, &status, 0), child);
-  EXPECT_EQ(status, 0);
+  options.withoutCore = true;
+  EXPECT_EQ(limitInAChild(options, RLIMIT_CORE), 0u);
 }
 
 // A plug-in that overruns the limit of memory gets none, and a run without a limit of its own is none the

@@ -42,12 +42,6 @@ TEST(RecordOfAPass, HoldsTheLastRequestToTheHost) {
   EXPECT_EQ(record.report().hostRequest.thread, record.report().process);
 }
 
-TEST(RecordOfAShell, SaysSo) {
-  const RecordOnDisk record;
-  runWorker({"--record", record.path(), samplePlugin("shell")});
-  EXPECT_EQ(record.report().verdict, kFlightShell);
-}
-
 TEST(RecordOfARun, OverwritesThatOfTheRunBefore) {
   const RecordOnDisk record;
   runWorker({"--record", record.path(), samplePlugin("open_crashes")});
