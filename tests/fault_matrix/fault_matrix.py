@@ -4,9 +4,9 @@
     fault_matrix.py --program build/release/vsttorture --plugins build/release/plugins [--only REGEX] [--list]
 
 Prints a line for each row that fails, then a summary. The rows stand in rows.py. Each run is made and judged by the
-Python example of docs/examples. With --consumer the compiled C++ example makes and judges each run instead, and its
-verdict and status are compared; the Python one is run as a command for a row of each verdict. What does not apply to a
-build with a sanitizer stands in sanitizers.py, and is named in the summary.
+Python example of docs/examples. With --consumer the compiled C++ example makes and judges a run of each kind that looks
+different to a host, and its verdict and status are compared; the Python one is run as a command for a row of each
+verdict. What does not apply to a build with a sanitizer stands in sanitizers.py, and is named in the summary.
 """
 import argparse
 import collections
@@ -29,6 +29,10 @@ FLOOD_LIMIT_IN_SECONDS = 60  # On a busy machine 8 MiB of small writes take long
 HANG_LIMIT_IN_SECONDS = 5  # Before it, the run must have come to the place where it hangs, on a busy machine, too.
 PROOF_LIMIT_IN_SECONDS = 4
 GRACE_IN_SECONDS = 10
+# Kinds that put text between the lines, or keep standard output open.
+NOISE = frozenset(["buffer_stdout", "buffer_stdout@load", "close_stdout", "daemon_flooding_stdout",
+                   "daemon_keeping_stdout", "flood_stdout", "fork_keeping_stdout", "print", "print_when_unloaded",
+                   "wcout", "wprintf"])
 
 
 def environment_of(row, sanitizer=None):
@@ -124,6 +128,11 @@ def consumer_differences(row, consumer, program, plugins):
     return [f"{seen.output!r} and status {seen.status} instead of {min(verdicts)!r} and {status}"]
 
 
+def rows_that_look_different(rows):
+    """A row of each end that a host can see, and of each text that a plug-in puts between the lines."""
+    return list({(row.end._replace(errors=None), NOISE.intersection(kinds_of(row))): row for row in rows}.values())
+
+
 def a_row_of_each_verdict(rows):
     return list({row.end.verdict.split("{")[0]: row for row in rows}.values())
 
@@ -140,6 +149,8 @@ def main():
     arguments = parser.parse_args()
 
     rows = [row for row in all_rows() if re.search(arguments.only, row.name)]
+    if arguments.consumer:
+        rows = rows_that_look_different(rows)
     if arguments.list:
         for row in rows:
             print(f"{row.name}\t{row.end.steps} steps, {row.end.tail!r}, status {row.end.status}")

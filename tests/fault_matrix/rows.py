@@ -323,6 +323,7 @@ COMBINATIONS = [
     Kind("fork_keeping_stdout+null_store", CRASH),
     Kind("print", PASS),
     Kind("print+null_store", CRASH),
+    Kind("print+exit", EXIT, 9),
     Kind("crash_in_static_destructor+crash_in_atexit+raise:SIGTERM", CRASH),
     Kind("hang_in_atexit+null_store", CRASH),
     Kind("use_heap_in_atexit+crash_with_heap_lock", CRASH, errors="malloc(): unsorted double linked list corrupted\n"),
