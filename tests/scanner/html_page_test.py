@@ -279,25 +279,6 @@ class Program(PageTest):
         self.assertGreater(len(results), len(plugins))  # The children of the shell.
         self.assertEqual((folder / "again").read_text(), page)
 
-    def test_the_page_goes_to_standard_output_and_the_terminal_report_to_standard_error(self):
-        status, page, report = self.scan("--sandbox", "off", "--cache", "off", "--html", "-",
-                                         PLUGINS / "well_behaved_effect.so")
-        self.assertEqual(status, 0)
-        self.assertTrue(page.startswith("<!DOCTYPE html>") and page.endswith("</html>\n"), page[-100:])
-        self.assertIn("1 result: 1 passed", report)
-
-    def test_standard_output_takes_one_report_only(self):
-        for other in ("--json", "--junit"):
-            status, output, complaints = self.scan("--html", "-", other, "-", PLUGINS)
-            self.assertEqual((status, output), (2, ""))
-            self.assertIn("only one report can go to standard output", complaints)
-
-    def test_a_page_that_cannot_be_written_is_named(self):
-        status, _, complaints = self.scan("--sandbox", "off", "--cache", "off", "--html", "/no/such/folder/page.html",
-                                          PLUGINS / "well_behaved_effect.so")
-        self.assertEqual(status, 3)
-        self.assertIn("/no/such/folder/page.html", complaints)
-
 
 class BrowserTest(PageTest):
     """Each test opens a page of its own."""

@@ -10,7 +10,6 @@
 
 using namespace scanner;
 using ::testing::ElementsAre;
-using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
@@ -25,15 +24,6 @@ RecordedStream read(const std::string& text, std::size_t pieceSize = 1000) {
     at += count;
     return count;
   });
-}
-
-std::string problemOf(const std::string& text) {
-  try {
-    read(text);
-  } catch (const std::runtime_error& error) {
-    return error.what();
-  }
-  return "";
 }
 
 const Run kRun = resultOf("/lib/a.so", Verdict::kPassed).run;
@@ -83,13 +73,6 @@ TEST(ReadStream, OfManyBrokenLinesTheFirstAreNamed) {
   EXPECT_EQ(stream.problems[20], "file: 980 further lines are no events");
 }
 
-TEST(ReadStream, WhatIsNoStreamSaysWhy) {
-  EXPECT_EQ(problemOf(""), "file is no stream of events: it is empty");
-  EXPECT_EQ(problemOf("lunch\n" + kEnded), "file is no stream of events: line 1: it is no JSON");
-  EXPECT_EQ(problemOf(R"({"event":"scan_started","format":2})"),
-            "file is no stream of events: line 1: its format is 2, not 1");
-}
-
 TEST(ReadStream, ALineWithoutEndIsGivenUp) {
   std::size_t bytes = 0;
   const auto zeros = [&bytes](char* buffer, std::size_t size) {
@@ -108,16 +91,6 @@ TEST(ReadStream, ADescriptionThatWouldMakeItsLineTooLongIsNotWritten) {
   EXPECT_THAT(stream.problems, IsEmpty());
   ASSERT_THAT(stream.scans.at(0).report.results, SizeIs(2));
   EXPECT_FALSE(stream.scans[0].report.results[0].description);
-}
-
-TEST(ReadStream, AFileThatCannotBeReadHasTheSystemsReason) {
-  try {
-    readStream("/nowhere/file");
-    FAIL();
-  } catch (const std::runtime_error& error) {
-    EXPECT_STREQ(error.what(), "/nowhere/file: No such file or directory");
-  }
-  EXPECT_THROW(readStream("/"), std::runtime_error);
 }
 
 }  // namespace

@@ -186,11 +186,6 @@ class Verdicts(ScanTest):
         skip = self.write("skip", "shell.so\tslow\n")
         self.assertEqual(self.verdicts("--skip", skip, PLUGINS / "shell.so", status=0), {"shell.so": "skipped"})
 
-    def test_the_parts_of_a_scan_are_the_whole(self):
-        whole = self.verdicts(PLUGINS)
-        parts = [self.verdicts("--shard", f"{part}/3", PLUGINS) for part in (1, 2, 3)]
-        self.assertEqual(sorted(name for part in parts for name in part), sorted(whole))
-
     def test_repeated_runs_are_counted(self):
         result = self.results("--repeat", "3", PLUGINS / EFFECT, status=0)[EFFECT]
         self.assertEqual(result["repetitions"], {"runs": 3, "isFlaky": False, "flakeRate": 0, "verdicts": {"passed": 3}})

@@ -128,13 +128,6 @@ class SecondScan(RememberingTest):
         self.assertEqual((result.returncode, result.stderr), (0, ""))
         self.assertRegex(result.stdout, r"\n1 result: 1 passed, in \S+ m?s; all remembered\n$")
 
-    def test_is_told_on_the_terminal(self):
-        plugin = self.plugin()
-        self.assertNotIn("remembered", self.scan(plugin).stdout)
-        self.assertRegex(self.scan(plugin).stdout, r"\npassed +/.*/plugin.so  \(remembered\)\n")
-        other = self.plugin(copy="other.so")
-        self.assertRegex(self.scan(plugin, other).stdout, r"2 passed, in \S+ m?s; 1 remembered\n")
-
     def test_notices_another_file_but_not_another_folder(self):
         def replace(plugin):
             shutil.copy(plugin, self.folder / "new")
