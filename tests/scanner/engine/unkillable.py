@@ -1,13 +1,15 @@
 # SPDX-License-Identifier: MIT
 """A process that SIGKILL does not end holds up neither the scan nor its end, and is named with its folder.
 
-    unkillable.py --scan build/release/vsttorture-scan --plugins build/release/plugins [--options=OPTION...]
+    unkillable.py --scan build/release/vsttorture-scan --plugins build/release/plugins --sandbox MODE...
 
 The kernel ends no process that waits for a device or a file system which does not answer. A process whose end a tracer
 has to see first looks the same to its parent: killed, and still there. So this script traces the worker of a plug-in
-that hangs. In a sandbox that keeps the first process of the namespace, too. Exits with 77 where tracing is forbidden.
+that hangs. In a sandbox that keeps the first process of the namespace, too. The modes of --sandbox are tried at the same
+time, since most of it is waiting. Exits with 77 where tracing is forbidden.
 """
 import argparse
+import concurrent.futures
 import ctypes
 import json
 import os
@@ -60,42 +62,54 @@ def problems_with(events, worker, plugin, temporary):
     return problems
 
 
-def main():
-    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
-    parser.add_argument("--scan", required=True, type=pathlib.Path)
-    parser.add_argument("--plugins", required=True, type=pathlib.Path)
-    parser.add_argument("--options", nargs="*", default=[], help="further options of the scan")
-    arguments = parser.parse_args()
+def problems_of_a_scan(scan, plugins, sandbox):
+    """What is wrong with a scan of six good plug-ins and one that cannot be killed; None where nothing can be traced."""
     libc = ctypes.CDLL(None, use_errno=True)
     with tempfile.TemporaryDirectory(prefix="unkillable-") as folder:
         world = pathlib.Path(os.path.realpath(folder))
         (world / "tmp").mkdir()
         (world / "plugins").mkdir()
         plugin = world / "plugins" / "0_unruly.so"
-        shutil.copy(arguments.plugins / "unruly.so", plugin)
+        shutil.copy(plugins / "unruly.so", plugin)
         for number in range(1, 7):
-            shutil.copy(arguments.plugins / "well_behaved_effect.so", world / "plugins" / f"{number}.so")
-        command = [arguments.scan.resolve(), "-j", "2", "--step-limit", "5", "--cache=off", "--no-progress",
-                   "--json", "-", *arguments.options, world / "plugins"]
+            shutil.copy(plugins / "well_behaved_effect.so", world / "plugins" / f"{number}.so")
+        command = [scan.resolve(), "-j", "2", "--step-limit", "5", "--cache=off", "--no-progress", "--json", "-",
+                   f"--sandbox={sandbox}", world / "plugins"]
         environment = dict(os.environ, TMPDIR=str(world / "tmp"), UNRULY="ignore_termination")
-        scan = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
-                                stderr=subprocess.DEVNULL)
+        process = subprocess.Popen(command, env=environment, stdin=subprocess.DEVNULL, stdout=subprocess.PIPE,
+                                   stderr=subprocess.DEVNULL)
         worker = worker_of(plugin)
         if libc.ptrace(PTRACE_SEIZE, worker, None, None) != 0:
-            scan.terminate()
-            scan.communicate()
+            process.terminate()
+            process.communicate()
             print(f"cannot trace a process: {os.strerror(ctypes.get_errno())}")
-            return SKIPPED
+            return None
         try:
-            output = scan.communicate(timeout=LIMIT_IN_SECONDS)[0]
+            output = process.communicate(timeout=LIMIT_IN_SECONDS)[0]
             problems = problems_with(map(json.loads, output.splitlines()), worker, plugin, world / "tmp")
-            if scan.returncode != 1:
-                problems.append(f"the scan ended with {scan.returncode}")
+            if process.returncode != 1:
+                problems.append(f"the scan ended with {process.returncode}")
         except subprocess.TimeoutExpired:
             problems = [f"the scan has not ended after {LIMIT_IN_SECONDS} s"]
-            scan.kill()
-            scan.communicate()
+            process.kill()
+            process.communicate()
         os.waitpid(worker, WALL)
+    return [f"--sandbox={sandbox}: {problem}" for problem in problems]
+
+
+def main():
+    parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawDescriptionHelpFormatter)
+    parser.add_argument("--scan", required=True, type=pathlib.Path)
+    parser.add_argument("--plugins", required=True, type=pathlib.Path)
+    parser.add_argument("--sandbox", required=True, nargs="+", help="modes of the scan's option")
+    arguments = parser.parse_args()
+    # Processes, not threads: only the thread that traces a process may wait for it.
+    with concurrent.futures.ProcessPoolExecutor(len(arguments.sandbox)) as pool:
+        tries = [pool.submit(problems_of_a_scan, arguments.scan, arguments.plugins, sandbox)
+                 for sandbox in arguments.sandbox]
+    if any(one.result() is None for one in tries):
+        return SKIPPED
+    problems = sum((one.result() for one in tries), [])
     print("\n".join([*problems, f"{len(problems)} problems"]))
     return 1 if problems else 0
 
