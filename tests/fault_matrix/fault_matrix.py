@@ -10,7 +10,6 @@ verdict. What does not apply to a build with a sanitizer stands in sanitizers.py
 """
 import argparse
 import collections
-import concurrent.futures
 import os
 import pathlib
 import re
@@ -19,7 +18,7 @@ import sys
 import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[1] / "shared"))
-from program_run import as_printed, run_program, take_usual_start, try_plugin  # noqa: E402
+from program_run import as_printed, in_processes, run_program, take_usual_start, try_plugin  # noqa: E402
 from rows import (ALL_STEPS, FLOOD, FIRST_DRAWN, LAST_DRAWN, LAST_WORDS, PHASE_OF_DRAWN, TEXT_WITHOUT_END,  # noqa: E402
                   all_rows)
 from sanitizers import kinds_of, options_for, proofs, reason_to_leave_out, unwanted_report  # noqa: E402
@@ -176,21 +175,20 @@ def main():
 
     left_out = collections.Counter(reason_to_leave_out(row, sanitizer) for row in rows)
     applying = [row for row in rows if reason_to_leave_out(row, sanitizer) is None]
+    tries = [(row.name, check, row) for row in applying]
+    if arguments.consumer:
+        tries += [(f"{row.name} in Python", check_python_command, row) for row in a_row_of_each_verdict(rows)]
+    proven = [(row.name, lambda row: check(row, PROOF_LIMIT_IN_SECONDS), row) for row in proofs(rows, sanitizer)]
+    found = in_processes(lambda one: one[1](one[2]), tries + proven, arguments.jobs)
     failed = 0
-    with concurrent.futures.ThreadPoolExecutor(arguments.jobs) as pool:
-        checks = [(row.name, pool.submit(check, row)) for row in applying]
-        if arguments.consumer:
-            checks += [(f"{row.name} in Python", pool.submit(check_python_command, row))
-                       for row in a_row_of_each_verdict(rows)]
-        proven = [(row.name, pool.submit(check, row, PROOF_LIMIT_IN_SECONDS)) for row in proofs(rows, sanitizer)]
-        for name, found in checks:
-            if found.result():
-                failed += 1
-                print(f"{name}: {'; '.join(found.result())}", flush=True)
-        for name, found in proven:
-            if not found.result():
-                failed += 1
-                print(f"{name}: holds, although it is said not to apply", flush=True)
+    for (name, _, _), problems in zip(tries, found):
+        if problems:
+            failed += 1
+            print(f"{name}: {'; '.join(problems)}", flush=True)
+    for (name, _, _), problems in zip(proven, found):
+        if not problems:
+            failed += 1
+            print(f"{name}: holds, although it is said not to apply", flush=True)
     for reason, count in left_out.items():
         if reason is not None:
             print(f"{count} rows do not apply: {reason}")

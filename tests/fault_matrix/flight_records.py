@@ -10,7 +10,6 @@ in. Prints a line for each row that fails, then a summary.
 Nothing here is taken from the worker: the arguments of each request and the signal of each fault are literals.
 """
 import argparse
-import concurrent.futures
 import os
 import pathlib
 import re
@@ -22,8 +21,8 @@ import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).resolve().parents[2] / "docs" / "examples"))
 import explain_plugin  # noqa: E402
-from fault_matrix import (command_of, differences, environment_of, limit_of, number_of_steps, run_program,  # noqa: E402
-                          take_usual_start, try_plugin, without_noise)
+from fault_matrix import (command_of, differences, environment_of, in_processes, limit_of, number_of_steps,  # noqa: E402
+                          run_program, take_usual_start, try_plugin, without_noise)
 from rows import ALL_STEPS, KIND_OF, PLACE_OF, all_rows  # noqa: E402
 from sanitizers import kinds_of  # noqa: E402
 
@@ -287,11 +286,10 @@ def main():
     worker, plugins = os.path.abspath(arguments.worker), os.path.abspath(arguments.plugins)
     rows = [row for row in all_rows() if re.search(arguments.only, row.name)]
     failed = 0
-    with concurrent.futures.ThreadPoolExecutor(arguments.jobs) as pool:
-        for row, found in zip(rows, pool.map(lambda row: check(row, worker, plugins), rows)):
-            if found:
-                failed += 1
-                print(f"{row.name}: {'; '.join(found)}", flush=True)
+    for row, found in zip(rows, in_processes(lambda row: check(row, worker, plugins), rows, arguments.jobs)):
+        if found:
+            failed += 1
+            print(f"{row.name}: {'; '.join(found)}", flush=True)
     print(f"{len(rows)} rows in {time.monotonic() - started:.0f} s, {failed} failed")
     return 1 if failed or not rows else 0
 

@@ -1,6 +1,8 @@
 # SPDX-License-Identifier: MIT
 """Runs vsttorture as the example of docs/examples does, in a home of its own. For all tests written in Python."""
 import collections
+import concurrent.futures
+import multiprocessing
 import os
 import pathlib
 import resource
@@ -44,3 +46,26 @@ def as_printed(total, texts):
     """What a run prints that gets as far. The arguments are those that try_plugin.read_steps() gives."""
     head = "" if total is None else f"total, {total}\n"
     return head + "".join(f"{number}, {text}\n" for number, text in enumerate(texts, 1))
+
+
+def in_processes(function, items, threads):
+    """Yields the results of function(item), in the order of the items.
+
+    The interpreter runs one thread at a time, so each processor gets a process of its own with its share of the threads.
+    """
+    context = multiprocessing.get_context("fork")  # The function may be a local one.
+    count = len(os.sched_getaffinity(0))
+
+    def work(part, pipe):
+        with concurrent.futures.ThreadPoolExecutor(max(1, threads // count)) as pool:
+            for result in pool.map(function, items[part::count]):
+                pipe.send(result)
+
+    receivers = []
+    for part in range(count):
+        receiver, sender = context.Pipe(duplex=False)
+        context.Process(target=work, args=(part, sender)).start()
+        sender.close()
+        receivers.append(receiver)
+    for number in range(len(items)):
+        yield receivers[number % count].recv()
