@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: MIT
-// A wrapper around the recording instance, for tests that save and load its state.
+// A wrapper around the recording instance, for tests that save and load its state, and the requests that its operations
+// consist of.
 //
 //   open();
 //   EXPECT_EQ(inHex(save(kProgram)), inHex(hex("43636E4B 00000000 ...")));

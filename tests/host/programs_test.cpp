@@ -3,11 +3,12 @@
 #include <climits>
 #include <string>
 
-#include "tests/shared/wrapper_fixture.h"
+#include "tests/host/preset_fixture.h"
 
 namespace {
 
 using namespace doubles;
+using namespace preset_tests;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -101,10 +102,8 @@ TEST_F(VSTWrapperPrograms, SelectingReadsTheCountAgainAfterTheQuestionForTheCurr
 TEST_F(VSTWrapperPrograms, RenamingTheCurrentProgramComparesFirst) {
   wrapper->changeProgramName(2, "Hot");
   wrapper->changeProgramName(2, "Hot");
-  EXPECT_THAT(effect.requests(),
-              ElementsAre(request(effGetProgram), request(effGetProgramName), request(effGetProgram),
-                          setProgramName("Hot"),  //
-                          request(effGetProgram), request(effGetProgramName), request(effGetProgram)));
+  const Requests sent = {setProgramName("Hot")};
+  EXPECT_EQ(effect.requests(), inOrder({asksProgram(), asksName(), sent, asksProgram(), asksName()}));
 }
 
 TEST_F(VSTWrapperPrograms, RenamingAnotherProgramOrOneOfNoneAsksForTheCurrentProgramOnly) {
@@ -139,7 +138,7 @@ TEST_F(VSTWrapperPrograms, RenamingNeitherComparesWithTheStoredNameNorChangesIt)
 
 TEST_F(VSTWrapperPrograms, TheCurrentNameIsAskedForAndStored) {
   EXPECT_EQ(wrapper->getCurrentProgramName(), "Warm");
-  EXPECT_THAT(effect.requests(), ElementsAre(request(effGetProgramName), request(effGetProgram)));
+  EXPECT_EQ(effect.requests(), asksName());
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("", "", "Warm"));
   effect.currentProgram = 0;
   wrapper->getCurrentProgramName();
@@ -184,8 +183,7 @@ TEST_F(VSTWrapperPrograms, NamesRunToTheEndOfABufferThatIsClearedEachTime) {
     effect.forget();
     EXPECT_EQ(wrapper->getCurrentProgramName(), std::string(256, 'p'));
     EXPECT_EQ(wrapper->getProgramName(1), std::string(256, 'i'));
-    EXPECT_THAT(effect.requests(), ElementsAre(request(effGetProgramName), request(effGetProgram),
-                                               request(effGetProgram), programNameIndexed(1)));
+    EXPECT_EQ(effect.requests(), inOrder({asksName(), asksProgram(), {programNameIndexed(1)}}));
   }
   EXPECT_EQ(wrapper->storedProgramNames.at(2), std::string(256, 'p'));
 }
@@ -195,8 +193,7 @@ TEST_F(VSTWrapperPrograms, NamesRunToTheEndOfABufferThatIsClearedEachTime) {
 TEST_F(VSTWrapperPrograms, TheNameAtTheCurrentIndexIsTheCurrentName) {
   effect.namesProgramsByIndex = true;
   EXPECT_EQ(wrapper->getProgramName(2), "Warm");
-  EXPECT_THAT(effect.requests(),
-              ElementsAre(request(effGetProgram), request(effGetProgramName), request(effGetProgram)));
+  EXPECT_EQ(effect.requests(), inOrder({asksProgram(), asksName()}));
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("", "", "Warm"));
 }
 
@@ -270,22 +267,12 @@ TEST_F(VSTWrapperStoredProgramNames, AreCollectedByTheseRequests) {
   effect.setText(effGetProgramNameIndexed, "By index");
   effect.answer(effGetProgramNameIndexed, 0);
   wrapper->updateStoredProgramNames();
-  EXPECT_THAT(
-      effect.requests(),
-      ElementsAre(programNameIndexed(0), request(effGetProgram),
-                  // The store
-                  request(effGetProgramName), request(effGetProgram), getParameterOf(0), getParameterOf(1),
-                  // Program 0
-                  request(effGetProgram), setProgram(0), request(effGetProgramName), request(effGetProgram),
-                  // Program 1
-                  request(effGetProgram), setProgram(1), request(effGetProgramName), request(effGetProgram),
-                  // Program 2
-                  request(effGetProgram), setProgram(2), request(effGetProgramName), request(effGetProgram),
-                  // Back
-                  request(effGetProgram), setProgram(1),
-                  // The store again: the name is compared, then the values are
-                  request(effGetProgram), request(effGetProgram), request(effGetProgramName),
-                  request(effGetProgram), getParameterOf(0), getParameterOf(1)));
+  const Requests byIndex = {programNameIndexed(0)};
+  const Requests store = inOrder({asksName(), readsParameters(2)});
+  const Requests restored = inOrder({keepsName(), readsParameters(2)});
+  EXPECT_EQ(effect.requests(), inOrder({byIndex, asksProgram(), store,                   //
+                                        selects(0), asksName(), selects(1), asksName(),  //
+                                        selects(2), asksName(), selects(1), restored}));
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("Soft", "Loud", "Warm"));
   EXPECT_EQ(wrapper->getProgramName(0), "Soft");
 }

@@ -3,13 +3,15 @@
 #include <climits>
 #include <cstring>
 #include <string>
+#include <utility>
 
+#include "tests/host/preset_fixture.h"
 #include "tests/shared/thrown.h"
-#include "tests/shared/wrapper_fixture.h"
 
 namespace {
 
 using namespace doubles;
+using namespace preset_tests;
 using testing::ElementsAre;
 using testing::IsEmpty;
 
@@ -50,8 +52,7 @@ TEST_F(VSTWrapperTempParameterStore, HoldsTheNameAndTheValuesInMachineByteOrder)
   EXPECT_EQ(created(), nameField("Loud") + bytes("\x00\x00\x80\x3F"
                                                  "\x00\x00\x00\xBF"
                                                  "\xCD\xCC\xCC\x3D"));
-  EXPECT_THAT(effect.requests(), ElementsAre(request(effGetProgramName), request(effGetProgram),
-                                             getParameterOf(0), getParameterOf(1), getParameterOf(2)));
+  EXPECT_EQ(effect.requests(), inOrder({asksName(), readsParameters(3)}));
   EXPECT_THAT(wrapper->storedProgramNames, ElementsAre("", "Loud"));
 }
 
@@ -99,11 +100,8 @@ TEST_F(VSTWrapperTempParameterStore, IsRestoredNameFirstAndThenTheValuesThatDiff
   restore(nameField("Edited") + bytes("\x00\x00\x00\x3F"     // 0.5
                                       "\x00\x00\x00\xBF"     // -0.5, the present value
                                       "\x00\x00\x80\x3F"));  // 1.0
-  EXPECT_THAT(
-      effect.requests(),
-      ElementsAre(request(effGetProgram), request(effGetProgram), request(effGetProgramName),
-                  request(effGetProgram), setProgramName("Edited"), getParameterOf(0),
-                  setParameterTo(0, 0.5f), getParameterOf(1), getParameterOf(2), setParameterTo(2, 1.0f)));
+  EXPECT_EQ(effect.requests(),
+            inOrder({renames("Edited"), sets(0, 0.5f), {getParameterOf(1)}, sets(2, 1.0f)}));
 }
 
 TEST_F(VSTWrapperTempParameterStore, SendsTheFirst24CharactersOfANameThatEndsAtItsZeroByte) {
@@ -118,15 +116,10 @@ TEST_F(VSTWrapperTempParameterStore, SendsTheFirst24CharactersOfANameThatEndsAtI
 // On purpose: a store with another number of parameters is not refused.
 TEST_F(VSTWrapperTempParameterStore, RestoresAsManyValuesAsBothItAndThePluginHave) {
   const std::string content = created();
-  struct {
-    VstInt32 parameters;
-    std::vector<Request> reads;
-  } const rows[] = {
-      {1, {getParameterOf(0)}}, {-1, {}}, {1000, {getParameterOf(0), getParameterOf(1), getParameterOf(2)}}};
-  for (const auto& row : rows) {
-    effect.aeffect.numParams = row.parameters;
+  for (const auto& [parameters, restored] : {std::pair{1, 1}, std::pair{-1, 0}, std::pair{1000, 3}}) {
+    effect.aeffect.numParams = parameters;
     restore(content);
-    EXPECT_EQ(effect.parameterReads(), row.reads);
+    EXPECT_EQ(effect.parameterReads(), readsParameters(restored));
   }
 }
 
