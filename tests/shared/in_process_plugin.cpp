@@ -43,11 +43,9 @@ InProcessPlugin::InProcessPlugin(RecordingCoreFoundation& core_foundation, const
 
 InProcessPlugin::~InProcessPlugin() { EntryPoints::plugins[slot] = nullptr; }
 
-void InProcessPlugin::willCreate(RecordingEffect& effect) { creations.push_back({&effect, false}); }
+void InProcessPlugin::willCreate(RecordingEffect& effect) { creations.push_back(&effect); }
 
-void InProcessPlugin::willRefuse() { creations.push_back({nullptr, false}); }
-
-void InProcessPlugin::willThrow() { creations.push_back({nullptr, true}); }
+void InProcessPlugin::willRefuse() { creations.push_back(nullptr); }
 
 int InProcessPlugin::instancesAlive() const {
   int alive = 0;
@@ -70,12 +68,11 @@ AEffect* InProcessPlugin::entered(audioMasterCallback host) {
     ADD_FAILURE() << "entry point called more often than prepared";
     return nullptr;
   }
-  const Creation next = creations.front();
+  RecordingEffect* const next = creations.front();
   creations.pop_front();
-  if (next.throws) throw 42;
-  if (next.effect == nullptr) return nullptr;
-  ++handedOut.try_emplace(next.effect, HandedOut{0, next.effect->timesClosed()}).first->second.times;
-  return &next.effect->aeffect;
+  if (next == nullptr) return nullptr;
+  ++handedOut.try_emplace(next, HandedOut{0, next->timesClosed()}).first->second.times;
+  return &next->aeffect;
 }
 
 }  // namespace doubles

@@ -42,8 +42,6 @@ class InProcessPlugin {
   void willCreate(RecordingEffect& effect);
   /// Returns null.
   void willRefuse();
-  /// Throws the int 42.
-  void willThrow();
   /// Runs first in every call of the entry point; may call the host, or throw.
   std::function<void(audioMasterCallback host)> onEntry;
 
@@ -60,10 +58,6 @@ class InProcessPlugin {
   PluginEntryProc entryPoint() const;
 
  private:
-  struct Creation {
-    RecordingEffect* effect;  // Null: the entry point returns null or throws.
-    bool throws;
-  };
   struct HandedOut {
     int times;
     int timesClosedBefore;
@@ -72,8 +66,8 @@ class InProcessPlugin {
 
   AEffect* entered(audioMasterCallback host);
 
-  const std::size_t slot;  // Index of this plug-in's entry point.
-  std::deque<Creation> creations;
+  const std::size_t slot;                  // Index of this plug-in's entry point.
+  std::deque<RecordingEffect*> creations;  // Null: the entry point returns null.
   std::vector<audioMasterCallback> hosts;
   std::map<const RecordingEffect*, HandedOut> handedOut;
 };

@@ -45,11 +45,6 @@ Object* make(Kind kind, const std::string& text, Owner owner = Owner::kCaller) {
 }  // namespace
 
 struct RecordingCoreFoundation::State {
-  struct Bundle {
-    bool hasExecutable;
-    SymbolTable symbols;
-  };
-
   explicit State(State* stateBefore) : previous(stateBefore) {}
 
   bool fails(Step step) const { return failing.count(step) > 0; }
@@ -81,7 +76,7 @@ struct RecordingCoreFoundation::State {
     return nullptr;
   }
 
-  std::map<std::string, Bundle> bundles;
+  std::map<std::string, SymbolTable> bundles;
   std::set<Step> failing;
   std::string locale = "en_US";
   std::optional<std::string> entryPointName = "main";
@@ -139,11 +134,7 @@ RecordingCoreFoundation::~RecordingCoreFoundation() {
 }
 
 void RecordingCoreFoundation::addBundle(const std::string& path, SymbolTable symbols) {
-  state->bundles[path] = {true, std::move(symbols)};
-}
-
-void RecordingCoreFoundation::addBundleWithoutExecutable(const std::string& path) {
-  state->bundles[path] = {false, {}};
+  state->bundles[path] = std::move(symbols);
 }
 
 void RecordingCoreFoundation::failStep(Step step) { state->failing.insert(step); }
@@ -239,9 +230,7 @@ CFBundleRef CFBundleCreate(CFAllocatorRef allocator, CFURLRef url) {
 Boolean CFBundleLoadExecutable(CFBundleRef bundle) {
   Object* const used = world().use("CFBundleLoadExecutable", bundle, Kind::kBundle);
   if (used != nullptr && !used->loaded) {
-    const auto found = world().bundles.find(used->text);
-    used->loaded = found != world().bundles.end() && found->second.hasExecutable &&
-                   !world().fails(Step::kLoadExecutable);
+    used->loaded = world().bundles.count(used->text) > 0 && !world().fails(Step::kLoadExecutable);
   }
   const bool loaded = used != nullptr && used->loaded;
   world().record("CFBundleLoadExecutable", textOf(bundle), shown(loaded));
@@ -253,7 +242,7 @@ void* CFBundleGetFunctionPointerForName(CFBundleRef bundle, CFStringRef name) {
   const Object* const symbol = world().use("CFBundleGetFunctionPointerForName", name, Kind::kString);
   void* address = nullptr;
   if (used != nullptr && used->loaded && symbol != nullptr) {
-    const SymbolTable& symbols = world().bundles[used->text].symbols;
+    const SymbolTable& symbols = world().bundles[used->text];
     const auto found = symbols.find(symbol->text);
     if (found != symbols.end()) address = found->second.get();
   }

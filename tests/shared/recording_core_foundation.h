@@ -63,8 +63,6 @@ class RecordingCoreFoundation {
 
   /// Puts a bundle at `path`, whose executable exports these symbols. Replaces an earlier one there.
   void addBundle(const std::string& path, SymbolTable symbols);
-  /// Puts a bundle at `path` that cannot be loaded.
-  void addBundleWithoutExecutable(const std::string& path);
 
   /// Makes a step fail from now on, or work again.
   void failStep(Step step);

@@ -32,8 +32,8 @@ TEST_F(RecordingEffectTest, RecordsEveryRequestInOrderAlsoAfterTheClose) {
   ask(effClose);
   ask(effCanDo, 0, textArgument("offline"));
   EXPECT_THAT(effect.requests(),
-              ElementsAre(request(effOpen), setSampleRate(44100.0f), setParameterTo(2, 0.5f),
-                          getParameterOf(2), request(effClose), canDo("offline")));
+              ElementsAre(request(effOpen), request(effSetSampleRate, 0, 0, 44100.0f),
+                          setParameterTo(2, 0.5f), getParameterOf(2), request(effClose), canDo("offline")));
   EXPECT_THAT(effect.requestsOf({effClose, effOpen}), ElementsAre(request(effOpen), request(effClose)));
   EXPECT_THAT(effect.parameterReads(), ElementsAre(getParameterOf(2)));
   EXPECT_THAT(effect.parameterWrites(), ElementsAre(setParameterTo(2, 0.5f)));

@@ -94,12 +94,7 @@ Request request(VstEffectOpcode opcode, VstInt32 index, VstIntPtr value, float o
 Request setProgram(VstIntPtr program) { return request(effSetProgram, 0, program); }
 Request setProgramName(const std::string& name) { return withPointee(effSetProgramName, 0, 0, text(name)); }
 Request programNameIndexed(VstInt32 program) { return request(effGetProgramNameIndexed, program, -1); }
-Request setSampleRate(float rateInHz) { return request(effSetSampleRate, 0, 0, rateInHz); }
-Request setBlockSize(VstIntPtr frames) { return request(effSetBlockSize, 0, frames); }
-Request mainsChanged(VstIntPtr on) { return request(effMainsChanged, 0, on); }
-Request setBypass(VstIntPtr on) { return request(effSetBypass, 0, on); }
 Request connectInput(VstInt32 pin, VstIntPtr on) { return request(effConnectInput, pin, on); }
-Request connectOutput(VstInt32 pin, VstIntPtr on) { return request(effConnectOutput, pin, on); }
 Request canDo(const std::string& capability) { return withPointee(effCanDo, 0, 0, text(capability)); }
 Request canParameterBeSetFromText(VstInt32 parameter) { return request(effString2Parameter, parameter); }
 Request setParameterFromText(VstInt32 parameter, const std::string& value) {

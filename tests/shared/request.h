@@ -67,12 +67,7 @@ Request request(VstEffectOpcode opcode, VstInt32 index = 0, VstIntPtr value = 0,
 Request setProgram(VstIntPtr program);                  ///< effSetProgram (2)
 Request setProgramName(const std::string& name);        ///< effSetProgramName (4)
 Request programNameIndexed(VstInt32 program);           ///< effGetProgramNameIndexed (29), value -1
-Request setSampleRate(float rateInHz);                  ///< effSetSampleRate (10)
-Request setBlockSize(VstIntPtr frames);                 ///< effSetBlockSize (11)
-Request mainsChanged(VstIntPtr on);                     ///< effMainsChanged (12)
-Request setBypass(VstIntPtr on);                        ///< effSetBypass (44)
 Request connectInput(VstInt32 pin, VstIntPtr on = 1);   ///< effConnectInput (31)
-Request connectOutput(VstInt32 pin, VstIntPtr on = 1);  ///< effConnectOutput (32)
 Request canDo(const std::string& capability);           ///< effCanDo (51)
 Request canParameterBeSetFromText(VstInt32 parameter);  ///< effString2Parameter (27) with a null text
 Request setParameterFromText(VstInt32 parameter, const std::string& text);  ///< effString2Parameter (27)
