@@ -206,7 +206,7 @@ class Files(ReportTest):
 
     def test_a_report_that_cannot_be_written_keeps_the_verdicts_on_the_terminal(self):
         file = self.record("results", plugins() / EFFECT)
-        for target, reason in [("/nowhere/x", "No such file or directory"), ("/dev/full", "No space left on device"),
+        for target, reason in [("/proc/nowhere/x", "No such file or directory"), ("/dev/full", "No space left on device"),
                                ("home", "Is a directory")]:
             for option in ("--junit", "--json", "--html"):
                 with self.subTest(option=option, target=target):

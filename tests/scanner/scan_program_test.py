@@ -113,7 +113,7 @@ class WrongUse(ScanTest):
                              preexec_fn=lambda: signal.signal(signal.SIGCHLD, disposition))
 
     def test_a_file_for_results_that_cannot_be_made(self):
-        self.assert_ends(3, "/nowhere/results: No such file", "--json", "/nowhere/results", PLUGINS / EFFECT)
+        self.assert_ends(3, "/proc/nowhere/results: No such file", "--json", "/proc/nowhere/results", PLUGINS / EFFECT)
 
     @unittest.skipIf(list(pathlib.Path("/usr").glob("lib/*/vsttorture/vsttorture-worker")), "workers are installed")
     def test_no_worker(self):
