@@ -38,6 +38,13 @@ target_compile_options(project_options INTERFACE
   $<$<BOOL:${VSTTORTURE_WERROR}>:-Werror>
   $<$<COMPILE_LANGUAGE:CXX>:-Wold-style-cast>
   -fstack-protector-strong)
+# The presets "asan", "tsan" and "x86" compile several sources of a target as one, which halves the time. "release" does
+# not: there each source stands alone. In the joined sources every type looks like a header's, and GCC warns of members
+# whose types are local to their source. A source that clashes with another one of its target says so where it is
+# listed (SKIP_UNITY_BUILD_INCLUSION).
+if(CMAKE_UNITY_BUILD AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  target_compile_options(project_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-Wno-subobject-linkage>)
+endif()
 # Files of 2 GiB and more, on 32-bit Linux too.
 if(CMAKE_SIZEOF_VOID_P EQUAL 4 AND NOT APPLE)
   target_compile_definitions(project_options INTERFACE _FILE_OFFSET_BITS=64)

@@ -10,7 +10,7 @@
 
 namespace {
 
-const std::string kThisProgram = sizeof(void*) == 8 ? "x86_64" : "i386";
+const std::string kOurMachine = sizeof(void*) == 8 ? "x86_64" : "i386";
 
 // The first 20 bytes of a shared object. `elfClass` is 1 for 32 bits and 2 for 64; `byteOrder` 1 for little
 // endian and 2 for big; the machine's two bytes stand in file order.
@@ -35,8 +35,8 @@ TEST_P(WhyNotForThisProgram, NamesWhatTheFileWasMadeFor) {
 }
 
 FileKind architecture(const char* name, const std::string& header, const std::string& shownName) {
-  const bool isOurs = shownName == kThisProgram;
-  return {name, header, isOurs ? "" : " is for " + shownName + ", this program is for " + kThisProgram};
+  const bool isOurs = shownName == kOurMachine;
+  return {name, header, isOurs ? "" : " is for " + shownName + ", this program is for " + kOurMachine};
 }
 
 INSTANTIATE_TEST_SUITE_P(
