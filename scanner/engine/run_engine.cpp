@@ -43,6 +43,8 @@ constexpr double kPatienceAfterInterruptInSeconds = 0.5;
 constexpr double kPatienceAfterKillInSeconds = 5;
 /// How long the pipes may stay open when all that could write to them is gone.
 constexpr double kPatienceWithPipesInSeconds = 0.5;
+/// How much longer than a step may last until a tool has started the worker.
+constexpr double kStartOfAToolInSeconds = 30;
 /// When the engine could not look for longer than this, that time counts against no run.
 constexpr double kLongestPauseInSeconds = 1;
 /// So much of the limit, used by a run that failed, is what it failed of: the allocation that would have exceeded it
@@ -444,7 +446,8 @@ void RunEngine::Implementation::ActiveRun::watchStep(double now) {
       stepSince = now;
     }
   }
-  if (now - stepSince <= limits().stepInSeconds) return;
+  const bool isToolStarting = queued.job.tool && stepKey.first == kFlightNotStarted;
+  if (now - stepSince <= limits().stepInSeconds + (isToolStarting ? kStartOfAToolInSeconds : 0)) return;
   noteActivity(now);
   hit(LimitHit::kStep);
 }

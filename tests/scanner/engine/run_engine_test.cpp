@@ -57,8 +57,9 @@ TEST_P(RunEngineTest, OutputsAndStatusAreSeen) {
 TEST_P(RunEngineTest, ASignalThatEndsARunIsSeen) { expectKilled(run(shellJob("kill -SEGV $$")), SIGSEGV); }
 
 TEST_P(RunEngineTest, ARunReadsNothingDumpsNoCoreAndHasNoDescriptorOfOurs) {
-  const RunSeen seen = run(shellJob("cat; grep -o 'core file size *1 *1 ' /proc/$$/limits | tr -s ' '; "
-                                    "for i in /proc/$$/fd/*; do echo ${i##*/}; done"));
+  const RunSeen seen =
+      run(shellJob("cat; grep -o 'core file size *1 *1 ' /proc/$$/limits | tr -s ' '; "
+                   "for i in /proc/$$/fd/*; do echo ${i##*/}; done"));
   // 3 is the folder that the shell is just listing.
   EXPECT_EQ(textOf(seen), "core file size 1 1 \n0\n1\n2\n3\n");
 }
@@ -121,6 +122,19 @@ TEST_P(RunEngineTest, AtATimeLimitAToolGetsItsSignalAndItsPatience) {
   const RunSeen seen = run(job);
   EXPECT_EQ(textOf(seen), "interrupted\n");
   EXPECT_EQ(seen.end.status, 4);
+}
+
+TEST_P(RunEngineTest, WhatAToolTakesToStartTheWorkerIsNoStep) {
+  options.limits.stepInSeconds = 2;
+  Job job = workerJob("well_behaved_effect");
+  job.tool.emplace();
+  job.tool->needsAddressSpace = true;
+  job.tool->command = [](const std::string&) {
+    return std::vector<std::string>{"/bin/sh", "-c", "sleep 3; exec \"$@\"", "sh"};
+  };
+  const RunSeen seen = run(job);
+  EXPECT_EQ(seen.limitHit, LimitHit::kNone);
+  EXPECT_EQ(seen.end.status, 0);
 }
 
 TEST_P(RunEngineTest, AToolMayHaveMoreAddressSpaceThanTheLimit) {
