@@ -105,7 +105,7 @@ std::string uniqueName() {
   return name;
 }
 
-/// As nohup leaves it for SIGHUP, and a shell for SIGINT when it starts a program in the background.
+/// As nohup leaves it for SIGHUP.
 bool isIgnored(int signal) {
   struct sigaction current = {};
   return sigaction(signal, nullptr, &current) == 0 && current.sa_handler == SIG_IGN;
@@ -543,7 +543,8 @@ void RunEngine::Implementation::makeLoop() {
       [](uv_signal_t* handle, int) { static_cast<Implementation*>(handle->data)->lookForEnded(); }, SIGCHLD);
   constexpr int kEndSignals[] = {SIGINT, SIGTERM, SIGHUP};
   for (std::size_t i = 0; i < 3; ++i) {
-    if (isIgnored(kEndSignals[i])) continue;
+    // SIGINT is another matter: scripts start programs in the background with it ignored, and mean to end them by it.
+    if (kEndSignals[i] == SIGHUP && isIgnored(SIGHUP)) continue;
     onSignal(
         endSignals[i],
         [](uv_signal_t* handle, int) { static_cast<Implementation*>(handle->data)->interrupt(); },

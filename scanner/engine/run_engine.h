@@ -76,8 +76,8 @@ class RunEngine {
   void stop();
 
   /// Works until the queue is empty and nothing runs any more. False when it was interrupted (SIGINT, SIGTERM,
-  /// SIGHUP, but for those that were ignored when the engine was made): then nothing new was started, what ran was
-  /// ended, and its OnEnd was called with LimitHit::kInterrupted.
+  /// SIGHUP unless that was ignored when the engine was made): then nothing new was started, what ran was ended, and
+  /// its OnEnd was called with LimitHit::kInterrupted.
   bool run();
 
   /// Called about 5 times a second while run() works, for a progress display.

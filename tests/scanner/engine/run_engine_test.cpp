@@ -225,7 +225,7 @@ TEST_P(RunEngineTest, AnInterruptEndsWhatRunsAndStartsNothingNew) {
   EXPECT_EQ(engine.queued(), 0U);
 }
 
-TEST_P(RunEngineTest, ASignalThatWasIgnoredBeforeDoesNotInterrupt) {
+TEST_P(RunEngineTest, AHangUpThatWasIgnoredBeforeDoesNotInterrupt) {
   const auto before = std::signal(SIGHUP, SIG_IGN);  // As nohup does.
   RunEngine engine(options);
   engine.add(shellJob("sleep 0.5"), [](const RunSeen& seen) { EXPECT_EQ(seen.end.status, 0); });
