@@ -12,10 +12,9 @@
 namespace scanner {
 namespace {
 
-bool isGoodWord(const std::string& verdict) {
-  const std::vector<VerdictRow>& rows = verdictTable();
-  return std::any_of(rows.begin(), rows.end(),
-                     [&verdict](const VerdictRow& row) { return row.isGood && verdict == row.word; });
+bool isGoodWord(const std::string& word) {
+  const std::optional<Verdict> verdict = verdictOf(word);
+  return verdict && rowOf(*verdict).isGood;
 }
 
 /// "expected: hung (known), but crashed at 5"
