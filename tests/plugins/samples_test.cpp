@@ -1,8 +1,13 @@
 // SPDX-License-Identifier: MIT
-// What the tests of entry points need of their samples: they export the names that are tried, and no others.
+// What the tests of entry points need of their samples: they export the names that are tried and no others, and fail in
+// the way that they are for.
+#include <stdexcept>
+
 #include <gmock/gmock.h>
 
 #include "tests/plugins/loaded_plugin.h"
+
+using sample_plugins_test::LoadedPlugin;
 
 namespace {
 
@@ -31,11 +36,16 @@ INSTANTIATE_TEST_SUITE_P(
     [](const auto& instance) { return instance.param.plugin; });
 
 TEST(BothEntries, MakesNoInstanceThroughTheOlderEntry) {
-  const sample_plugins_test::LoadedPlugin plugin("both_entries");
+  const LoadedPlugin plugin("both_entries");
   EXPECT_EQ(plugin.callEntry("main_macho"), nullptr);
   AEffect* const effect = plugin.callEntry();
   ASSERT_NE(effect, nullptr);
   dispatch(*effect, effClose);
+}
+
+TEST(SampleWithoutAnInstance, AnswersNullOrThrows) {
+  EXPECT_EQ(LoadedPlugin("null_instance").callEntry(), nullptr);
+  EXPECT_THROW(LoadedPlugin("entry_throws").callEntry(), std::runtime_error);
 }
 
 }  // namespace

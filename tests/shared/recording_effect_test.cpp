@@ -66,4 +66,11 @@ TEST_F(RecordingEffectTest, WritesTextsAndRecordsAlsoWhenItAnswersZero) {
   EXPECT_EQ(pin.flags, 2);
 }
 
+TEST_F(RecordingEffectTest, LendsAChunkOnlyWithTheFlag) {
+  effect.bankChunk = "bank";
+  void* chunk = nullptr;
+  EXPECT_EQ(ask(effGetChunk, 0, &chunk), 0);
+  EXPECT_EQ(chunk, nullptr);
+}
+
 }  // namespace
