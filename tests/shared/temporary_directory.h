@@ -13,7 +13,7 @@ class TemporaryDirectory {
   TemporaryDirectory() {
     std::string name = (std::filesystem::temp_directory_path() / "vsttorture-XXXXXX").string();
     if (mkdtemp(name.data()) == nullptr) throw std::system_error(errno, std::generic_category(), name);
-    folder = name;
+    folder = std::filesystem::canonical(name);
   }
   TemporaryDirectory(const TemporaryDirectory&) = delete;
   TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
@@ -22,7 +22,7 @@ class TemporaryDirectory {
     std::filesystem::remove_all(folder, ignored);
   }
 
-  /// Absolute, without a slash at the end.
+  /// Absolute, without a slash at the end and without links: what the system says of it is the same.
   const std::filesystem::path& path() const { return folder; }
 
  private:
