@@ -115,7 +115,7 @@ std::string whyNotWanted(const PluginResult& result) {
 std::string durationInWords(double seconds) {
   if (!(seconds > 0)) return "0 s";
   if (seconds < 1e-6) return fmt::format("{:.0f} ns", seconds * 1e9);
-  if (seconds < 1e-3) return fmt::format("{:.0f} µs", seconds * 1e6);
+  if (seconds < 0.995e-4) return fmt::format("{:.0f} µs", seconds * 1e6);
   if (seconds < 0.00995) return fmt::format("{:.1f} ms", seconds * 1e3);
   if (seconds < 0.9995) return fmt::format("{:.0f} ms", seconds * 1e3);
   if (seconds < 9.95) return fmt::format("{:.1f} s", seconds);

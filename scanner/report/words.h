@@ -31,7 +31,7 @@ std::string changeInWords(const PluginResult& result);
 /// tool has found. Empty where nothing is known but its verdict.
 std::string whyNotWanted(const PluginResult& result);
 
-/// "640 ns", "38 ms", "1.2 s", "2 min 5 s", "1 h 2 min"; "0 s" for what is not above 0.
+/// "640 ns", "0.6 ms", "38 ms", "1.2 s", "2 min 5 s", "1 h 2 min"; "0 s" for what is not above 0.
 std::string durationInWords(double seconds);
 
 /// "1 file", "2 files".

@@ -72,12 +72,12 @@ TEST_P(DurationInWords, HasTwoOrThreeDigitsAndAUnit) {
 INSTANTIATE_TEST_SUITE_P(Durations, DurationInWords,
                          ::testing::Values(NumberCase{0, "0 s"}, NumberCase{-1, "0 s"},
                                            NumberCase{std::nan(""), "0 s"}, NumberCase{8.9e-7, "890 ns"},
-                                           NumberCase{6.4e-5, "64 \xc2\xb5s"}, NumberCase{0.0023, "2.3 ms"},
-                                           NumberCase{0.0377, "38 ms"}, NumberCase{0.9996, "1.0 s"},
-                                           NumberCase{1.25, "1.2 s"}, NumberCase{20, "20 s"},
-                                           NumberCase{59.7, "1 min 0 s"}, NumberCase{125, "2 min 5 s"},
-                                           NumberCase{3599.6, "1 h 0 min"}, NumberCase{7500, "2 h 5 min"},
-                                           NumberCase{1e300, "1e+300 s"}));
+                                           NumberCase{6.4e-5, "64 \xc2\xb5s"}, NumberCase{6.03e-4, "0.6 ms"},
+                                           NumberCase{0.0023, "2.3 ms"}, NumberCase{0.0377, "38 ms"},
+                                           NumberCase{0.9996, "1.0 s"}, NumberCase{1.25, "1.2 s"},
+                                           NumberCase{20, "20 s"}, NumberCase{59.7, "1 min 0 s"},
+                                           NumberCase{125, "2 min 5 s"}, NumberCase{3599.6, "1 h 0 min"},
+                                           NumberCase{7500, "2 h 5 min"}, NumberCase{1e300, "1e+300 s"}));
 
 class SizeInWords : public ::testing::TestWithParam<NumberCase> {};
 
