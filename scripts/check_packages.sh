@@ -303,7 +303,7 @@ exit status 0" \
       "${as_root[@]}" unshare --mount sh -c 'mount -t proc proc "$1/proc" && exec chroot --userspec=65534:65534 "$@"' \
         sh "$root" /usr/bin/env -i HOME=/tmp /usr/bin/vsttorture-scan --sandbox off --cache off --jobs 1 \
         /plugins/{amd64,i386}/well_behaved_effect.so </dev/null >"$work/out" 2>"$work/err" || status=$?
-      sed -nE 's/^(passed) +[0-9.]+ s( .*)$/\1\2/p; s/^(.* results?: .*), in [0-9.]+ s$/\1/p; /^[a-z]/{/^passed/!p}' \
+      sed -nE 's/^(passed) +[0-9.]+ m?s( .*)$/\1\2/p; s/^(.* results?: .*), in [0-9.]+ m?s$/\1/p; /^[a-z]/{/^passed/!p}' \
         "$work/out"
       sed 's/^/stderr: /' "$work/err"
       echo "exit status $status")"
