@@ -58,7 +58,7 @@ TEST_F(RecordingEffectTest, WritesTextsAndRecordsAlsoWhenItAnswersZero) {
   effect.setOutputProperties(0, written);
   effect.answer(effGetParamName, 0);
   effect.answer(effGetOutputProperties, 0);
-  char text[] = "#####";
+  char text[500] = "#####";  // The double looks at as much as the wrapper has for a name.
   VstPinProperties pin{};
   EXPECT_EQ(ask(effGetParamName, 3, text), 0);
   EXPECT_EQ(std::string(text, 5), std::string("any\0#", 5));
