@@ -2,6 +2,7 @@
 // Removing folders in which others have done what they liked.
 #include <cerrno>
 #include <string>
+#include <vector>
 
 #include <dirent.h>
 #include <fcntl.h>
@@ -13,20 +14,30 @@
 namespace scanner::system {
 namespace {
 
+/// Null when the folder cannot be read. Follows no link.
+DIR* openFolder(int parent, const char* name) {
+  const int folder = openat(parent, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+  DIR* const directory = folder < 0 ? nullptr : fdopendir(folder);
+  if (directory == nullptr && folder >= 0) close(folder);
+  return directory;
+}
+
+/// The next name in the folder; empty behind the last one.
+std::string nextName(DIR* directory) {
+  while (const dirent* entry = readdir(directory)) {
+    const std::string name = entry->d_name;
+    if (name != "." && name != "..") return name;
+  }
+  return {};
+}
+
 /// Calls `visit` with each name in the folder; false when it cannot be read.
 template <class Visit>
 bool forEachName(int parent, const char* name, Visit visit) {
-  const int folder = openat(parent, name, O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
-  if (folder < 0) return false;
-  DIR* const directory = fdopendir(folder);
-  if (directory == nullptr) {
-    close(folder);
-    return false;
-  }
-  while (const dirent* entry = readdir(directory)) {
-    const std::string one = entry->d_name;
-    if (one != "." && one != "..") visit(folder, one);
-  }
+  DIR* const directory = openFolder(parent, name);
+  if (directory == nullptr) return false;
+  for (std::string one = nextName(directory); !one.empty(); one = nextName(directory))
+    visit(dirfd(directory), one);
   closedir(directory);
   return true;
 }
@@ -39,25 +50,6 @@ bool isFolder(int parent, const std::string& name) {
 /// Of a folder, so that what is in it can be read and removed. Never of what a link leads to.
 void makeWritable(int parent, const std::string& name) {
   [[maybe_unused]] const int ignored = fchmodat(parent, name.c_str(), 0700, AT_SYMLINK_NOFOLLOW);
-}
-
-/// What is in the folder `name`, which is `prefix` for those who look from the top. False when `visit` has had enough.
-bool visitFolder(int parent, const std::string& name, const std::string& prefix, unsigned levelsLeft,
-                 const std::function<bool(const TreeEntry&)>& visit) {
-  bool goesOn = true;
-  forEachName(parent, name.c_str(), [&](int folder, const std::string& inner) {
-    struct stat status = {};
-    if (!goesOn || fstatat(folder, inner.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) return;
-    TreeEntry entry;
-    entry.path = prefix + inner;
-    entry.isFolder = S_ISDIR(status.st_mode);
-    // The unit of st_blocks is 512 bytes on every file system.
-    if (S_ISREG(status.st_mode)) entry.bytesOnDisk = static_cast<std::uint64_t>(status.st_blocks) * 512;
-    goesOn = visit(entry);
-    if (goesOn && entry.isFolder && levelsLeft > 1)
-      goesOn = visitFolder(folder, inner, entry.path + "/", levelsLeft - 1, visit);
-  });
-  return goesOn;
 }
 
 }  // namespace
@@ -95,7 +87,35 @@ bool removeTree(const std::string& folder) {
 
 void visitTree(const std::string& folder, unsigned mostLevels,
                const std::function<bool(const TreeEntry&)>& visit) {
-  visitFolder(AT_FDCWD, folder, "", mostLevels, visit);
+  struct Level {
+    DIR* directory;
+    std::string prefix;  ///< The path of the folder with a slash; empty at the top.
+  };
+  std::vector<Level> levels;
+  const auto enter = [&](int parent, const std::string& name, const std::string& prefix) {
+    DIR* const directory = openFolder(parent, name.c_str());
+    if (directory != nullptr) levels.push_back({directory, prefix});
+  };
+  bool goesOn = true;
+  enter(AT_FDCWD, folder, "");
+  while (!levels.empty()) {
+    const Level level = levels.back();
+    const std::string name = goesOn ? nextName(level.directory) : "";
+    if (name.empty()) {
+      closedir(level.directory);
+      levels.pop_back();
+      continue;
+    }
+    struct stat status = {};
+    if (fstatat(dirfd(level.directory), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) continue;
+    TreeEntry entry;
+    entry.path = level.prefix + name;
+    entry.isFolder = S_ISDIR(status.st_mode);
+    // The unit of st_blocks is 512 bytes on every file system.
+    if (S_ISREG(status.st_mode)) entry.bytesOnDisk = static_cast<std::uint64_t>(status.st_blocks) * 512;
+    goesOn = visit(entry);
+    if (entry.isFolder && levels.size() < mostLevels) enter(dirfd(level.directory), name, entry.path + "/");
+  }
 }
 
 std::optional<FolderLook> lookAtFolder(const std::string& folder) {
