@@ -25,7 +25,7 @@ DIR* openFolder(int parent, const char* name) {
 /// The next name in the folder; empty behind the last one.
 std::string nextName(DIR* directory) {
   while (const dirent* entry = readdir(directory)) {
-    const std::string name = entry->d_name;
+    std::string name = entry->d_name;
     if (name != "." && name != "..") return name;
   }
   return {};
