@@ -54,19 +54,10 @@ std::string endsInWords(const Repetitions& repetitions) {
 }
 
 std::string changeWord(Comparison::Change change) {
-  switch (change) {
-    case Comparison::Change::kNew:
-      return "new";
-    case Comparison::Change::kMended:
-      return "mended";
-    case Comparison::Change::kStillFailing:
-      return "still failing";
-    case Comparison::Change::kFlaky:
-      return "flaky";
-    case Comparison::Change::kNone:
-      break;
-  }
-  return {};
+  if (change == Comparison::Change::kNone) return {};
+  std::string word = nameOfChange(change);
+  std::replace(word.begin(), word.end(), '_', ' ');
+  return word;
 }
 
 std::string changeInWords(const PluginResult& result) {

@@ -99,22 +99,22 @@ void visitTree(const std::string& folder, unsigned mostLevels,
   bool goesOn = true;
   enter(AT_FDCWD, folder, "");
   while (!levels.empty()) {
-    const Level level = levels.back();
-    const std::string name = goesOn ? nextName(level.directory) : "";
+    DIR* const directory = levels.back().directory;
+    const std::string name = goesOn ? nextName(directory) : "";
     if (name.empty()) {
-      closedir(level.directory);
+      closedir(directory);
       levels.pop_back();
       continue;
     }
     struct stat status = {};
-    if (fstatat(dirfd(level.directory), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) continue;
+    if (fstatat(dirfd(directory), name.c_str(), &status, AT_SYMLINK_NOFOLLOW) != 0) continue;
     TreeEntry entry;
-    entry.path = level.prefix + name;
+    entry.path = levels.back().prefix + name;
     entry.isFolder = S_ISDIR(status.st_mode);
     // The unit of st_blocks is 512 bytes on every file system.
     if (S_ISREG(status.st_mode)) entry.bytesOnDisk = static_cast<std::uint64_t>(status.st_blocks) * 512;
     goesOn = visit(entry);
-    if (entry.isFolder && levels.size() < mostLevels) enter(dirfd(level.directory), name, entry.path + "/");
+    if (entry.isFolder && levels.size() < mostLevels) enter(dirfd(directory), name, entry.path + "/");
   }
 }
 

@@ -18,7 +18,7 @@ namespace {
 constexpr char kDismissed = 'd';
 constexpr int kMostRounds = 400;
 constexpr int kQuietRounds = 5;
-constexpr useconds_t kKeeperRoundInMicroseconds = 2000;
+constexpr useconds_t kPauseInMicroseconds = 2000;
 
 std::map<int, pid_t>& keepers() {
   static std::map<int, pid_t> processes;
@@ -32,7 +32,7 @@ void killEverythingMarked(const Marks& marks) {
     bool wasAny = false;
     for (const int process : allProcesses()) wasAny = killIfMarked(process, marks) || wasAny;
     quiet = wasAny ? 0 : quiet + 1;
-    usleep(kKeeperRoundInMicroseconds);
+    usleep(kPauseInMicroseconds);
   }
 }
 
