@@ -56,6 +56,13 @@ class ScanTest(unittest.TestCase):
                               stdin=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True, errors="surrogateescape",
                               timeout=120, check=False, **more)
 
+    def scan_without_reader(self, *arguments):
+        """A scan whose standard output is a pipe that nobody reads any more."""
+        reading, writing = os.pipe()
+        os.close(reading)
+        with open(writing, "wb") as output:
+            return self.scan(*arguments, stdout=output)
+
     def events(self, *arguments, status=None, **more):
         """The events of one scan."""
         result = self.scan("--json", "-", *arguments, **more)
